@@ -1,0 +1,91 @@
+#include "support/TextConversion.h"
+
+#include <iconv.h>
+
+#include <cerrno>
+#include <vector>
+
+#include "support/Exceptions.h"
+
+namespace vq {
+namespace dsc {
+namespace {
+
+// One iconv descriptor, opened for the process locale's character set ("" code-set name).
+class IconvDescriptor {
+public:
+    IconvDescriptor(const char* to, const char* from) : cd_(iconv_open(to, from)) {
+        if (cd_ == reinterpret_cast<iconv_t>(-1)) {
+            throw exception::InvalidLocale();
+        }
+    }
+    ~IconvDescriptor() { iconv_close(cd_); }
+    IconvDescriptor(const IconvDescriptor&) = delete;
+    IconvDescriptor& operator=(const IconvDescriptor&) = delete;
+
+    // Converts `inBytes` bytes into `out`, replacing each unconvertible input unit of
+    // `unitBytes` bytes by `question` (itself `questionBytes` bytes long).
+    size_t Convert(const char* in, size_t inBytes, char* out, size_t outBytes, size_t unitBytes,
+                   const char* question, size_t questionBytes) {
+        iconv(cd_, nullptr, nullptr, nullptr, nullptr);
+        char* inPtr = const_cast<char*>(in);
+        char* outPtr = out;
+        size_t outLeft = outBytes;
+        while (inBytes > 0) {
+            if (iconv(cd_, &inPtr, &inBytes, &outPtr, &outLeft) != static_cast<size_t>(-1)) {
+                break;
+            }
+            if (errno == E2BIG || outLeft < questionBytes) {
+                break;
+            }
+            // EILSEQ or EINVAL: replace one unit of input and go on.
+            for (size_t i = 0; i < questionBytes; ++i) {
+                *outPtr++ = question[i];
+            }
+            outLeft -= questionBytes;
+            const size_t skip = inBytes < unitBytes ? inBytes : unitBytes;
+            inPtr += skip;
+            inBytes -= skip;
+        }
+        if (outLeft > 0) {
+            iconv(cd_, nullptr, nullptr, &outPtr, &outLeft);
+        }
+        return outBytes - outLeft;
+    }
+
+private:
+    iconv_t cd_;
+};
+
+}  // namespace
+
+std::string NarrowFromWide(const wchar_t* text, size_t count) {
+    if (count == 0) {
+        return std::string();
+    }
+    thread_local IconvDescriptor toNarrow("", "WCHAR_T");
+    std::string out(count * 4, '\0');
+    const size_t written = toNarrow.Convert(reinterpret_cast<const char*>(text),
+                                            count * sizeof(wchar_t), &out[0], out.size(),
+                                            sizeof(wchar_t), "?", 1);
+    out.resize(written);
+    return out;
+}
+
+std::wstring WideFromNarrow(const char* text, size_t count) {
+    if (count == 0) {
+        return std::wstring();
+    }
+    thread_local IconvDescriptor toWide("WCHAR_T", "");
+    std::wstring out(count, L'\0');
+    const wchar_t question = L'?';
+    const size_t written = toWide.Convert(text, count, reinterpret_cast<char*>(&out[0]),
+                                          out.size() * sizeof(wchar_t), 1,
+                                          reinterpret_cast<const char*>(&question),
+                                          sizeof(question));
+    out.resize(written / sizeof(wchar_t));
+    return out;
+}
+
+}  // namespace dsc
+}  // namespace vq
