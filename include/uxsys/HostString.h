@@ -49,3 +49,39 @@ inline void CvqBStrFree(CvqBStr str) {
         std::free(reinterpret_cast<char*>(str) - sizeof(uint32_t));
     }
 }
+
+// Owns one host string and frees it on destruction; Release() hands ownership on.
+class CvqBStrHolder {
+  public:
+    CvqBStrHolder() = default;
+    explicit CvqBStrHolder(CvqBStr str) : str_(str) {}
+    ~CvqBStrHolder() { CvqBStrFree(str_); }
+    CvqBStrHolder(const CvqBStrHolder&) = delete;
+    CvqBStrHolder& operator=(const CvqBStrHolder&) = delete;
+    CvqBStrHolder(CvqBStrHolder&& other) noexcept : str_(other.Release()) {}
+    CvqBStrHolder& operator=(CvqBStrHolder&& other) noexcept {
+        if (this != &other) {
+            CvqBStrFree(str_);
+            str_ = other.Release();
+        }
+        return *this;
+    }
+
+    // The held string (may be null); ownership stays here.
+    CvqBStr Get() const { return str_; }
+    // Address to receive a string from a call; frees what was held first.
+    CvqBStr* Receive() {
+        CvqBStrFree(str_);
+        str_ = nullptr;
+        return &str_;
+    }
+    // Gives up ownership and returns the string.
+    CvqBStr Release() {
+        CvqBStr str = str_;
+        str_ = nullptr;
+        return str;
+    }
+
+  private:
+    CvqBStr str_ = nullptr;
+};

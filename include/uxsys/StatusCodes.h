@@ -3,7 +3,9 @@
 
 #include "uxsys/Types.h"
 
-constexpr HRESULT KestStatus(uint32_t bits) { return static_cast<HRESULT>(bits); }
+constexpr HRESULT KestStatus(uint32_t bits) {
+    return static_cast<HRESULT>(bits);
+}
 
 constexpr HRESULT S_OK = KestStatus(0x00000000u);
 constexpr HRESULT S_FALSE = KestStatus(0x00000001u);
@@ -30,5 +32,9 @@ constexpr HRESULT UX_E_GATEWAY_INVALID = KestStatus(0x80040471u);
 constexpr HRESULT UX_E_DNS_ADDRESS_INVALID = KestStatus(0x80040472u);
 constexpr HRESULT UX_E_SUBNET_MASK_INVALID = KestStatus(0x80040473u);
 
-constexpr bool SUCCEEDED(HRESULT status) { return status >= 0; }
-constexpr bool FAILED(HRESULT status) { return status < 0; }
+constexpr bool SUCCEEDED(HRESULT status) {
+    return status >= 0;
+}
+constexpr bool FAILED(HRESULT status) {
+    return status < 0;
+}

@@ -26,7 +26,9 @@ inline bool operator==(const GUID& a, const GUID& b) {
     }
     return true;
 }
-inline bool operator!=(const GUID& a, const GUID& b) { return !(a == b); }
+inline bool operator!=(const GUID& a, const GUID& b) {
+    return !(a == b);
+}
 
 // Signed 64.64 fixed-point seconds since 1904-01-01 00:00:00 UTC; all zero means "no time".
 struct uxSysAttrTimestampUTC {

@@ -13,12 +13,20 @@ const char kRuntimeSourceFile[] = "vqdsc/exception.cpp";
 Exception::Exception(int32_t line, const char* file) noexcept
     : line_(line), file_(file != nullptr ? file : kRuntimeSourceFile) {}
 
-const char* Exception::what() const noexcept { return "unspecified exception"; }
-int32_t Exception::ErrorCode() const noexcept { return -1; }
+const char* Exception::what() const noexcept {
+    return "unspecified exception";
+}
+int32_t Exception::ErrorCode() const noexcept {
+    return -1;
+}
 
-#define KEST_FIXED_EXCEPTION_TEXT(Name, text, code)                                      \
-    const char* Name::what() const noexcept { return text; }                             \
-    int32_t Name::ErrorCode() const noexcept { return static_cast<int32_t>(code##u); }
+#define KEST_FIXED_EXCEPTION_TEXT(Name, text, code) \
+    const char* Name::what() const noexcept {       \
+        return text;                                \
+    }                                               \
+    int32_t Name::ErrorCode() const noexcept {      \
+        return static_cast<int32_t>(code##u);       \
+    }
 
 KEST_FIXED_EXCEPTION_TEXT(OutOfRange, "Out of range", 0x8ABC7007)
 KEST_FIXED_EXCEPTION_TEXT(BoundExceeded, "A request was made that would exceed the bounds",
@@ -42,13 +50,17 @@ KEST_FIXED_EXCEPTION_TEXT(BadGuidString, "Badly formatted Guid string.", 0x8ABC7
 
 #undef KEST_FIXED_EXCEPTION_TEXT
 
-int32_t AccessDenied::ErrorCode() const noexcept { return static_cast<int32_t>(0x8ABC7019u); }
+int32_t AccessDenied::ErrorCode() const noexcept {
+    return static_cast<int32_t>(0x8ABC7019u);
+}
 
 }  // namespace exception
 
 namespace osdep {
 
-int32_t OSException::ErrorCode() const noexcept { return 42; }
+int32_t OSException::ErrorCode() const noexcept {
+    return 42;
+}
 
 PosixError::PosixError() : PosixError(errno) {}
 PosixError::PosixError(int errorNumber) : OSException(std::strerror(errorNumber), errorNumber) {}

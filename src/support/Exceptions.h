@@ -12,7 +12,7 @@ namespace exception {
 
 // Root of the runtime library's exceptions: records where it was raised.
 class Exception : public std::exception {
-public:
+  public:
     explicit Exception(int32_t line = 0, const char* file = nullptr) noexcept;
     const char* what() const noexcept override;
     // The runtime library's error code of this exception class.
@@ -20,27 +20,27 @@ public:
     int32_t Line() const noexcept { return line_; }
     const char* File() const noexcept { return file_; }
 
-private:
+  private:
     int32_t line_;
     const char* file_;
 };
 
 // An exception whose text is built when it is raised; what() returns that text.
 class MessageException : public Exception {
-public:
+  public:
     explicit MessageException(std::string message) : message_(std::move(message)) {}
     const char* what() const noexcept override { return message_.c_str(); }
 
-private:
+  private:
     std::string message_;
 };
 
-#define KEST_FIXED_EXCEPTION(Name, Base)                \
-    class Name : public Base {                          \
-    public:                                             \
-        using Base::Base;                               \
-        const char* what() const noexcept override;     \
-        int32_t ErrorCode() const noexcept override;    \
+#define KEST_FIXED_EXCEPTION(Name, Base)             \
+    class Name : public Base {                       \
+      public:                                        \
+        using Base::Base;                            \
+        const char* what() const noexcept override;  \
+        int32_t ErrorCode() const noexcept override; \
     }
 
 KEST_FIXED_EXCEPTION(OutOfRange, Exception);
@@ -66,38 +66,37 @@ KEST_FIXED_EXCEPTION(BadGuidString, Exception);
 
 // "Out of range: " followed by the given text.
 class OutOfRange2 : public OutOfRange {
-public:
+  public:
     explicit OutOfRange2(const std::string& text) : message_("Out of range: " + text) {}
     const char* what() const noexcept override { return message_.c_str(); }
 
-private:
+  private:
     std::string message_;
 };
 
 // A bound was exceeded; the text is the given message.
 class BoundExceeded2 : public BoundExceeded {
-public:
+  public:
     explicit BoundExceeded2(std::string message) : message_(std::move(message)) {}
     const char* what() const noexcept override { return message_.c_str(); }
 
-private:
+  private:
     std::string message_;
 };
 
 // "Invalid argument(s): " followed by the given text.
 class InvalidArgument2 : public InvalidArgument {
-public:
-    explicit InvalidArgument2(const std::string& text)
-        : message_("Invalid argument(s): " + text) {}
+  public:
+    explicit InvalidArgument2(const std::string& text) : message_("Invalid argument(s): " + text) {}
     const char* what() const noexcept override { return message_.c_str(); }
 
-private:
+  private:
     std::string message_;
 };
 
 // Access to a path was refused; the path helpers pass "Access denied: " and the path.
 class AccessDenied : public MessageException {
-public:
+  public:
     using MessageException::MessageException;
     int32_t ErrorCode() const noexcept override;
 };
@@ -108,20 +107,20 @@ namespace osdep {
 
 // An operating-system failure with its error number.
 class OSException : public exception::MessageException {
-public:
+  public:
     OSException(std::string message, int32_t osErrorNumber)
         : MessageException(std::move(message)), osErrorNumber_(osErrorNumber) {}
     int32_t ErrorCode() const noexcept override;
     // The operating system's error number (errno value).
     virtual int32_t OSErrorNumber() const noexcept { return osErrorNumber_; }
 
-private:
+  private:
     int32_t osErrorNumber_;
 };
 
 // A failed POSIX call: message is strerror of the error number unless one is given.
 class PosixError : public OSException {
-public:
+  public:
     // From the current errno.
     PosixError();
     // From the given error number.
@@ -132,7 +131,7 @@ public:
 
 // A network name or address could not be resolved.
 class NotResolvedException : public exception::Exception {
-public:
+  public:
     using Exception::Exception;
     const char* what() const noexcept override;
 };

@@ -13,7 +13,7 @@ namespace {
 
 // One iconv descriptor, opened for the process locale's character set ("" code-set name).
 class IconvDescriptor {
-public:
+  public:
     IconvDescriptor(const char* to, const char* from) : cd_(iconv_open(to, from)) {
         if (cd_ == reinterpret_cast<iconv_t>(-1)) {
             throw exception::InvalidLocale();
@@ -53,7 +53,7 @@ public:
         return outBytes - outLeft;
     }
 
-private:
+  private:
     iconv_t cd_;
 };
 
@@ -65,9 +65,9 @@ std::string NarrowFromWide(const wchar_t* text, size_t count) {
     }
     thread_local IconvDescriptor toNarrow("", "WCHAR_T");
     std::string out(count * 4, '\0');
-    const size_t written = toNarrow.Convert(reinterpret_cast<const char*>(text),
-                                            count * sizeof(wchar_t), &out[0], out.size(),
-                                            sizeof(wchar_t), "?", 1);
+    const size_t written =
+        toNarrow.Convert(reinterpret_cast<const char*>(text), count * sizeof(wchar_t), &out[0],
+                         out.size(), sizeof(wchar_t), "?", 1);
     out.resize(written);
     return out;
 }
@@ -79,10 +79,9 @@ std::wstring WideFromNarrow(const char* text, size_t count) {
     thread_local IconvDescriptor toWide("WCHAR_T", "");
     std::wstring out(count, L'\0');
     const wchar_t question = L'?';
-    const size_t written = toWide.Convert(text, count, reinterpret_cast<char*>(&out[0]),
-                                          out.size() * sizeof(wchar_t), 1,
-                                          reinterpret_cast<const char*>(&question),
-                                          sizeof(question));
+    const size_t written =
+        toWide.Convert(text, count, reinterpret_cast<char*>(&out[0]), out.size() * sizeof(wchar_t),
+                       1, reinterpret_cast<const char*>(&question), sizeof(question));
     out.resize(written / sizeof(wchar_t));
     return out;
 }

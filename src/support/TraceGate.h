@@ -22,10 +22,14 @@ extern std::atomic<uint32_t> traceMask;
 }
 
 // The current trace mask (0 until the tracer is initialised).
-inline uint32_t CurrentTraceMask() { return kest_detail::traceMask.load(std::memory_order_relaxed); }
+inline uint32_t CurrentTraceMask() {
+    return kest_detail::traceMask.load(std::memory_order_relaxed);
+}
 
 // True when `bits` shares at least one bit with the trace mask.
-inline bool IsTraceEnabled(uint32_t bits) { return (CurrentTraceMask() & bits) != 0; }
+inline bool IsTraceEnabled(uint32_t bits) {
+    return (CurrentTraceMask() & bits) != 0;
+}
 
 // Installs the tracer's mask and line writer (the writer may be null: nothing is written).
 void SetTraceGate(uint32_t mask, TraceLineWriter writer);
