@@ -1,0 +1,11 @@
+#include "support/HostInfo.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+using vq::dsc::osdep::FirstAdapterHardwareAddress;
+
+TEST(HostInfoTest, FirstAdapterAddressIsSixColonSeparatedHexBytes) {
+    EXPECT_THAT(FirstAdapterHardwareAddress(),
+                ::testing::MatchesRegex("[0-9a-f]{2}(:[0-9a-f]{2}){5}"));
+}
