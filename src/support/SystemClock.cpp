@@ -1,0 +1,107 @@
+#include "support/SystemClock.h"
+
+#include <sys/stat.h>
+#include <sys/time.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <string>
+
+#include "support/Exceptions.h"
+#include "support/PathHelpers.h"
+#include "support/Sysroot.h"
+
+namespace kest {
+namespace {
+
+// Closes a descriptor and, unless released, removes the temporary file it was created for.
+class TemporaryFile {
+  public:
+    explicit TemporaryFile(std::string pathTemplate) : path_(std::move(pathTemplate)) {
+        descriptor_ = mkstemp(&path_[0]);
+        if (descriptor_ < 0) {
+            throw vq::dsc::osdep::PosixError();
+        }
+    }
+    ~TemporaryFile() {
+        CloseDescriptor();
+        if (!renamed_) {
+            unlink(path_.c_str());
+        }
+    }
+    TemporaryFile(const TemporaryFile&) = delete;
+    TemporaryFile& operator=(const TemporaryFile&) = delete;
+
+    void Write(const std::string& content) {
+        size_t written = 0;
+        while (written < content.size()) {
+            const ssize_t result =
+                write(descriptor_, content.data() + written, content.size() - written);
+            if (result < 0 && errno != EINTR) {
+                throw vq::dsc::osdep::PosixError();
+            }
+            if (result > 0) {
+                written += static_cast<size_t>(result);
+            }
+        }
+    }
+
+    // Makes the file readable by everyone, flushes it and moves it to `target` atomically.
+    void ReplaceFile(const std::string& target) {
+        if (fchmod(descriptor_, 0644) != 0 || fsync(descriptor_) != 0) {
+            throw vq::dsc::osdep::PosixError();
+        }
+        const int closed = CloseDescriptor();
+        if (closed != 0) {
+            throw vq::dsc::osdep::PosixError(closed);
+        }
+        if (rename(path_.c_str(), target.c_str()) != 0) {
+            throw vq::dsc::osdep::PosixError();
+        }
+        renamed_ = true;
+    }
+
+  private:
+    // Closes the descriptor once; returns 0 or the error number.
+    int CloseDescriptor() {
+        if (descriptor_ < 0) {
+            return 0;
+        }
+        const int result = close(descriptor_);
+        descriptor_ = -1;
+        return result == 0 ? 0 : errno;
+    }
+
+    std::string path_;
+    int descriptor_ = -1;
+    bool renamed_ = false;
+};
+
+void WriteRedirectedClock(int64_t seconds, int64_t microseconds) {
+    const std::string target = paths::RedirectedSystemClockFile();
+    const std::string directory = target.substr(0, target.rfind('/'));
+    vq::dsc::osdep::CreateDirectories(directory, 0755);
+    TemporaryFile file(target + ".XXXXXX");
+    file.Write(std::to_string(seconds) + " " + std::to_string(microseconds) + "\n");
+    file.ReplaceFile(target);
+}
+
+}  // namespace
+
+void SetSystemClock(int64_t seconds, int64_t microseconds) {
+    if (microseconds < 0 || microseconds > 999999) {
+        throw vq::dsc::exception::InvalidArgument();
+    }
+    if (HasSysroot()) {
+        WriteRedirectedClock(seconds, microseconds);
+        return;
+    }
+    timeval time{};
+    time.tv_sec = static_cast<time_t>(seconds);
+    time.tv_usec = static_cast<suseconds_t>(microseconds);
+    if (settimeofday(&time, nullptr) != 0) {
+        throw vq::dsc::osdep::PosixError();
+    }
+}
+
+}  // namespace kest
