@@ -1,0 +1,121 @@
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <thread>
+#include <vector>
+
+#include "TestComponents.h"
+#include "com/CountedPtr.h"
+
+namespace {
+
+using TestObject = CVQComObject<TestComponent>;
+
+class ComObjectTest : public ::testing::Test {
+  protected:
+    // A new object holding one reference, as its primary interface.
+    ITestDerived* Create() {
+        TestObject* object = nullptr;
+        EXPECT_EQ(S_OK, CreateComObjectInstance<TestComponent>(&object, &destructions));
+        EXPECT_EQ(1u, object->AddRef());
+        return object;
+    }
+
+    std::atomic<int> destructions{0};
+};
+
+TEST_F(ComObjectTest, EveryMappedInterfaceSharesOneIdentityAndOneCount) {
+    ITestDerived* primary = Create();
+    void* unknown = nullptr;
+    ASSERT_EQ(S_OK, primary->QueryInterface(IID_IUnknown, &unknown));
+    EXPECT_EQ(static_cast<void*>(primary), unknown);
+
+    void* secondary = nullptr;
+    ASSERT_EQ(S_OK, primary->QueryInterface(IID_ITestSecondary, &secondary));
+    auto* second = static_cast<ITestSecondary*>(secondary);
+    EXPECT_EQ(3, second->Secondary());
+    EXPECT_NE(static_cast<void*>(primary), secondary);
+
+    for (const IID* iid : {&IID_ITestBase, &IID_ITestDerived, &IID_IUnknown}) {
+        void* back = nullptr;
+        ASSERT_EQ(S_OK, second->QueryInterface(*iid, &back));
+        EXPECT_EQ(static_cast<void*>(primary), back);
+        EXPECT_EQ(2, static_cast<ITestDerived*>(back)->Derived());
+        static_cast<ITestDerived*>(back)->Release();
+    }
+    // Three references: the creator's, the IUnknown one and the secondary one.
+    EXPECT_EQ(4u, second->AddRef());
+    EXPECT_EQ(3u, primary->Release());
+    EXPECT_EQ(2u, second->Release());
+    EXPECT_EQ(1u, static_cast<ITestDerived*>(unknown)->Release());
+    EXPECT_EQ(0, destructions.load());
+    EXPECT_EQ(0u, primary->Release());
+    EXPECT_EQ(1, destructions.load());
+    EXPECT_EQ(2, TestComponent::countDuringDestruction.load());
+}
+
+TEST_F(ComObjectTest, UnansweredIdentifierGivesNoInterfaceAndNull) {
+    ITestDerived* primary = Create();
+    void* result = &result;
+    EXPECT_EQ(E_NOINTERFACE, primary->QueryInterface(IID_ITestUnanswered, &result));
+    EXPECT_EQ(nullptr, result);
+    EXPECT_EQ(E_POINTER, primary->QueryInterface(IID_ITestBase, nullptr));
+    EXPECT_EQ(0u, primary->Release());
+}
+
+TEST_F(ComObjectTest, FailedConstructionGivesOutOfMemoryAndNoObject) {
+    TestObject* object = reinterpret_cast<TestObject*>(&destructions);
+    EXPECT_EQ(E_OUTOFMEMORY, CreateComObjectInstance<TestComponent>(&object, &destructions, true));
+    EXPECT_EQ(nullptr, object);
+    try {
+        CreateCountedComObject<TestComponent>(&destructions, true);
+        FAIL() << "no status thrown";
+    } catch (long status) {
+        EXPECT_EQ(E_OUTOFMEMORY, status);
+    }
+}
+
+TEST_F(ComObjectTest, CountedCreationHoldsTheOnlyReference) {
+    {
+        CountedPtr<TestObject> object = CreateCountedComObject<TestComponent>(&destructions);
+        EXPECT_EQ(2u, object->AddRef());
+        EXPECT_EQ(1u, object->Release());
+    }
+    EXPECT_EQ(1, destructions.load());
+}
+
+TEST_F(ComObjectTest, ConcurrentReferencesDestroyTheObjectExactlyOnce) {
+    constexpr int kThreads = 8;
+    constexpr int kRounds = 20000;
+    for (int trial = 0; trial < 5; ++trial) {
+        ITestDerived* primary = Create();
+        std::vector<CountedPtr<ITestDerived>> handedOut;
+        for (int t = 0; t < kThreads; ++t) {
+            handedOut.emplace_back(primary);
+        }
+        std::atomic<bool> go{false};
+        std::vector<std::thread> threads;
+        for (int t = 0; t < kThreads; ++t) {
+            threads.emplace_back([&go, mine = std::move(handedOut[t])]() mutable {
+                while (!go.load()) {
+                    std::this_thread::yield();
+                }
+                for (int round = 0; round < kRounds; ++round) {
+                    CountedPtr<ITestSecondary> second;
+                    ASSERT_EQ(S_OK, mine->QueryInterface(IID_ITestSecondary, second.ReceiveVoid()));
+                    second->AddRef();
+                    second->Release();
+                }
+                mine.Reset();  // the last of these drops the object
+            });
+        }
+        EXPECT_EQ(static_cast<uint32_t>(kThreads), primary->Release());
+        go.store(true);
+        for (std::thread& thread : threads) {
+            thread.join();
+        }
+        EXPECT_EQ(trial + 1, destructions.load());
+    }
+}
+
+}  // namespace
