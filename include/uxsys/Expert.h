@@ -130,9 +130,9 @@ class IuxSysExpert : public IuxSysExpertInfo {
 class IuxSysExpert2 : public IuxSysExpert {
   public:
     // Slot 13: not supported; returns E_NOTIMPL.
-    virtual HRESULT Reserved13() = 0;
+    virtual HRESULT ReservedExpert13() = 0;
     // Slot 14: not supported; returns E_NOTIMPL.
-    virtual HRESULT Reserved14() = 0;
+    virtual HRESULT ReservedExpert14() = 0;
     // Slot 15: checks the modified properties of `changes`; `validated` receives the accepted
     // tags and `message` (may be null) an explanation for a rejected value.
     virtual HRESULT ValidatePropertyChanges(const wchar_t* item, IuxSysPropertyBag* changes,
@@ -150,7 +150,7 @@ class IuxSysExpert2 : public IuxSysExpert {
 class IuxSysExpert3 : public IuxSysExpert2 {
   public:
     // Slot 17: returns S_FALSE.
-    virtual HRESULT Reserved17() = 0;
+    virtual HRESULT ReservedExpert17() = 0;
 
   protected:
     ~IuxSysExpert3() = default;
@@ -175,7 +175,7 @@ class IuxSysExpertImportExport : public IUnknown {
     virtual HRESULT GetMatchingItems(IuxSysPropertyBag* description, CvqBStr* exactName,
                                      IuxSysEnumStringList** names, void** reserved) = 0;
     // Slot 5: not supported; returns E_NOTIMPL.
-    virtual HRESULT Reserved5() = 0;
+    virtual HRESULT ReservedImportExport5() = 0;
 
   protected:
     ~IuxSysExpertImportExport() = default;
@@ -191,9 +191,9 @@ class IuxSysExpertFirmware : public IUnknown {
     virtual HRESULT StartFirmwareUpdate(const wchar_t* item, const wchar_t* updateId,
                                         uint32_t flags, void* reserved, IUnknown* imageSource) = 0;
     // Slot 5: not supported; returns E_NOTIMPL.
-    virtual HRESULT Reserved5() = 0;
+    virtual HRESULT ReservedFirmware5() = 0;
     // Slot 6: not supported; returns E_NOTIMPL.
-    virtual HRESULT Reserved6() = 0;
+    virtual HRESULT ReservedFirmware6() = 0;
     // Slot 7: the update's state (UX_FIRMWARE_STATE_*) and progress in percent.
     virtual HRESULT GetFirmwareUpdateStatus(const wchar_t* item, int32_t* state,
                                             int32_t* percent) = 0;
