@@ -1,0 +1,49 @@
+// The framework expert: the primary interface chain, plug-and-play registration and the import
+// operations, over the reference count shared by all of the object's interfaces.
+#pragma once
+
+#include "com/CVQComMultiThreadModelNoCS.h"
+#include "com/CVQComObjectRootEx.h"
+#include "uxsys/Expert.h"
+
+class CuxNetConfigExpert : public IuxSysExpert3,
+                           public IuxSysExpertPlugPlay,
+                           public IuxSysExpertImportExport,
+                           public virtual CVQComObjectRootEx<CVQComMultiThreadModelNoCS> {
+  public:
+    ~CuxNetConfigExpert() override;
+
+    // Operations of this class beyond the primary chain, in the class's own slot order.
+    HRESULT SetPlugPlayCallback(IUnknown* callback) override;
+    HRESULT GetImportableTags(const wchar_t* item, IuxSysEnumPropertyTag** tags) override;
+    HRESULT GetMatchingItems(IuxSysPropertyBag* description, CvqBStr* exactName,
+                             IuxSysEnumStringList** names, void** reserved) override;
+    HRESULT ReservedImportExport5() override;
+
+    // IuxSysExpertInfo: the framework's identity; the string results are new host strings.
+    HRESULT GetExpertClassId(GUID* classId) override;
+    HRESULT GetExpertDisplayName(CvqBStr* name) override;
+    HRESULT GetExpertVersion(CvqBStr* version) override;
+    HRESULT GetExpertProgrammaticName(CvqBStr* name) override;
+
+    // IuxSysExpert and IuxSysExpert2 entry points (not available yet: E_NOTIMPL).
+    HRESULT Initialize() override;
+    HRESULT Uninitialize() override;
+    HRESULT SearchForItemsAndProperties(IuxSysSearchSink* sink) override;
+    HRESULT SearchForItemNames(IuxSysEnumStringList** names) override;
+    HRESULT GetPropertiesOfItem(const wchar_t* item, IuxSysPropertyBag** properties) override;
+    HRESULT PopulateOrRefreshProperties(const wchar_t* item, uint32_t count, const uint32_t* tags,
+                                        IuxSysPropertyBag** properties) override;
+    HRESULT ValidatePropertyChanges(const wchar_t* item, IuxSysPropertyBag* changes,
+                                    IuxSysEnumPropertyTag** validated, CvqBStr* message) override;
+    HRESULT PersistPropertyChanges(const wchar_t* item, IuxSysPropertyBag* changes,
+                                   int32_t* restartRequired) override;
+
+    // Unsupported slots of the primary chain: E_NOTIMPL, E_NOTIMPL and S_FALSE.
+    HRESULT ReservedExpert13() override;
+    HRESULT ReservedExpert14() override;
+    HRESULT ReservedExpert17() override;
+
+  protected:
+    CuxNetConfigExpert() = default;
+};

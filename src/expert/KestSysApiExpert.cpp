@@ -1,0 +1,59 @@
+#include "expert/KestSysApiExpert.h"
+
+#include "expert/HostStringResult.h"
+#include "support/TraceGate.h"
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
+
+namespace {
+// 999d9aa4-5475-4ca7-a560-93c51b5bfceb
+constexpr CLSID kKestExpertClassId = {
+    0x999d9aa4, 0x5475, 0x4ca7, {0xa5, 0x60, 0x93, 0xc5, 0x1b, 0x5b, 0xfc, 0xeb}};
+}  // namespace
+
+KestSysApiExpert::~KestSysApiExpert() = default;
+
+HRESULT KestSysApiExpert::GetExpertClassId(GUID* classId) {
+    TraceIfEnabled("KestSysApiExpert::GetExpertClassId()", kTraceEntry);
+    if (classId == nullptr) {
+        return E_POINTER;
+    }
+    *classId = kKestExpertClassId;
+    return S_OK;
+}
+
+HRESULT KestSysApiExpert::GetExpertDisplayName(CvqBStr* name) {
+    TraceIfEnabled("KestSysApiExpert::GetExpertDisplayName()", kTraceEntry);
+    return StoreNewHostString(L"KEST Configuration", name);
+}
+
+HRESULT KestSysApiExpert::PrepareFirmwareUpdate(const wchar_t* /*item*/, uint32_t /*flags*/,
+                                                uint32_t /*imageSize*/, CvqBStr* /*updateId*/) {
+    return E_NOTIMPL;
+}
+
+HRESULT KestSysApiExpert::StartFirmwareUpdate(const wchar_t* /*item*/, const wchar_t* /*updateId*/,
+                                              uint32_t /*flags*/, void* /*reserved*/,
+                                              IUnknown* /*imageSource*/) {
+    return E_NOTIMPL;
+}
+
+HRESULT KestSysApiExpert::ReservedFirmware5() {
+    return E_NOTIMPL;
+}
+
+HRESULT KestSysApiExpert::ReservedFirmware6() {
+    return E_NOTIMPL;
+}
+
+HRESULT KestSysApiExpert::GetFirmwareUpdateStatus(const wchar_t* /*item*/, int32_t* /*state*/,
+                                                  int32_t* /*percent*/) {
+    return E_NOTIMPL;
+}
+
+HRESULT KestSysApiExpert::HandleFrameworkNotification(uint32_t /*notification*/,
+                                                      IUnknown* /*details*/) {
+    return E_NOTIMPL;
+}
+
+}  // namespace nVQKESTSYSAPICHASSISEXPERT100
