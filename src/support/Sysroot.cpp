@@ -17,6 +17,10 @@ std::string AbsolutePathFromEnvironment(const char* name) {
 
 }  // namespace
 
+bool HasSysroot() {
+    return !AbsolutePathFromEnvironment("KEST_SYSROOT").empty();
+}
+
 std::string SysrootDirectory() {
     std::string directory = AbsolutePathFromEnvironment("KEST_SYSROOT");
     while (!directory.empty() && directory.back() == '/') {

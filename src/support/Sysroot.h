@@ -9,14 +9,12 @@
 
 namespace kest {
 
-// The sysroot directory without trailing slashes; empty when KEST_SYSROOT is unset, empty or
-// relative (or names the root directory itself).
-std::string SysrootDirectory();
+// True when KEST_SYSROOT holds an absolute path: the machine's clock is then never set.
+bool HasSysroot();
 
-// True when paths are resolved under a sysroot.
-inline bool HasSysroot() {
-    return !SysrootDirectory().empty();
-}
+// The sysroot directory without trailing slashes; empty when there is no sysroot or it is the
+// root directory itself.
+std::string SysrootDirectory();
 
 // `absolutePath` resolved under the sysroot; unchanged without a sysroot or when it is relative.
 std::string ResolveSystemPath(const std::string& absolutePath);
