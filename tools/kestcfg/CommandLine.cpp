@@ -1,0 +1,88 @@
+#include "CommandLine.h"
+
+#include "Commands.h"
+#include "ExitCodes.h"
+
+namespace {
+
+// The value of an option given as "--name VALUE" or "--name=VALUE"; advances `index` past it.
+std::string OptionValue(const std::string& name, const std::string& argument, int argc,
+                        const char* const* argv, int* index) {
+    if (argument.size() > name.size()) {
+        return argument.substr(name.size() + 1);
+    }
+    if (*index + 1 >= argc) {
+        throw UsageError("option " + name + " needs a value");
+    }
+    return argv[++*index];
+}
+
+bool IsOption(const std::string& argument, const std::string& name) {
+    return argument == name || argument.rfind(name + "=", 0) == 0;
+}
+
+}  // namespace
+
+CommandLine ParseCommandLine(int argc, const char* const* argv) {
+    CommandLine line;
+    int index = 1;
+    for (; index < argc; ++index) {
+        const std::string argument = argv[index];
+        if (argument.empty() || argument[0] != '-') {
+            break;
+        }
+        if (argument == "--") {
+            ++index;
+            break;
+        }
+        if (IsOption(argument, "--sysroot")) {
+            line.sysroot = OptionValue("--sysroot", argument, argc, argv, &index);
+            if (line.sysroot.empty()) {
+                throw UsageError("option --sysroot needs a directory");
+            }
+        } else if (IsOption(argument, "--plugin")) {
+            line.plugin = OptionValue("--plugin", argument, argc, argv, &index);
+            if (line.plugin.empty()) {
+                throw UsageError("option --plugin needs a path");
+            }
+        } else if (argument == "--json") {
+            line.json = true;
+        } else if (argument == "--help" || argument == "-h") {
+            line.help = true;
+        } else {
+            throw UsageError("unknown option " + argument);
+        }
+    }
+    if (index < argc) {
+        line.command = argv[index++];
+    }
+    for (; index < argc; ++index) {
+        line.arguments.emplace_back(argv[index]);
+    }
+    if (line.command.empty() && !line.help) {
+        throw UsageError("no command given");
+    }
+    return line;
+}
+
+std::string UsageText() {
+    std::string text =
+        "usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] COMMAND [ARGUMENTS...]\n"
+        "\n"
+        "options:\n"
+        "  --sysroot DIR  resolve the controller's fixed paths under DIR (sets KEST_SYSROOT)\n"
+        "  --plugin PATH  the plug-in to load (default: libvqkestSysApiChassisExpert.so next\n"
+        "                 to kestcfg)\n"
+        "  --json         print results as JSON\n"
+        "\n"
+        "commands:\n";
+    for (const CommandDescription& command : AllCommands()) {
+        text += "  " + command.synopsis;
+        text.append(command.synopsis.size() < 13 ? 13 - command.synopsis.size() : 1, ' ');
+        text += command.summary + "\n";
+    }
+    text +=
+        "\n"
+        "exit status: 0 success, 1 value rejected, 2 usage error, 3 other failure\n";
+    return text;
+}

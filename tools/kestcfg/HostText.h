@@ -1,0 +1,22 @@
+// Turning the plug-in's answers into printable text: host strings to UTF-8, identifiers to their
+// registry form, statuses to hexadecimal, and JSON string quoting.
+#pragma once
+
+#include <string>
+
+#include "uxsys/Types.h"
+
+// UTF-8 text of `count` wide characters; characters outside Unicode become U+FFFD.
+std::string Utf8FromWide(const wchar_t* text, size_t count);
+
+// Takes ownership of a host string from the plug-in, frees it, and returns it as UTF-8.
+std::string TakeHostString(CvqBStr str);
+
+// Lower-case registry form, for example "999d9aa4-5475-4ca7-a560-93c51b5bfceb".
+std::string GuidText(const GUID& guid);
+
+// "0x" and eight upper-case hexadecimal digits.
+std::string StatusText(HRESULT status);
+
+// `text` as a quoted JSON string.
+std::string JsonQuoted(const std::string& text);

@@ -1,0 +1,76 @@
+// kestcfg: loads the KEST chassis plug-in and drives it as a configuration host would.
+#include <limits.h>
+#include <stdlib.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <exception>
+#include <iostream>
+#include <string>
+
+#include "CommandLine.h"
+#include "Commands.h"
+#include "ExitCodes.h"
+#include "PluginLoader.h"
+
+namespace {
+
+// Points KEST_SYSROOT at `directory` (made absolute), which must exist.
+void UseSysroot(const std::string& directory) {
+    char absolute[PATH_MAX];
+    struct stat status {};
+    if (realpath(directory.c_str(), absolute) == nullptr || stat(absolute, &status) != 0 ||
+        !S_ISDIR(status.st_mode)) {
+        throw UsageError("the sysroot " + directory + " is not a directory");
+    }
+    setenv("KEST_SYSROOT", absolute, 1);
+}
+
+// A --plugin path as dlopen should take it: a bare file name means the current directory, not the
+// loader's search path.
+std::string PluginPathArgument(const std::string& path) {
+    return path.find('/') == std::string::npos ? "./" + path : path;
+}
+
+int Run(int argc, const char* const* argv) {
+    const CommandLine line = ParseCommandLine(argc, argv);
+    if (line.help) {
+        std::cout << UsageText();
+        return kExitSuccess;
+    }
+    const CommandDescription* command = FindCommand(line.command);
+    if (command == nullptr) {
+        throw UsageError("unknown command " + line.command);
+    }
+    if (line.arguments.size() < command->minArguments ||
+        line.arguments.size() > command->maxArguments) {
+        throw UsageError("wrong number of arguments; usage: kestcfg [OPTIONS] " +
+                         command->synopsis);
+    }
+    if (!line.sysroot.empty()) {
+        UseSysroot(line.sysroot);
+    }
+    const Plugin plugin(line.plugin.empty() ? DefaultPluginPath()
+                                            : PluginPathArgument(line.plugin));
+    const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
+    CommandContext context{expert.Get(), line.arguments, line.json, std::cout};
+    command->run(context);
+    return kExitSuccess;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return Run(argc, argv);
+    } catch (const CommandFailure& failure) {
+        std::cerr << "kestcfg: " << failure.what() << "\n";
+        if (failure.Code() == kExitUsageError) {
+            std::cerr << "Try 'kestcfg --help' for more information.\n";
+        }
+        return failure.Code();
+    } catch (const std::exception& failure) {
+        std::cerr << "kestcfg: " << failure.what() << "\n";
+        return kExitFailure;
+    }
+}
