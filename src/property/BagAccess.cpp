@@ -1,0 +1,56 @@
+#include "property/BagAccess.h"
+
+#include "support/TextConversion.h"
+#include "uxsys/HostString.h"
+#include "uxsys/StatusCodes.h"
+
+HRESULT BagGetBool(IuxSysPropertyBag* bag, uint32_t tag, bool& value) {
+    int32_t stored = 0;
+    const HRESULT status = bag->GetBool(tag, &stored);
+    value = stored != 0;
+    return status;
+}
+
+HRESULT BagSetBool(IuxSysPropertyBag* bag, uint32_t tag, bool value) {
+    return bag->SetBool(tag, value ? 1 : 0);
+}
+
+bool BagHasTag(IuxSysPropertyBag* bag, uint32_t tag) {
+    return bag->HasTag(tag) == S_OK;
+}
+
+HRESULT BagGetWideString(IuxSysPropertyBag* bag, uint32_t tag, std::wstring& value) {
+    CvqBStrHolder stored;
+    const HRESULT status = bag->GetString(tag, stored.Receive());
+    value.assign(stored.Get() != nullptr ? stored.Get() : L"", CvqBStrLength(stored.Get()));
+    return status;
+}
+
+HRESULT BagGetNarrowString(IuxSysPropertyBag* bag, uint32_t tag, std::string& value) {
+    std::wstring wide;
+    const HRESULT status = BagGetWideString(bag, tag, wide);
+    value = vq::dsc::NarrowFromWide(wide);
+    return status;
+}
+
+HRESULT BagSetWideString(IuxSysPropertyBag* bag, uint32_t tag, const std::wstring& value) {
+    return bag->SetString(tag, value.c_str());
+}
+
+HRESULT BagSetNarrowString(IuxSysPropertyBag* bag, uint32_t tag, const std::string& value) {
+    return BagSetWideString(bag, tag, vq::dsc::WideFromNarrow(value));
+}
+
+bool EnumeratorHasTag(IuxSysEnumPropertyTag* tags, uint32_t tag) {
+    if (tags == nullptr) {
+        return false;
+    }
+    tags->Reset();
+    uint32_t current = 0;
+    while (tags->Next(1, &current, nullptr) == S_OK) {
+        if (current == tag) {
+            return true;
+        }
+    }
+    return false;
+}

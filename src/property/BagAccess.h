@@ -1,0 +1,27 @@
+// Convenience access to any property bag for the item handlers: booleans as bool, strings as
+// std::wstring or locale-encoded std::string, and tag lookup in a tag enumerator.
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "uxsys/Enumerators.h"
+#include "uxsys/PropertyBag.h"
+
+// Reads a boolean; `value` is false unless the bag holds a true value. Returns GetBool's status.
+HRESULT BagGetBool(IuxSysPropertyBag* bag, uint32_t tag, bool& value);
+// Stores a boolean; returns SetBool's status.
+HRESULT BagSetBool(IuxSysPropertyBag* bag, uint32_t tag, bool value);
+// True exactly when HasTag reports the tag present.
+bool BagHasTag(IuxSysPropertyBag* bag, uint32_t tag);
+// Reads a string; `value` is emptied when the read fails. Returns GetString's status.
+HRESULT BagGetWideString(IuxSysPropertyBag* bag, uint32_t tag, std::wstring& value);
+// As BagGetWideString, converted to narrow text in the locale's character set.
+HRESULT BagGetNarrowString(IuxSysPropertyBag* bag, uint32_t tag, std::string& value);
+// Stores a string; returns SetString's status.
+HRESULT BagSetWideString(IuxSysPropertyBag* bag, uint32_t tag, const std::wstring& value);
+// Stores narrow text converted from the locale's character set; returns SetString's status.
+HRESULT BagSetNarrowString(IuxSysPropertyBag* bag, uint32_t tag, const std::string& value);
+// True when the enumerator yields `tag` after a Reset; false for a null enumerator or when Next
+// stops before the tag appears. Leaves the enumerator's position after the tag or at the end.
+bool EnumeratorHasTag(IuxSysEnumPropertyTag* tags, uint32_t tag);

@@ -1,0 +1,12 @@
+#include "property/ItemNameEnumerator.h"
+
+#include <utility>
+
+CuxSysEnumItemNamesSTL::CuxSysEnumItemNamesSTL(ItemNameList names)
+    : ItemNameEnumeratorBase(nullptr, &names_, {}), names_(std::move(names)) {
+    Reset();
+}
+
+CountedPtr<IuxSysEnumStringList> CreateItemNameEnumerator(ItemNameList names) {
+    return CreateCountedComObject<CuxSysEnumItemNamesSTL>(std::move(names));
+}

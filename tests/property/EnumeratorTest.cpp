@@ -1,0 +1,125 @@
+#include <gtest/gtest.h>
+
+#include <set>
+#include <string>
+#include <vector>
+
+#include "PropertyTestSupport.h"
+#include "property/ItemNameEnumerator.h"
+#include "property/PropertyTagEnumerator.h"
+
+namespace {
+
+// The names an enumerator yields from its position to the end, one Next at a time.
+std::vector<std::wstring> DrainNames(IuxSysEnumStringList* names) {
+    std::vector<std::wstring> drained;
+    CvqBStrHolder name;
+    while (names->Next(1, name.Receive(), nullptr) == S_OK) {
+        drained.emplace_back(name.Get());
+    }
+    return drained;
+}
+
+TEST(EnumeratorTest, NextReportsCountsAndEndsWithSFalse) {
+    CountedPtr<IuxSysEnumStringList> names = CreateItemNameEnumerator({L"System", L"eth0"});
+    CvqBStr out[5] = {};
+    uint32_t fetched = 99;
+    EXPECT_EQ(E_POINTER, names->Next(2, out, nullptr));
+    EXPECT_EQ(E_POINTER, names->Next(0, out, nullptr));
+    EXPECT_EQ(E_POINTER, names->Next(1, nullptr, &fetched));
+    EXPECT_EQ(S_FALSE, names->Next(5, out, &fetched));
+    ASSERT_EQ(2u, fetched);
+    EXPECT_STREQ(L"System", out[0]);
+    EXPECT_STREQ(L"eth0", out[1]);
+    CvqBStrFree(out[0]);
+    CvqBStrFree(out[1]);
+    EXPECT_EQ(S_FALSE, names->Next(1, out, &fetched));
+    EXPECT_EQ(0u, fetched);
+    EXPECT_EQ(S_OK, names->Reset());
+    EXPECT_EQ(S_OK, names->Next(0, out, &fetched));
+    EXPECT_EQ(0u, fetched);
+    EXPECT_EQ(std::vector<std::wstring>({L"System", L"eth0"}), DrainNames(names.Get()));
+
+    CountedPtr<IuxSysEnumStringList> empty = CreateItemNameEnumerator({});
+    EXPECT_EQ(S_FALSE, empty->Next(1, out, &fetched));
+    EXPECT_EQ(0u, fetched);
+}
+
+TEST(EnumeratorTest, SkipStopsAtTheEnd) {
+    CountedPtr<IuxSysEnumPropertyTag> tags = CreatePropertyTagEnumerator(std::set<uint32_t>{9, 4});
+    EXPECT_EQ(S_OK, tags->Skip(0));
+    EXPECT_EQ(S_FALSE, tags->Skip(3));
+    EXPECT_EQ(S_OK, tags->Reset());
+    EXPECT_EQ(S_OK, tags->Skip(1));
+    EXPECT_EQ(std::vector<uint32_t>({9}), DrainTags(tags.Get()));
+    EXPECT_EQ(S_FALSE, tags->Skip(1));
+}
+
+TEST(EnumeratorTest, ClonesContinueIndependentlyAndOutliveTheirSource) {
+    CountedPtr<IuxSysEnumPropertyTag> source =
+        CreatePropertyTagEnumerator(PropertyTagList{1, 2, 3});
+    uint32_t tag = 0;
+    ASSERT_EQ(S_OK, source->Next(1, &tag, nullptr));
+    CountedPtr<IuxSysEnumPropertyTag> clone;
+    EXPECT_EQ(E_POINTER, source->Clone(nullptr));
+    ASSERT_EQ(S_OK, source->Clone(clone.Receive()));
+    CountedPtr<IuxSysEnumPropertyTag> cloneOfClone;
+    ASSERT_EQ(S_OK, clone->Clone(cloneOfClone.Receive()));
+    EXPECT_EQ(std::vector<uint32_t>({2, 3}), DrainTags(source.Get()));
+    source.Reset();
+    EXPECT_EQ(std::vector<uint32_t>({2, 3}), DrainTags(clone.Get()));
+    clone.Reset();
+    EXPECT_EQ(S_OK, cloneOfClone->Reset());
+    EXPECT_EQ(std::vector<uint32_t>({1, 2, 3}), DrainTags(cloneOfClone.Get()));
+
+    CountedPtr<IuxSysEnumStringList> names = CreateItemNameEnumerator({L"a", L"b"});
+    CountedPtr<IuxSysEnumStringList> namesClone;
+    ASSERT_EQ(S_OK, names->Skip(1));
+    ASSERT_EQ(S_OK, names->Clone(namesClone.Receive()));
+    names.Reset();
+    EXPECT_EQ(std::vector<std::wstring>({L"b"}), DrainNames(namesClone.Get()));
+}
+
+TEST(EnumeratorTest, AnswersOnlyItsOwnInterface) {
+    CountedPtr<IuxSysEnumPropertyTag> tags = CreatePropertyTagEnumerator(PropertyTagList{1});
+    EXPECT_NE(nullptr, QueryCounted<IUnknown>(tags, IID_IuxSysEnumPropertyTag).Get());
+    EXPECT_NE(nullptr, QueryCounted<IUnknown>(tags, IID_IUnknown).Get());
+    EXPECT_EQ(nullptr, QueryCounted<IUnknown>(tags, IID_IuxSysEnumStringList).Get());
+}
+
+// Copies names like the real enumerator but fails on the name "fail", as an exhausted heap would.
+struct FailingNameCopy {
+    static bool Copy(CvqBStr* to, const std::wstring& from) noexcept {
+        return from != L"fail" && HostStringCopy::Copy(to, from);
+    }
+    static void Destroy(CvqBStr* str) noexcept { HostStringCopy::Destroy(str); }
+};
+
+class FailingNames : public CVQComEnumOnSTL<IuxSysEnumStringList, &IID_IuxSysEnumStringList,
+                                            CvqBStr, ItemNameList, FailingNameCopy> {
+  public:
+    explicit FailingNames(ItemNameList names)
+        : CVQComEnumOnSTL(nullptr, &names_, {}), names_(std::move(names)) {
+        Reset();
+    }
+
+  private:
+    ItemNameList names_;
+};
+
+TEST(EnumeratorTest, FailedNameCopyFreesTheCallsStringsAndLosesNoName) {
+    CountedPtr<IuxSysEnumStringList> names =
+        CreateCountedComObject<FailingNames>(ItemNameList{L"a", L"b", L"fail"});
+    CvqBStr out[3] = {};
+    uint32_t fetched = 99;
+    EXPECT_EQ(E_OUTOFMEMORY, names->Next(3, out, &fetched));
+    EXPECT_EQ(0u, fetched);
+    EXPECT_EQ(nullptr, out[0]) << "a freed string was left for the caller";
+    EXPECT_EQ(nullptr, out[1]);
+    EXPECT_EQ(S_OK, names->Next(2, out, &fetched)) << "names before the failure were skipped";
+    EXPECT_STREQ(L"a", out[0]);
+    CvqBStrFree(out[0]);
+    CvqBStrFree(out[1]);
+}
+
+}  // namespace
