@@ -1,9 +1,8 @@
 #include "support/Sysroot.h"
 
-#include <dirent.h>
+#include <glob.h>
 #include <stdlib.h>
 
-#include <functional>
 #include <string>
 #include <vector>
 
@@ -48,6 +47,10 @@ struct SysrootCase {
     bool hasSysroot;
 };
 
+void PrintTo(const SysrootCase& c, std::ostream* out) {
+    *out << (c.value == nullptr ? "unset" : '"' + std::string(c.value) + '"');
+}
+
 class SysrootResolutionTest : public ::testing::TestWithParam<SysrootCase> {};
 
 TEST_P(SysrootResolutionTest, ResolvesOnlyUnderAnAbsoluteSysroot) {
@@ -60,26 +63,9 @@ TEST_P(SysrootResolutionTest, ResolvesOnlyUnderAnAbsoluteSysroot) {
     EXPECT_EQ(kest::ResolveSystemPath("relative/path"), "relative/path");
 
     namespace paths = kest::paths;
-    const std::pair<std::function<std::string()>, const char*> fixedPaths[] = {
-        {paths::SharedSettingsDirectory, "/etc/korvane/share/"},
-        {paths::DiagnosticsSettingsFile, "/etc/korvane/share/vqsysdiag.ini"},
-        {paths::WebServiceSettingsFile, "/etc/korvane/share/vqkest.ini"},
-        {paths::PrimaryLogDirectory, "/etc/korvane/share/vqsyslog"},
-        {paths::FallbackLogDirectory, "/var/local/korvane/vqsyslog"},
-        {paths::VersionFile, "/etc/korvane/version"},
-        {paths::TimeZoneTableFile, "/usr/share/vqsysapi/timezone.ini"},
-        {paths::FirmwareUpdateTool, "/usr/local/korvane/bin/fwupdate"},
-        {paths::FirmwareUpdateStatusFile, "/var/run/firmware_update/status"},
-        {paths::FirmwareStagingDirectory, "/var/volatile/tmp"},
-        {paths::FirmwareStagingFile, "/var/volatile/tmp/kestsysxp.fwupdate.cfg"},
-        {paths::AdjtimeFile, "/etc/adjtime"},
-        {paths::HardwareClockTool, "/sbin/hwclock"},
-        {paths::SharedTemporaryFileDirectory, "/var/tmp/korvane/shared"},
-        {paths::NamedMutexDirectory, "/var/tmp/korvane/shared/mutex"},
-        {paths::RedirectedSystemClockFile, "/run/kest/system-clock"}};
-    for (const auto& [resolve, path] : fixedPaths) {
-        EXPECT_EQ(resolve(), prefix + path);
-    }
+    EXPECT_EQ(paths::VersionFile(), prefix + "/etc/korvane/version");
+    EXPECT_EQ(paths::FirmwareStagingFile(), prefix + "/var/volatile/tmp/kestsysxp.fwupdate.cfg");
+    EXPECT_EQ(paths::NamedMutexDirectory(), prefix + "/var/tmp/korvane/shared/mutex");
     EXPECT_EQ(paths::RealTimeClockDevices(),
               (std::vector<std::string>{prefix + "/dev/rtc", prefix + "/dev/rtc0",
                                         prefix + "/dev/misc/rtc"}));
@@ -104,27 +90,16 @@ TEST(SharedFileDirectoryTest, AbsoluteOverrideWinsOverTheSysroot) {
     EXPECT_EQ(kest::paths::NamedMutexDirectory(), "/srv/root/var/tmp/korvane/shared/mutex");
 }
 
-std::vector<std::string> DirectoryEntries(const std::string& path) {
-    std::vector<std::string> names;
-    if (DIR* directory = opendir(path.c_str())) {
-        while (const dirent* entry = readdir(directory)) {
-            if (entry->d_name[0] != '.') {
-                names.push_back(entry->d_name);
-            }
-        }
-        closedir(directory);
-    }
-    return names;
-}
-
 TEST(SystemClockTest, UnderASysrootTheTimeGoesToAFile) {
     kest::test::TempSysroot sysroot;
+    glob_t files{};
     kest::SetSystemClock(1700000000, 500000);
     EXPECT_EQ(sysroot.ReadFile("/run/kest/system-clock"), "1700000000 500000\n");
     kest::SetSystemClock(5, 0);
     EXPECT_EQ(sysroot.ReadFile("/run/kest/system-clock"), "5 0\n");
-    EXPECT_EQ(DirectoryEntries(sysroot.PathOf("/run/kest")),
-              std::vector<std::string>{"system-clock"});
+    EXPECT_EQ(glob(sysroot.PathOf("/run/kest/*").c_str(), 0, nullptr, &files), 0);
+    EXPECT_EQ(files.gl_pathc, 1u) << "no temporary file is left behind";
+    globfree(&files);
 }
 
 TEST(SystemClockTest, RefusesBadMicrosecondsAndReportsWriteFailures) {

@@ -17,19 +17,26 @@ namespace {
 
 using vq::dsc::Mutex;
 using vq::dsc::ScopedLock;
+using vq::dsc::exception::InvalidOperation;
 using vq::dsc::osdep::SleepMs;
 using vq::dsc::osdep::Thread;
 
-// Runs `body(argument)` on a Thread started with the function form and joins it.
+// Starts `body()` on `thread` through the function-and-argument form.
+template <class Body>
+void StartOn(Thread& thread, Body& body) {
+    thread.Start([](void* argument) { (*static_cast<Body*>(argument))(); }, &body);
+}
+
 template <class Body>
 void RunOnThread(Body& body) {
     Thread thread;
-    thread.Start([](void* argument) { (*static_cast<Body*>(argument))(); }, &body);
+    StartOn(thread, body);
     thread.Join();
 }
 
 TEST(MutexTest, RecursionIsCountedAndExcludesOtherThreads) {
     Mutex mutex;
+    EXPECT_THROW(mutex.Unlock(), InvalidOperation);
     mutex.Lock();
     ScopedLock again(mutex);
     EXPECT_EQ(mutex.RecursionCount(), 2u);
@@ -37,64 +44,38 @@ TEST(MutexTest, RecursionIsCountedAndExcludesOtherThreads) {
 
     bool otherGotIt = true;
     bool otherOwns = true;
-    auto tryFromOtherThread = [&] {
+    auto fromOtherThread = [&] {
         otherOwns = mutex.IsOwnedByCurrentThread();
+        EXPECT_THROW(mutex.Unlock(), InvalidOperation);
         otherGotIt = mutex.TryLock();
         if (otherGotIt) {
             mutex.Unlock();
         }
     };
-    RunOnThread(tryFromOtherThread);
+    RunOnThread(fromOtherThread);
     EXPECT_FALSE(otherOwns);
     EXPECT_FALSE(otherGotIt);
 
     mutex.Unlock();
     EXPECT_EQ(mutex.RecursionCount(), 1u);
-    RunOnThread(tryFromOtherThread);
+    RunOnThread(fromOtherThread);
     EXPECT_FALSE(otherGotIt) << "one level of recursion is still held";
-}
-
-TEST(MutexTest, ReleasedMutexPassesToAnotherThread) {
-    Mutex mutex;
-    { ScopedLock lock(mutex); }
-    EXPECT_EQ(mutex.RecursionCount(), 0u);
-    bool gotIt = false;
-    uint32_t countInside = 0;
-    auto lockFromOtherThread = [&] {
-        gotIt = mutex.TryLock();
-        countInside = mutex.RecursionCount();
-        mutex.Unlock();
-    };
-    RunOnThread(lockFromOtherThread);
-    EXPECT_TRUE(gotIt);
-    EXPECT_EQ(countInside, 1u);
-    EXPECT_FALSE(mutex.IsOwnedByCurrentThread());
-}
-
-TEST(MutexTest, UnlockByANonOwnerIsRefused) {
-    Mutex mutex;
-    EXPECT_THROW(mutex.Unlock(), vq::dsc::exception::InvalidOperation);
-    mutex.Lock();
-    auto unlockFromOtherThread = [&] {
-        EXPECT_THROW(mutex.Unlock(), vq::dsc::exception::InvalidOperation);
-    };
-    RunOnThread(unlockFromOtherThread);
-    EXPECT_EQ(mutex.RecursionCount(), 1u);
-    mutex.Unlock();
 }
 
 TEST(MutexTest, BlockedLockWaitsForTheFullRelease) {
     Mutex mutex;
     std::atomic<bool> released{false};
     bool sawReleased = false;
+    uint32_t countInside = 0;
     mutex.Lock();
     mutex.Lock();
     auto waiter = [&] {
         ScopedLock lock(mutex);
         sawReleased = released.load();
+        countInside = mutex.RecursionCount();
     };
     Thread thread;
-    thread.Start([](void* argument) { (*static_cast<decltype(waiter)*>(argument))(); }, &waiter);
+    StartOn(thread, waiter);
     SleepMs(20);
     mutex.Unlock();
     SleepMs(20);
@@ -102,6 +83,8 @@ TEST(MutexTest, BlockedLockWaitsForTheFullRelease) {
     mutex.Unlock();
     thread.Join();
     EXPECT_TRUE(sawReleased);
+    EXPECT_EQ(countInside, 1u);
+    EXPECT_EQ(mutex.RecursionCount(), 0u);
 }
 
 // A thread whose body records its own name and stack size.
@@ -126,7 +109,9 @@ class ProbeThread : public Thread {
 TEST(ThreadTest, RunBodyGetsNameAndStackSize) {
     ProbeThread named;
     named.Start("ToggleNIC");
+    EXPECT_THROW(named.Start("again"), InvalidOperation);
     named.Join();
+    EXPECT_FALSE(named.IsJoinable());
     EXPECT_EQ(named.name, "ToggleNIC");
     EXPECT_GE(named.stackSize, Thread::kDefaultStackSize);
 
@@ -135,17 +120,6 @@ TEST(ThreadTest, RunBodyGetsNameAndStackSize) {
     large.Join();
     EXPECT_EQ(large.name, "a-very-long-thr");
     EXPECT_GE(large.stackSize, 0x100000u);
-}
-
-TEST(ThreadTest, SecondStartIsRefusedUntilJoined) {
-    Thread thread;
-    auto nothing = [](void*) {};
-    thread.Start(nothing, nullptr);
-    EXPECT_TRUE(thread.IsJoinable());
-    EXPECT_THROW(thread.Start(nothing, nullptr), vq::dsc::exception::InvalidOperation);
-    thread.Join();
-    EXPECT_FALSE(thread.IsJoinable());
-    EXPECT_NO_THROW(thread.Join());
 }
 
 TEST(ThreadTest, ExceptionInABodyDoesNotEndTheProcess) {
@@ -170,17 +144,16 @@ TEST(SleepTest, SignalDoesNotCutTheSleepShort) {
     action.sa_handler = IgnoreSignal;
     sigaction(SIGUSR1, &action, &previous);  // no SA_RESTART: the sleep sees EINTR
 
-    const pthread_t sleeper = pthread_self();
-    auto interrupt = [](void* target) {
+    pthread_t sleeper = pthread_self();
+    auto interrupt = [&sleeper] {
         for (int i = 0; i < 5; ++i) {
             SleepMs(20);
-            pthread_kill(*static_cast<pthread_t*>(target), SIGUSR1);
+            pthread_kill(sleeper, SIGUSR1);
         }
     };
     Thread interrupter;
-    pthread_t target = sleeper;
     const auto start = std::chrono::steady_clock::now();
-    interrupter.Start(interrupt, &target);
+    StartOn(interrupter, interrupt);
     SleepMs(200);
     const auto elapsed = std::chrono::steady_clock::now() - start;
     interrupter.Join();
