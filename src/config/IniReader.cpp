@@ -1,0 +1,279 @@
+#include "config/IniReader.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "config/IniText.h"
+
+namespace kest_ini {
+namespace {
+
+constexpr std::string_view kLineSuffix = " Line";
+
+bool IsLineEnd(char c) {
+    return c == '\n' || c == '\r' || c == '\0';
+}
+
+// Builds a document line by line.
+class Parser {
+  public:
+    Parser(uint32_t readFlags, IniDocument& document) : flags_(readFlags), document_(document) {}
+
+    void Line(std::string_view line, uint32_t number) {
+        size_t start = 0;
+        while (start < line.size() && IsIniSpace(line[start])) {
+            ++start;
+        }
+        std::string_view text = line.substr(start);
+        bool parsed = false;
+        if (!text.empty() && text[0] == '[') {
+            parsed = Header(text.substr(1), number);
+        } else if (!text.empty() && text[0] != ';') {
+            parsed = KeyLine(text, number);
+        }
+        if (!parsed && (flags_ & kIniReadKeepComments) != 0) {
+            pending_.emplace_back(line);
+        }
+    }
+
+    void Finish() {
+        document_.trailingComments = std::move(pending_);
+        for (size_t i = 0; i < document_.SectionCount(); ++i) {
+            JoinLineKeys(document_.SectionAt(i));
+        }
+    }
+
+  private:
+    bool Header(std::string_view rest, uint32_t number) {
+        size_t close = rest.find(']');
+        if (close == std::string_view::npos) {
+            return false;
+        }
+        std::string_view name = TrimIniSpace(rest.substr(0, close));
+        if (name.empty()) {
+            return false;
+        }
+        IniSection* section = document_.UniqueNames() ? document_.FindSection(name) : nullptr;
+        if (section == nullptr) {
+            section = &document_.AddSection(name, false);
+            section->line = number;
+        }
+        TakeComments(section->comments);
+        current_ = section;
+        return true;
+    }
+
+    bool KeyLine(std::string_view text, uint32_t number) {
+        bool colons = (flags_ & kIniReadColonsAndUnnamedSection) != 0;
+        size_t separator = text.find_first_of(colons ? std::string_view("=:", 2) : "=");
+        if (separator == std::string_view::npos) {
+            return false;
+        }
+        size_t valueStart = separator + 1;
+        if (text[separator] == ':' && valueStart < text.size() && text[valueStart] == '=') {
+            ++valueStart;
+        }
+        std::string_view name = TrimIniSpace(text.substr(0, separator));
+        std::string_view value = TrimIniSpace(text.substr(valueStart));
+        if (name.empty() || (value.empty() && (flags_ & kIniReadKeepEmptyValues) == 0)) {
+            return false;
+        }
+        if (current_ == nullptr) {
+            if (!colons) {
+                return false;
+            }
+            current_ = &document_.ObtainSection(nullptr);
+        }
+        IniKey& key = document_.ObtainKey(*current_, name);
+        StoreValue(key, value);
+        key.line = number;
+        TakeComments(key.comments);
+        return true;
+    }
+
+    void StoreValue(IniKey& key, std::string_view value) const {
+        char quote = 0;
+        if (value.size() >= 2) {
+            if ((flags_ & kIniReadStripDoubleQuotes) != 0 && value.front() == '"' &&
+                value.back() == '"') {
+                quote = '"';
+            } else if ((flags_ & kIniReadStripApostrophes) != 0 && value.front() == '\'' &&
+                       value.back() == '\'') {
+                quote = '\'';
+            }
+        }
+        if (quote != 0) {
+            value = value.substr(1, value.size() - 2);
+        }
+        key.value.assign(value.data(), value.size());
+        key.quote = quote;
+    }
+
+    void TakeComments(std::vector<std::string>& owner) {
+        if (pending_.empty()) {
+            return;
+        }
+        owner.insert(owner.end(), std::make_move_iterator(pending_.begin()),
+                     std::make_move_iterator(pending_.end()));
+        pending_.clear();
+    }
+
+    // The number of a key named base " Line" digits, or false for any other name.
+    static bool LineNumber(std::string_view name, uint32_t* number, size_t* baseLength) {
+        size_t digits = name.size();
+        while (digits > 0 && name[digits - 1] >= '0' && name[digits - 1] <= '9') {
+            --digits;
+        }
+        if (digits == name.size() || digits < kLineSuffix.size() ||
+            name.substr(digits - kLineSuffix.size(), kLineSuffix.size()) != kLineSuffix) {
+            return false;
+        }
+        uint64_t value = 0;
+        for (size_t i = digits; i < name.size(); ++i) {
+            value = value * 10 + static_cast<uint64_t>(name[i] - '0');
+            if (value > UINT32_MAX) {
+                return false;
+            }
+        }
+        *number = static_cast<uint32_t>(value);
+        *baseLength = digits - kLineSuffix.size();
+        return true;
+    }
+
+    // Joins each run of keys "x Line1", "x Line2", ... into one key "x".
+    void JoinLineKeys(IniSection& section) const {
+        uint32_t number = 0;
+        size_t baseLength = 0;
+        bool anyRun = false;
+        for (size_t i = 0; i < section.keys.Size() && !anyRun; ++i) {
+            anyRun = LineNumber(section.keys.At(i).name, &number, &baseLength) && number == 1;
+        }
+        if (!anyRun) {
+            return;
+        }
+        std::vector<std::unique_ptr<IniKey>> keys = section.keys.Release();
+        std::vector<std::unique_ptr<IniKey>> joined;
+        joined.reserve(keys.size());
+        for (size_t i = 0; i < keys.size();) {
+            std::unique_ptr<IniKey> first = std::move(keys[i++]);
+            if (LineNumber(first->name, &number, &baseLength) && number == 1) {
+                first->name = std::string(TrimIniSpace(first->name.substr(0, baseLength)));
+                size_t ignored = 0;
+                while (i < keys.size() && LineNumber(keys[i]->name, &number, &ignored) &&
+                       number != 1) {
+                    first->value += keys[i]->value;
+                    first->comments.insert(first->comments.end(),
+                                           std::make_move_iterator(keys[i]->comments.begin()),
+                                           std::make_move_iterator(keys[i]->comments.end()));
+                    ++i;
+                }
+            }
+            joined.push_back(std::move(first));
+        }
+        document_.ResetKeys(section, std::move(joined));
+    }
+
+    uint32_t flags_;
+    IniDocument& document_;
+    IniSection* current_ = nullptr;
+    std::vector<std::string> pending_;
+};
+
+// Closes a file descriptor when it goes out of scope.
+class ScopedDescriptor {
+  public:
+    explicit ScopedDescriptor(int descriptor) : descriptor_(descriptor) {}
+    ScopedDescriptor(const ScopedDescriptor&) = delete;
+    ScopedDescriptor& operator=(const ScopedDescriptor&) = delete;
+    ~ScopedDescriptor() { close(descriptor_); }
+
+  private:
+    int descriptor_;
+};
+
+}  // namespace
+
+void ParseIni(std::string_view text, uint32_t readFlags, IniDocument& document) {
+    Parser parser(readFlags, document);
+    uint32_t number = 1;
+    size_t position = 0;
+    while (position < text.size()) {
+        size_t end = position;
+        while (end < text.size() && !IsLineEnd(text[end])) {
+            ++end;
+        }
+        parser.Line(text.substr(position, end - position), number++);
+        position = end + 1;
+        if (end + 1 < text.size() && text[end] != '\0' && IsLineEnd(text[end + 1]) &&
+            text[end + 1] != '\0' && text[end + 1] != text[end]) {
+            ++position;
+        }
+    }
+    parser.Finish();
+}
+
+int TextStart(std::string_view bytes) {
+    auto startsWith = [bytes](std::string_view mark) {
+        return bytes.substr(0, mark.size()) == mark;
+    };
+    using std::string_view_literals::operator""sv;
+    if (startsWith("\xFF\xFE\x00\x00"sv) || startsWith("\x00\x00\xFE\xFF"sv) ||
+        startsWith("\xFF\xFE"sv) || startsWith("\xFE\xFF"sv)) {
+        return kIniUnsupportedEncoding;
+    }
+    return startsWith("\xEF\xBB\xBF"sv) ? 3 : 0;
+}
+
+int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, time_t* modified) {
+    if (path == nullptr || *path == '\0') {
+        return kIniInvalidArgument;
+    }
+    int descriptor;
+    do {
+        descriptor = open(path, O_RDONLY | O_CLOEXEC);
+    } while (descriptor < 0 && errno == EINTR);
+    if (descriptor < 0) {
+        struct stat status;
+        return stat(path, &status) == 0 ? kIniCannotOpenForReading : kIniInvalidArgument;
+    }
+    ScopedDescriptor closer(descriptor);
+    struct stat status;
+    if (fstat(descriptor, &status) != 0) {
+        return kIniReadError;
+    }
+    std::string bytes;
+    bytes.resize(status.st_size > 0 ? static_cast<size_t>(status.st_size) + 1 : 4096);
+    size_t filled = 0;
+    for (;;) {
+        if (filled == bytes.size()) {
+            bytes.resize(bytes.size() * 2);
+        }
+        ssize_t count = read(descriptor, &bytes[filled], bytes.size() - filled);
+        if (count < 0 && errno == EINTR) {
+            continue;
+        }
+        if (count < 0) {
+            return kIniReadError;
+        }
+        if (count == 0) {
+            break;
+        }
+        filled += static_cast<size_t>(count);
+    }
+    std::string_view text(bytes.data(), filled);
+    int start = TextStart(text);
+    if (start < 0) {
+        return start;
+    }
+    ParseIni(text.substr(static_cast<size_t>(start)), readFlags, document);
+    *modified = status.st_mtim.tv_sec;
+    return 0;
+}
+
+}  // namespace kest_ini

@@ -1,0 +1,275 @@
+#include "config/IniWriter.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <vector>
+
+namespace kest_ini {
+namespace {
+
+// Room taken on a split line by the name suffix and the separator.
+constexpr int kSplitOverhead = 12;
+
+// True when a piece of an unquoted value is read back exactly as written: the reader drops
+// whitespace at its ends and strips quote characters that enclose it.
+bool ReadsBackUnquoted(std::string_view piece) {
+    if (piece.empty() || IsIniSpace(piece.front()) || IsIniSpace(piece.back())) {
+        return false;
+    }
+    return piece.size() < 2 || piece.front() != piece.back() ||
+           (piece.front() != '"' && piece.front() != '\'');
+}
+
+// Length of the next piece of `rest`: at most `limit` characters, ending just after the last
+// split character within the limit when there is one. For unquoted values only cut points that
+// read back unchanged are used; when there is none the rest goes out as one piece.
+size_t PieceLength(std::string_view rest, size_t limit, char splitCharacter, bool quoted) {
+    if (rest.size() <= limit) {
+        return rest.size();
+    }
+    auto usable = [&](size_t cut) {
+        if (quoted) {
+            return true;
+        }
+        std::string_view remainder = rest.substr(cut);
+        return ReadsBackUnquoted(rest.substr(0, cut)) && !IsIniSpace(remainder.front()) &&
+               (remainder.size() > limit || ReadsBackUnquoted(remainder));
+    };
+    if (splitCharacter != 0) {
+        for (size_t cut = limit; cut > 0; --cut) {
+            if (rest[cut - 1] == splitCharacter && usable(cut)) {
+                return cut;
+            }
+        }
+    }
+    for (size_t cut = limit; cut > 0; --cut) {
+        if (usable(cut)) {
+            return cut;
+        }
+    }
+    return rest.size();
+}
+
+void AppendLines(const std::vector<std::string>& lines, std::string& out) {
+    for (const std::string& line : lines) {
+        out += line;
+        out += '\n';
+    }
+}
+
+void AppendKeyLine(std::string_view name, std::string_view separator, char quote,
+                   std::string_view value, std::string& out) {
+    out += name;
+    out += separator;
+    if (quote != 0) {
+        out += quote;
+    }
+    out += value;
+    if (quote != 0) {
+        out += quote;
+    }
+    out += '\n';
+}
+
+int AppendKey(const IniKey& key, const WriteOptions& options, std::string& out) {
+    std::string_view separator = (options.flags & kIniWriteSpacedSeparator) != 0 ? " = " : "=";
+    int quoteLength = key.quote != 0 ? 2 : 0;
+    size_t lineLength = key.name.size() + separator.size() + key.value.size() + quoteLength;
+    if (options.maxLineLength <= 0 || lineLength <= static_cast<size_t>(options.maxLineLength)) {
+        AppendKeyLine(key.name, separator, key.quote, key.value, out);
+        return 0;
+    }
+    long long limit = static_cast<long long>(options.maxLineLength) - kSplitOverhead -
+                      static_cast<long long>(key.name.size()) - quoteLength;
+    if (limit <= 0) {
+        return kIniNoRoomToSplit;
+    }
+    std::string_view rest = key.value;
+    unsigned number = 1;
+    char suffix[32];
+    while (!rest.empty()) {
+        size_t length =
+            PieceLength(rest, static_cast<size_t>(limit), options.splitCharacter, key.quote != 0);
+        std::snprintf(suffix, sizeof suffix, " Line%04u", number++);
+        out += key.name;
+        AppendKeyLine(suffix, separator, key.quote, rest.substr(0, length), out);
+        rest.remove_prefix(length);
+    }
+    return 0;
+}
+
+// Closes a file descriptor unless it was handed over.
+class ScopedDescriptor {
+  public:
+    explicit ScopedDescriptor(int descriptor) : descriptor_(descriptor) {}
+    ScopedDescriptor(const ScopedDescriptor&) = delete;
+    ScopedDescriptor& operator=(const ScopedDescriptor&) = delete;
+    ~ScopedDescriptor() {
+        if (descriptor_ >= 0) {
+            close(descriptor_);
+        }
+    }
+    int Get() const { return descriptor_; }
+    // Closes now; false when closing reports an error (for example a failed delayed write).
+    bool Close() {
+        int descriptor = descriptor_;
+        descriptor_ = -1;
+        return close(descriptor) == 0;
+    }
+
+  private:
+    int descriptor_;
+};
+
+int OpenRetrying(const char* path, int flags, mode_t mode = 0) {
+    int descriptor;
+    do {
+        descriptor = open(path, flags, mode);
+    } while (descriptor < 0 && errno == EINTR);
+    return descriptor;
+}
+
+// Proves that the target can be written: opens an existing one for update, or creates and
+// deletes a new one.
+bool TargetIsWritable(const char* path) {
+    int descriptor = OpenRetrying(path, O_RDWR | O_CLOEXEC);
+    if (descriptor >= 0) {
+        close(descriptor);
+        return true;
+    }
+    if (errno != ENOENT) {
+        return false;
+    }
+    descriptor = OpenRetrying(path, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+    if (descriptor < 0) {
+        return false;
+    }
+    close(descriptor);
+    unlink(path);
+    return true;
+}
+
+bool WriteAll(int descriptor, std::string_view text) {
+    while (!text.empty()) {
+        ssize_t written = write(descriptor, text.data(), text.size());
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
+            return false;
+        }
+        text.remove_prefix(static_cast<size_t>(written));
+    }
+    return true;
+}
+
+}  // namespace
+
+int FormatIni(const IniDocument& document, const WriteOptions& options, std::string& out) {
+    bool comments = (options.flags & kIniWriteComments) != 0;
+    if ((options.flags & kIniWriteByteOrderMark) != 0) {
+        out += "\xEF\xBB\xBF";
+    }
+    for (size_t i = 0; i < document.SectionCount(); ++i) {
+        const IniSection& section = document.SectionAt(i);
+        if (comments) {
+            AppendLines(section.comments, out);
+        }
+        if (!section.unnamed) {
+            out += '[';
+            out += section.name;
+            out += "]\n";
+        }
+        for (size_t k = 0; k < section.keys.Size(); ++k) {
+            const IniKey& key = section.keys.At(k);
+            if (comments) {
+                AppendLines(key.comments, out);
+            }
+            int result = AppendKey(key, options, out);
+            if (result < 0) {
+                return result;
+            }
+        }
+        bool emptyUnnamed = section.unnamed && section.keys.Size() == 0;
+        if (!emptyUnnamed && (!comments || section.line == 0)) {
+            out += '\n';
+        }
+    }
+    if (comments) {
+        AppendLines(document.trailingComments, out);
+    }
+    return 0;
+}
+
+std::string TemporaryPathFor(std::string_view target) {
+    size_t slash = target.rfind('/');
+    size_t dot = target.rfind('.');
+    bool hasExtension = slash != std::string_view::npos && dot != std::string_view::npos &&
+                        dot > slash && target.substr(dot + 1) != "TMP";
+    std::string path(hasExtension ? target.substr(0, dot) : target);
+    path += ".TMP";
+    return path;
+}
+
+int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, time_t* modified) {
+    if (path == nullptr || *path == '\0') {
+        return kIniInvalidArgument;
+    }
+    bool safe = (writeFlags & kIniWriteSafeReplacement) != 0;
+    std::string outputPath = path;
+    int descriptor = -1;
+    if (safe) {
+        if (!TargetIsWritable(path)) {
+            return kIniCannotWriteTarget;
+        }
+        if ((writeFlags & kIniWriteUniqueTemporary) != 0) {
+            std::string_view target(path);
+            size_t slash = target.rfind('/');
+            outputPath = std::string(slash == std::string_view::npos ? std::string_view()
+                                                                     : target.substr(0, slash + 1));
+            outputPath += "ini$$.TMPXXXXXX";
+            descriptor = mkostemp(&outputPath[0], O_CLOEXEC);
+            if (descriptor < 0) {
+                return kIniCannotCreateTemporary;
+            }
+            fchmod(descriptor, 0644);
+        } else {
+            outputPath = TemporaryPathFor(path);
+            descriptor = OpenRetrying(outputPath.c_str(),
+                                      O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, 0666);
+        }
+    } else {
+        descriptor = OpenRetrying(path, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+    }
+    if (descriptor < 0) {
+        return kIniCannotOpenOutput;
+    }
+    ScopedDescriptor output(descriptor);
+    bool written =
+        WriteAll(descriptor, text) && ((writeFlags & kIniWriteSync) == 0 || fsync(descriptor) == 0);
+    struct stat previous;
+    if (written && safe && stat(path, &previous) == 0) {
+        // A process without the right to give files away still saves: a refused fchown is
+        // tolerated. The mode is set after the owner, which may clear set-id bits.
+        (void)!fchown(descriptor, previous.st_uid, previous.st_gid);
+        fchmod(descriptor, previous.st_mode & 07777);
+    }
+    if (!output.Close() || !written) {
+        unlink(outputPath.c_str());
+        return kIniWriteFailed;
+    }
+    if (safe && rename(outputPath.c_str(), path) != 0) {
+        unlink(outputPath.c_str());
+        return kIniCannotWriteTarget;
+    }
+    struct stat current;
+    *modified = stat(path, &current) == 0 ? current.st_mtim.tv_sec : 0;
+    return 0;
+}
+
+}  // namespace kest_ini
