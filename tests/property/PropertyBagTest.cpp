@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <chrono>
 #include <cstdlib>
 #include <cstring>
 #include <functional>
@@ -290,6 +291,8 @@ TEST(PropertyBagTest, CallerLockMustBeHeldToBeReleased) {
 
     HRESULT foreignUnlock = S_OK;
     std::thread foreign([&] { foreignUnlock = bag->UnlockBag(); });
+    // Gives the foreign call time to arrive while the lock is held; it must wait or fail.
+    std::this_thread::sleep_for(std::chrono::milliseconds(100));
     EXPECT_EQ(S_OK, bag->UnlockBag());
     EXPECT_EQ(S_OK, bag->UnlockBag());
     foreign.join();
