@@ -80,13 +80,6 @@ TEST(EnumeratorTest, ClonesContinueIndependentlyAndOutliveTheirSource) {
     EXPECT_EQ(std::vector<std::wstring>({L"b"}), DrainNames(namesClone.Get()));
 }
 
-TEST(EnumeratorTest, AnswersOnlyItsOwnInterface) {
-    CountedPtr<IuxSysEnumPropertyTag> tags = CreatePropertyTagEnumerator(PropertyTagList{1});
-    EXPECT_NE(nullptr, QueryCounted<IUnknown>(tags, IID_IuxSysEnumPropertyTag).Get());
-    EXPECT_NE(nullptr, QueryCounted<IUnknown>(tags, IID_IUnknown).Get());
-    EXPECT_EQ(nullptr, QueryCounted<IUnknown>(tags, IID_IuxSysEnumStringList).Get());
-}
-
 // Copies names like the real enumerator but fails on the name "fail", as an exhausted heap would.
 struct FailingNameCopy {
     static bool Copy(CvqBStr* to, const std::wstring& from) noexcept {

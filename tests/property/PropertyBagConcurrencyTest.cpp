@@ -4,6 +4,7 @@
 #include <thread>
 #include <vector>
 
+#include "PropertyTestSupport.h"
 #include "property/CuxDynamicPropertyBag.h"
 
 namespace {
@@ -21,13 +22,7 @@ uint32_t WriterTag(uint32_t writer, uint32_t index) {
 uint32_t CountTags(IuxSysPropertyBag4* bag) {
     CountedPtr<IuxSysEnumPropertyTag> tags;
     bag->GetTagEnumerator(tags.Receive());
-    uint32_t buffer[256];
-    uint32_t fetched = 0;
-    uint32_t count = 0;
-    while (tags && SUCCEEDED(tags->Next(256, buffer, &fetched)) && fetched > 0) {
-        count += fetched;
-    }
-    return count;
+    return static_cast<uint32_t>(DrainTags(tags.Get()).size());
 }
 
 // True when the three group tags of `bag` hold one value.
