@@ -1,0 +1,83 @@
+#include "items/ItemHandler.h"
+
+#include <cwctype>
+#include <utility>
+
+#include "support/StatusHolder.h"
+#include "uxsys/StatusCodes.h"
+
+namespace {
+// The rows that every item reports, in the order they are written: a fixed 1, the item name, the
+// numeric attribute, the second name and a fixed 0x150000.
+constexpr uint32_t kTagFixedOne = 0x0101C000;
+constexpr uint32_t kTagItemName = 0x0101D000;
+constexpr uint32_t kTagNumericAttribute = 0x0102A000;
+constexpr uint32_t kTagSecondName = 0x0101F000;
+constexpr uint32_t kTagFixedValue = 0x01037000;
+constexpr uint32_t kFixedValue = 0x150000;
+}  // namespace
+
+bool EqualIgnoringCase(const std::wstring& a, const std::wstring& b) {
+    if (a.size() != b.size()) {
+        return false;
+    }
+    for (size_t i = 0; i < a.size(); ++i) {
+        if (std::towupper(static_cast<wint_t>(a[i])) != std::towupper(static_cast<wint_t>(b[i]))) {
+            return false;
+        }
+    }
+    return true;
+}
+
+ItemHandler::ItemHandler(std::wstring itemName, std::wstring secondName, uint32_t numericAttribute)
+    : itemName_(std::move(itemName)),
+      secondName_(std::move(secondName)),
+      numericAttribute_(numericAttribute) {}
+
+ItemHandler::~ItemHandler() = default;
+
+bool ItemHandler::HasItemName(const std::wstring& name) const {
+    return EqualIgnoringCase(itemName_, name);
+}
+
+HRESULT ItemHandler::GetItemProperties(IuxSysPropertyBag* bag) {
+    if (bag == nullptr) {
+        return E_POINTER;
+    }
+    StatusHolder status;
+    status = bag->SetLong(kTagFixedOne, 1);
+    status = bag->SetString(kTagItemName, itemName_.c_str());
+    status = bag->SetLong(kTagNumericAttribute, static_cast<int32_t>(numericAttribute_));
+    status = bag->SetString(kTagSecondName, secondName_.c_str());
+    status = bag->SetULong(kTagFixedValue, kFixedValue);
+    return S_OK;
+}
+
+HRESULT ItemHandler::RefreshProperties(uint32_t /*count*/, const uint32_t* /*tags*/,
+                                       IuxSysPropertyBag* /*bag*/) {
+    return S_OK;
+}
+
+HRESULT ItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* /*changes*/,
+                                             PropertyTagSet& /*validated*/, CvqBStr* /*message*/) {
+    return S_OK;
+}
+
+HRESULT ItemHandler::PersistPropertyChanges(
+    IuxSysPropertyBag* /*changes*/, int32_t& /*persistFlag*/,
+    CountedPtr<vq::targetcfg::IDeviceHandler>& /*deviceHandler*/, bool& /*adapterDisabled*/) {
+    return S_OK;
+}
+
+HRESULT ItemHandler::OnDeferredPersist(
+    IuxSysPropertyBag* /*changes*/, CountedPtr<vq::targetcfg::IDeviceHandler>& /*deviceHandler*/) {
+    return S_OK;
+}
+
+HRESULT ItemHandler::GetImportableTags(PropertyTagSet& /*tags*/) {
+    return S_OK;
+}
+
+bool ItemHandler::IsMatchingItem(IuxSysPropertyBag* /*description*/, bool& /*exactMatch*/) {
+    return false;
+}

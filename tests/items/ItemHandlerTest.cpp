@@ -1,0 +1,99 @@
+// The handler base: the rows it writes, how a failing setter ends them, and name matching.
+#include <gtest/gtest.h>
+
+#include "ItemTestSupport.h"
+#include "property/BagAccess.h"
+#include "property/CuxDynamicPropertyBag.h"
+
+namespace items_test {
+namespace {
+
+TEST(ItemHandlerTest, BaseRowsCarryTheIdentityWithTheirTypes) {
+    CountedPtr<TestHandler> handler = MakeCounted<TestHandler>(L"eth0");
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    ASSERT_EQ(S_OK, handler->GetItemProperties(bag.Get()));
+
+    int32_t signedValue = 0;
+    EXPECT_EQ(S_OK, bag->GetLong(0x0101C000, &signedValue));
+    EXPECT_EQ(1, signedValue);
+    EXPECT_EQ(S_OK, bag->GetLong(0x0102A000, &signedValue));
+    EXPECT_EQ(1000, signedValue);
+    uint32_t unsignedValue = 0;
+    EXPECT_EQ(S_OK, bag->GetULong(0x01037000, &unsignedValue));
+    EXPECT_EQ(0x150000u, unsignedValue);
+    std::wstring text;
+    EXPECT_EQ(S_OK, BagGetWideString(bag.Get(), 0x0101D000, text));
+    EXPECT_EQ(L"eth0", text);
+    EXPECT_EQ(S_OK, BagGetWideString(bag.Get(), 0x0101F000, text));
+    EXPECT_EQ(L"Second eth0", text);
+}
+
+TEST(ItemHandlerTest, FirstFailingSetterIsThrownAndStopsTheRows) {
+    CountedPtr<TestHandler> handler = MakeCounted<TestHandler>(L"eth0");
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    // The numeric attribute's tag already holds text, so the third row fails.
+    ASSERT_EQ(S_OK, bag->SetString(0x0102A000, L"taken"));
+    try {
+        handler->GetItemProperties(bag.Get());
+        FAIL() << "no status thrown";
+    } catch (long status) {
+        EXPECT_EQ(UX_E_PROPERTY_TYPE_MISMATCH, status);
+    }
+    EXPECT_EQ(S_OK, bag->HasTag(0x0101D000));
+    EXPECT_EQ(S_FALSE, bag->HasTag(0x0101F000));
+    EXPECT_EQ(S_FALSE, bag->HasTag(0x01037000));
+}
+
+TEST(ItemHandlerTest, BaseOperationsChangeNothing) {
+    CountedPtr<TestHandler> handler = MakeCounted<TestHandler>(L"eth0");
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    const uint32_t tags[] = {0x0101D000};
+    EXPECT_EQ(S_OK, handler->RefreshProperties(1, tags, bag.Get()));
+    EXPECT_EQ(S_FALSE, bag->HasTag(0x0101D000));
+
+    PropertyTagSet validated;
+    CvqBStr message = nullptr;
+    EXPECT_EQ(S_OK, handler->ValidatePropertyChanges(bag.Get(), validated, &message));
+    EXPECT_TRUE(validated.empty());
+    EXPECT_EQ(nullptr, message);
+
+    int32_t persistFlag = 0;
+    CountedPtr<vq::targetcfg::IDeviceHandler> device;
+    bool adapterDisabled = false;
+    EXPECT_EQ(S_OK,
+              handler->PersistPropertyChanges(bag.Get(), persistFlag, device, adapterDisabled));
+    EXPECT_EQ(0, persistFlag);
+    EXPECT_FALSE(device);
+    EXPECT_FALSE(adapterDisabled);
+
+    PropertyTagSet importable;
+    EXPECT_EQ(S_OK, handler->GetImportableTags(importable));
+    EXPECT_TRUE(importable.empty());
+    bool exact = false;
+    EXPECT_FALSE(handler->IsMatchingItem(bag.Get(), exact));
+    EXPECT_FALSE(exact);
+}
+
+struct NameCase {
+    const wchar_t* itemName;
+    const wchar_t* asked;
+    bool matches;
+};
+
+class ItemNameMatchTest : public ::testing::TestWithParam<NameCase> {};
+
+TEST_P(ItemNameMatchTest, ComparesWholeNamesIgnoringCase) {
+    const NameCase& c = GetParam();
+    CountedPtr<TestHandler> handler = MakeCounted<TestHandler>(c.itemName);
+    EXPECT_EQ(c.matches, handler->HasItemName(c.asked));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Names, ItemNameMatchTest,
+    ::testing::Values(NameCase{L"eth0", L"eth0", true}, NameCase{L"eth0", L"ETH0", true},
+                      NameCase{L"VQ KEST Chassis", L"vq kest chassis", true},
+                      NameCase{L"eth0", L"eth", false}, NameCase{L"eth0", L"eth00", false},
+                      NameCase{L"eth0", L"eth1", false}, NameCase{L"eth0", L"", false}));
+
+}  // namespace
+}  // namespace items_test
