@@ -230,7 +230,7 @@ int TextStart(std::string_view bytes) {
     return startsWith("\xEF\xBB\xBF"sv) ? 3 : 0;
 }
 
-int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, time_t* modified) {
+int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, timespec* modified) {
     if (path == nullptr || *path == '\0') {
         return kIniInvalidArgument;
     }
@@ -272,7 +272,7 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, tim
         return start;
     }
     ParseIni(text.substr(static_cast<size_t>(start)), readFlags, document);
-    *modified = status.st_mtim.tv_sec;
+    *modified = status.st_mtim;
     return 0;
 }
 

@@ -18,7 +18,7 @@ void ParseIni(std::string_view text, uint32_t readFlags, IniDocument& document);
 int TextStart(std::string_view bytes);
 
 // Reads and parses the file at `path` into `document` (which must be empty) and gives its
-// modification time in whole seconds. Returns 0 or an engine failure.
-int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, time_t* modified);
+// modification time. Returns 0 or an engine failure.
+int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, timespec* modified);
 
 }  // namespace kest_ini

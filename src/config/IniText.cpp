@@ -23,7 +23,7 @@ struct IniText {
     kest_ini::WriteOptions writeOptions;
     bool hasFile = false;  // a file was loaded or saved: `path` and `modified` describe it
     std::string path;
-    time_t modified = 0;
+    timespec modified{};  // in full resolution: a rewrite within the same second is a change
     std::string decoded;  // scratch buffer of IniText_GetEscapedString
 };
 
@@ -122,7 +122,7 @@ void IniText_SetNameOptions(IniText* ini, bool uniqueNames, bool caseSensitive) 
 int IniText_Load(IniText* ini, const char* path) {
     return Guarded([&] {
         kest_ini::IniDocument fresh(ini->document.UniqueNames(), ini->document.CaseSensitive());
-        time_t modified = 0;
+        timespec modified{};
         int result = kest_ini::ReadIniFile(path, ini->readFlags, fresh, &modified);
         if (result < 0) {
             return result;
@@ -142,7 +142,7 @@ int IniText_Save(IniText* ini, const char* path) {
     return Guarded([&] {
         std::string text;
         int result = kest_ini::FormatIni(ini->document, ini->writeOptions, text);
-        time_t modified = 0;
+        timespec modified{};
         if (result == 0) {
             result = kest_ini::WriteIniFile(path, text, ini->writeOptions.flags, &modified);
         }
@@ -164,7 +164,9 @@ int IniText_HasFileChanged(const IniText* ini) {
     if (stat(ini->path.c_str(), &status) != 0) {
         return errno == ENOENT ? kIniInvalidArgument : kIniCannotOpenForReading;
     }
-    return status.st_mtim.tv_sec != ini->modified ? 1 : 0;
+    bool same = status.st_mtim.tv_sec == ini->modified.tv_sec &&
+                status.st_mtim.tv_nsec == ini->modified.tv_nsec;
+    return same ? 0 : 1;
 }
 
 int IniText_GetString(const IniText* ini, const char* section, const char* key,

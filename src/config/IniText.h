@@ -70,8 +70,9 @@ void IniText_SetNameOptions(IniText* ini, bool uniqueNames, bool caseSensitive);
 int IniText_Load(IniText* ini, const char* path);
 // Writes the document to `path` following the write options.
 int IniText_Save(IniText* ini, const char* path);
-// 1 when the remembered file's modification time differs from the remembered one, 0 when it is
-// the same, negative when there is no remembered file or it cannot be examined.
+// 1 when the remembered file's modification time (to the nanosecond) differs from the one
+// remembered at the last load or save, 0 when it is the same, negative when there is no
+// remembered file or it cannot be examined.
 int IniText_HasFileChanged(const IniText* ini);
 
 // Pointer to the stored value (valid until the key is changed or the document destroyed).

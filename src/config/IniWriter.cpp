@@ -216,7 +216,7 @@ std::string TemporaryPathFor(std::string_view target) {
     return path;
 }
 
-int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, time_t* modified) {
+int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, timespec* modified) {
     if (path == nullptr || *path == '\0') {
         return kIniInvalidArgument;
     }
@@ -268,7 +268,7 @@ int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, t
         return kIniCannotWriteTarget;
     }
     struct stat current;
-    *modified = stat(path, &current) == 0 ? current.st_mtim.tv_sec : 0;
+    *modified = stat(path, &current) == 0 ? current.st_mtim : timespec{};
     return 0;
 }
 

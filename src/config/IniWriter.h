@@ -28,7 +28,7 @@ int FormatIni(const IniDocument& document, const WriteOptions& options, std::str
 std::string TemporaryPathFor(std::string_view target);
 
 // Writes `text` to `path` according to the write flags and gives the new file's modification
-// time in whole seconds. Returns 0 or an engine failure.
-int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, time_t* modified);
+// time. Returns 0 or an engine failure.
+int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, timespec* modified);
 
 }  // namespace kest_ini

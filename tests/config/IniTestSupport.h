@@ -12,11 +12,7 @@
 
 #include "common/TempSysroot.h"
 #include "config/IniText.h"
-
-struct IniTextDeleter {
-    void operator()(IniText* ini) const { IniText_Destroy(ini); }
-};
-using IniTextPtr = std::unique_ptr<IniText, IniTextDeleter>;
+#include "config/IniTextPtr.h"
 
 inline IniTextPtr NewIniText() {
     return IniTextPtr(IniText_Create());

@@ -1,0 +1,12 @@
+// Owning handle of an IniText document: destroys it with IniText_Destroy.
+#pragma once
+
+#include <memory>
+
+#include "config/IniText.h"
+
+struct IniTextDeleter {
+    void operator()(IniText* ini) const { IniText_Destroy(ini); }
+};
+
+using IniTextPtr = std::unique_ptr<IniText, IniTextDeleter>;

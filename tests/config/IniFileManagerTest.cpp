@@ -1,0 +1,169 @@
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <atomic>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "IniTestSupport.h"
+#include "config/IniFileManager.h"
+#include "support/Sleep.h"
+#include "uxsys/StatusCodes.h"
+
+using kest::test::TempSysroot;
+
+namespace {
+
+// Gives the file the modification time `seconds` (Unix time), as an edit at that time would,
+// and waits until the cache examines loaded files again.
+void SetModificationTime(const std::string& path, time_t seconds) {
+    struct timespec times[2] = {{0, UTIME_OMIT}, {seconds, 0}};
+    ASSERT_EQ(utimensat(AT_FDCWD, path.c_str(), times, 0), 0);
+    vq::dsc::osdep::SleepMs(2 * IniFileManager::kChangeCheckIntervalMs + 5);
+}
+
+class IniFileManagerTest : public ::testing::Test {
+  protected:
+    std::string Read(const std::string& path, const char* section, const char* key) {
+        std::string value = "<untouched>";
+        HRESULT status = cache_->GetStringFromIni(path, section, key, value);
+        return status == S_OK ? value : status == S_FALSE ? "<absent>" : "<failed>";
+    }
+
+    TempSysroot dir_;
+    std::shared_ptr<IniFileManager> cache_ = IniFileManager::GetInstance();
+};
+
+TEST_F(IniFileManagerTest, OneInstanceWhileReferencedAndAFreshOneAfterwards) {
+    std::string path = dir_.PathOf("/a.ini");
+    WriteBytes(path, "[s]\nk=1\n");
+    EXPECT_EQ(IniFileManager::GetInstance(), cache_);
+    ASSERT_EQ(cache_->SetStringInIni(path, "s", "k", "unsaved"), S_OK);
+    EXPECT_EQ(Read(path, "s", "k"), "unsaved");
+    cache_.reset();
+    cache_ = IniFileManager::GetInstance();
+    EXPECT_EQ(Read(path, "s", "k"), "1");
+}
+
+TEST_F(IniFileManagerTest, MissingFileIsCachedEmptyUntilItAppears) {
+    std::string path = dir_.PathOf("/late.ini");
+    EXPECT_EQ(Read(path, "s", "k"), "<absent>");
+    WriteBytes(path, "[s]\nk=\"quoted\"\nempty=\n");
+    EXPECT_EQ(Read(path, "s", "k"), "quoted");
+    EXPECT_EQ(Read(path, "S", "EMPTY"), "");
+}
+
+TEST_F(IniFileManagerTest, ReloadsWhenTheModificationTimeChangesOnly) {
+    std::string path = dir_.PathOf("/change.ini");
+    WriteBytes(path, "[s]\nk=1\n");
+    SetModificationTime(path, 1000000000);
+    EXPECT_EQ(Read(path, "s", "k"), "1");
+    WriteBytes(path, "[s]\nk=2\n");
+    SetModificationTime(path, 1000000000);
+    EXPECT_EQ(Read(path, "s", "k"), "1");
+    SetModificationTime(path, 1000000050);
+    EXPECT_EQ(Read(path, "s", "k"), "2");
+    WriteBytes(path, "[s]\nk=3\n");
+    SetModificationTime(path, 1000000050);
+    EXPECT_EQ(Read(path, "s", "k"), "2");
+    // A rewrite within the same second is still a change.
+    struct timespec times[2] = {{0, UTIME_OMIT}, {1000000050, 5000}};
+    ASSERT_EQ(utimensat(AT_FDCWD, path.c_str(), times, 0), 0);
+    vq::dsc::osdep::SleepMs(2 * IniFileManager::kChangeCheckIntervalMs + 5);
+    EXPECT_EQ(Read(path, "s", "k"), "3");
+    ASSERT_EQ(unlink(path.c_str()), 0);
+    vq::dsc::osdep::SleepMs(2 * IniFileManager::kChangeCheckIntervalMs + 5);
+    EXPECT_EQ(Read(path, "s", "k"), "3");
+}
+
+TEST_F(IniFileManagerTest, UnsavedChangesAreNotOverwrittenByAReload) {
+    std::string path = dir_.PathOf("/mine.ini");
+    WriteBytes(path, "[s]\nk=1\n");
+    ASSERT_EQ(cache_->SetStringInIni(path, "s", "k", "mine"), S_OK);
+    WriteBytes(path, "[s]\nk=theirs\n");
+    SetModificationTime(path, time(nullptr) + 100);
+    EXPECT_EQ(Read(path, "s", "k"), "mine");
+    EXPECT_EQ(cache_->SetStringInIni(path, "s", "k", "a\nb"), E_INVALIDARG);
+    EXPECT_EQ(cache_->SetStringInIni(path, "", "k", "v"), E_INVALIDARG);
+}
+
+TEST_F(IniFileManagerTest, FlushSavesModifiedFilesOnlyAndOnce) {
+    std::string existing = dir_.PathOf("/existing.ini");
+    std::string created = dir_.PathOf("/created.ini");
+    std::string untouched = dir_.PathOf("/untouched.ini");
+    WriteBytes(existing, "[s]\nold=1\n");
+    ASSERT_EQ(chmod(existing.c_str(), 0600), 0);
+    WriteBytes(untouched, "[u]\nk=1\n");
+    EXPECT_EQ(cache_->FlushIniCache(), S_FALSE);
+    EXPECT_EQ(Read(untouched, "u", "k"), "1");
+
+    ASSERT_EQ(cache_->SetStringInIni(existing, "s", "new", "a b"), S_OK);
+    ASSERT_EQ(cache_->SetStringInIni(created, "t", "k", "v"), S_OK);
+    WriteBytes(untouched, "changed outside");
+    EXPECT_EQ(cache_->FlushIniCache(), S_OK);
+    EXPECT_EQ(ReadBytes(existing), "[s]\nold = 1\nnew = \"a b\"\n\n");
+    EXPECT_EQ(ReadBytes(created), "[t]\nk = \"v\"\n\n");
+    EXPECT_EQ(ReadBytes(untouched), "changed outside");
+    EXPECT_FALSE(dir_.Exists("/existing.TMP"));
+    struct stat status;
+    ASSERT_EQ(stat(existing.c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0600u);
+    ASSERT_EQ(stat(created.c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0664u);
+    EXPECT_EQ(cache_->FlushIniCache(), S_FALSE);
+    EXPECT_EQ(Read(existing, "s", "new"), "a b");
+}
+
+TEST_F(IniFileManagerTest, FailedFlushKeepsTheChangeForTheNextTry) {
+    std::string blocker = dir_.PathOf("/blocker");
+    WriteBytes(blocker, "a regular file, not a directory");
+    std::string path = blocker + "/settings.ini";
+    ASSERT_EQ(cache_->SetStringInIni(path, "s", "k", "v"), S_OK);
+    EXPECT_EQ(cache_->FlushIniCache(), E_FAIL);
+    EXPECT_EQ(Read(path, "s", "k"), "v");
+    ASSERT_EQ(unlink(blocker.c_str()), 0);
+    ASSERT_EQ(mkdir(blocker.c_str(), 0755), 0);
+    EXPECT_EQ(cache_->FlushIniCache(), S_OK);
+    EXPECT_EQ(ReadBytes(path), "[s]\nk = \"v\"\n\n");
+}
+
+TEST_F(IniFileManagerTest, CallerHoldingTheLockMayUseTheCacheRecursively) {
+    std::string path = dir_.PathOf("/locked.ini");
+    WriteBytes(path, "[s]\nk=1\n");
+    vq::dsc::ScopedLock lock(IniFileManager::CacheLock());
+    uint32_t value = 0;
+    EXPECT_EQ(IniText_GetUInt32(cache_->GetIniCacheEntry(path), "s", "k", &value), kIniFound);
+    EXPECT_EQ(value, 1u);
+    EXPECT_EQ(Read(path, "s", "k"), "1");
+}
+
+TEST_F(IniFileManagerTest, ConcurrentReadersAndAWriterSeeWholeValues) {
+    std::string path = dir_.PathOf("/shared.ini");
+    WriteBytes(path, "[s]\nk=initial\n");
+    std::atomic<bool> stop{false};
+    std::atomic<int> bad{0};
+    std::vector<std::thread> readers;
+    for (int i = 0; i < 3; ++i) {
+        readers.emplace_back([&] {
+            while (!stop) {
+                std::string value = Read(path, "s", "k");
+                if (value != "initial" && value.rfind("value-", 0) != 0) {
+                    ++bad;
+                }
+            }
+        });
+    }
+    for (int round = 0; round < 50; ++round) {
+        ASSERT_EQ(cache_->SetStringInIni(path, "s", "k", "value-" + std::to_string(round)), S_OK);
+        ASSERT_EQ(cache_->FlushIniCache(), S_OK);
+    }
+    stop = true;
+    for (std::thread& reader : readers) {
+        reader.join();
+    }
+    EXPECT_EQ(bad, 0);
+    EXPECT_EQ(Read(path, "s", "k"), "value-49");
+}
+
+}  // namespace
