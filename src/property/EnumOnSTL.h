@@ -4,6 +4,7 @@
 #pragma once
 
 #include <cstdint>
+#include <utility>
 
 #include "com/CVQComMultiThreadModelNoCS.h"
 #include "com/CVQComObject.h"
