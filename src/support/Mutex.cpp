@@ -75,19 +75,25 @@ void Mutex::Unlock() {
     if (!IsOwnedByCurrentThread()) {
         throw exception::InvalidOperation();
     }
-    if (recursionCount_.fetch_sub(1) == 1) {
-        owner_.store(pthread_t{});
+    // Only the owner writes these fields, so relaxed accesses suffice: another thread can never
+    // see its own identity in owner_ unless it stored it there itself.
+    const uint32_t remaining = recursionCount_.load(std::memory_order_relaxed) - 1;
+    recursionCount_.store(remaining, std::memory_order_relaxed);
+    if (remaining == 0) {
+        owner_.store(pthread_t{}, std::memory_order_relaxed);
     }
     pthread_mutex_unlock(&mutex_);
 }
 
 bool Mutex::IsOwnedByCurrentThread() const {
-    return recursionCount_.load() > 0 && pthread_equal(owner_.load(), pthread_self()) != 0;
+    return recursionCount_.load(std::memory_order_relaxed) > 0 &&
+           pthread_equal(owner_.load(std::memory_order_relaxed), pthread_self()) != 0;
 }
 
 void Mutex::RecordAcquired() {
-    owner_.store(pthread_self());
-    recursionCount_.fetch_add(1);
+    owner_.store(pthread_self(), std::memory_order_relaxed);
+    recursionCount_.store(recursionCount_.load(std::memory_order_relaxed) + 1,
+                          std::memory_order_relaxed);
 }
 
 }  // namespace dsc

@@ -29,7 +29,7 @@ class Mutex {
     // True when the calling thread owns the mutex.
     bool IsOwnedByCurrentThread() const;
     // How many times the owner has locked the mutex (0 when it is free).
-    uint32_t RecursionCount() const { return recursionCount_.load(); }
+    uint32_t RecursionCount() const { return recursionCount_.load(std::memory_order_relaxed); }
 
   private:
     void RecordAcquired();
