@@ -36,7 +36,7 @@ constexpr uint32_t UX_PROPERTY_TYPE_TIMESTAMP = 7;
 // UX_E_PROPERTY_TYPE_MISMATCH for a value of another type.
 class IuxSysPropertyBag : public IUnknown {
   public:
-    // Slot 3: an enumerator over a snapshot of all tags; S_FALSE (result untouched) when empty.
+    // Slot 3: an enumerator over a snapshot of all tags; S_FALSE and a null result when empty.
     virtual HRESULT GetTagEnumerator(IuxSysEnumPropertyTag** tags) = 0;
     // Slot 4: S_OK when the tag is present, S_FALSE when not.
     virtual HRESULT HasTag(uint32_t tag) = 0;
