@@ -1,0 +1,61 @@
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <cstdio>
+#include <cstring>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "support/Guid.h"
+#include "support/HostInfo.h"
+
+using vq::dsc::Guid;
+using vq::dsc::GuidToString;
+
+namespace {
+
+uint64_t TimestampOf(const Guid& guid) {
+    return (uint64_t(guid.Data3 & 0x0FFF) << 48) | (uint64_t(guid.Data2) << 32) | guid.Data1;
+}
+
+TEST(Guid, SameBytesAsGuidAndTextFormWritesFieldsAsNumbers) {
+    const GUID sample = {
+        0x999d9aa4, 0x5475, 0x4ca7, {0xa5, 0x60, 0x93, 0xc5, 0x1b, 0x5b, 0xfc, 0xeb}};
+    const Guid converted(sample);
+    EXPECT_EQ(0, std::memcmp(&converted, &sample, sizeof(GUID)));
+    EXPECT_TRUE(static_cast<GUID>(converted) == sample);
+    EXPECT_EQ(L"{999D9AA4-5475-4CA7-A560-93C51B5BFCEB}", GuidToString(sample));
+    EXPECT_EQ(L"{00000001-0002-0003-0004-000000000005}",
+              GuidToString(GUID{1, 2, 3, {0, 4, 0, 0, 0, 0, 0, 5}}));
+}
+
+TEST(Guid, TimeBasedNeverRepeatAndCarryVersionVariantAndNode) {
+    std::vector<Guid> made(20000);
+    for (Guid& guid : made) {
+        guid = Guid::CreateTimeBased();
+    }
+    std::set<std::wstring> texts;
+    for (size_t i = 0; i < made.size(); ++i) {
+        ASSERT_EQ(0x1000, made[i].Data3 & 0xF000) << "version 1";
+        ASSERT_EQ(0x80, made[i].Data4[0] & 0xC0) << "variant bits 10";
+        ASSERT_TRUE(texts.insert(GuidToString(made[i])).second) << "repeated at " << i;
+        ASSERT_TRUE(i == 0 || TimestampOf(made[i]) > TimestampOf(made[i - 1]));
+        ASSERT_EQ(0, std::memcmp(made[i].Data4, made[0].Data4, 8)) << "sequence and node stay";
+    }
+    // 100-ns intervals from 1582-10-15 to 2020-01-01.
+    EXPECT_GT(TimestampOf(made[0]), (12219292800ull + 1577836800ull) * 10000000ull);
+
+    const uint8_t* node = &made[0].Data4[2];
+    const std::string address = vq::dsc::osdep::FirstAdapterHardwareAddress();
+    char text[18];
+    std::snprintf(text, sizeof(text), "%02x:%02x:%02x:%02x:%02x:%02x", node[0], node[1], node[2],
+                  node[3], node[4], node[5]);
+    if (address == "00:00:00:00:00:00") {
+        EXPECT_EQ(0x80, node[0] & 0x80) << "a random node is marked";
+    } else {
+        EXPECT_EQ(address, text);
+    }
+}
+
+}  // namespace
