@@ -1,0 +1,180 @@
+// Validation and persistence of changes to the system item.
+#include "property/BagAccess.h"
+#include "support/ConvertStatusCode.h"
+#include "support/CurrentExceptionToStatus.h"
+#include "support/StatusHolder.h"
+#include "support/TextConversion.h"
+#include "support/TraceGate.h"
+#include "system/KestDeviceItemHandler.h"
+#include "system/PropertyBag2.h"
+#include "system/SystemItemTags.h"
+#include "system/SystemItemValidation.h"
+#include "vq/targetcfg/System.h"
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
+namespace {
+
+namespace targetsystem = vq::targetcfg::system;
+
+// The verdict's status, with its message stored when it is a rejection.
+HRESULT Report(const ValidationVerdict& verdict, CvqBStr* message) {
+    if (!verdict.Passed()) {
+        StoreValidationMessage(message, verdict.message);
+    }
+    return verdict.status;
+}
+
+std::string ReadNarrowString(IuxSysPropertyBag* bag, uint32_t tag) {
+    std::string value;
+    StatusHolder status;
+    status = BagGetNarrowString(bag, tag, value);
+    return value;
+}
+
+}  // namespace
+
+HRESULT KestDeviceItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* changes,
+                                                       PropertyTagSet& validated,
+                                                       CvqBStr* message) {
+    vq::dsc::ScopedLock lock(mutex_);
+    TraceIfEnabled("ValidatePropertyChanges", kTraceEntry);
+    if (changes == nullptr) {
+        return E_POINTER;
+    }
+    try {
+        CountedPtr<IuxSysEnumPropertyTag> tags;
+        const HRESULT listed = QueryPropertyBag2(changes)->GetModifiedTagEnumerator(tags.Receive());
+        if (listed < 0) {
+            return listed;
+        }
+        if (!tags) {
+            return S_FALSE;
+        }
+        uint32_t tag = 0;
+        while (tags->Next(1, &tag, nullptr) == S_OK) {
+            const HRESULT verdict = ValidateChange(tag, changes, message);
+            if (verdict < 0) {
+                return verdict;
+            }
+            if (verdict == S_OK) {
+                validated.insert(tag);
+            }
+        }
+        return S_OK;
+    } catch (...) {
+        return CurrentExceptionToStatus();
+    }
+}
+
+HRESULT KestDeviceItemHandler::ValidateChange(uint32_t tag, IuxSysPropertyBag* bag,
+                                              CvqBStr* message) {
+    StatusHolder status;
+    switch (tag) {
+        case SystemTag::kHostName:
+            return Report(CheckHostName(ReadNarrowString(bag, tag)), message);
+        case SystemTag::kComment:
+            return Report(CheckComment(ReadNarrowString(bag, tag)), message);
+        case SystemTag::kLocaleCode: {
+            std::wstring localeCode;
+            status = BagGetWideString(bag, tag, localeCode);
+            return Report(CheckLocaleCode(localeCode, localeCodes_), message);
+        }
+        case SystemTag::kCurrentTime: {
+            uxSysAttrTimestampUTC time{};
+            status = QueryPropertyBag2(bag)->GetTimestamp(tag, &time);
+            return Report(CheckCurrentTime(time), message);
+        }
+        case SystemTag::kOlsonTimeZone:
+            return timeAssistant_.ValidateOlsonOrLegacyTimeZone(ReadNarrowString(bag, tag), true,
+                                                                message);
+        case SystemTag::kLegacyTimeZone:
+            return timeAssistant_.ValidateOlsonOrLegacyTimeZone(ReadNarrowString(bag, tag), false,
+                                                                message);
+        case SystemTag::kWebServiceEnabled: {
+            bool enabled = false;
+            status = BagGetBool(bag, tag, enabled);
+            return S_OK;
+        }
+        default:
+            return S_FALSE;
+    }
+}
+
+HRESULT KestDeviceItemHandler::PersistPropertyChanges(
+    IuxSysPropertyBag* changes, int32_t& persistFlag,
+    CountedPtr<vq::targetcfg::IDeviceHandler>& /*deviceHandler*/, bool& /*adapterDisabled*/) {
+    vq::dsc::ScopedLock lock(mutex_);
+    TraceIfEnabled("PersistPropertyChanges", kTraceEntry);
+    if (changes == nullptr) {
+        return E_POINTER;
+    }
+    try {
+        CountedPtr<IuxSysEnumPropertyTag> tags;
+        StatusHolder status;
+        status = QueryPropertyBag2(changes)->GetModifiedTagEnumerator(tags.Receive());
+        if (!tags) {
+            return S_FALSE;
+        }
+
+        // The clock correction uses the time zone in force before any change is applied.
+        int32_t clockCorrection = 0;
+        if (EnumeratorHasTag(tags.Get(), SystemTag::kLegacyTimeZone)) {
+            std::wstring newLegacyText;
+            BagGetWideString(changes, SystemTag::kLegacyTimeZone, newLegacyText);
+            vq::targetcfg::NarrowString currentTimeZone;
+            status = ConvertStatusCode(targetsystem::GetTimeZone(currentTimeZone));
+            clockCorrection =
+                timeAssistant_.GetLegacyOffsetDifference(currentTimeZone.str(), newLegacyText);
+        }
+
+        status = tags->Reset();
+        bool clockRequested = false;
+        uint32_t tag = 0;
+        while (tags->Next(1, &tag, nullptr) == S_OK) {
+            if (tag == SystemTag::kCurrentTime) {
+                clockRequested = true;
+            } else {
+                PersistChange(tag, changes, persistFlag);
+            }
+        }
+        if (clockRequested) {
+            status = timeAssistant_.PersistSystemPropertyCurrentTime(changes, clockCorrection);
+        }
+        return S_OK;
+    } catch (...) {
+        return CurrentExceptionToStatus();
+    }
+}
+
+void KestDeviceItemHandler::PersistChange(uint32_t tag, IuxSysPropertyBag* bag,
+                                          int32_t& persistFlag) {
+    StatusHolder status;
+    switch (tag) {
+        case SystemTag::kHostName:
+            status = ConvertStatusCode(targetsystem::SetHostName(ReadNarrowString(bag, tag)));
+            persistFlag = 1;
+            break;
+        case SystemTag::kComment:
+            status = ConvertStatusCode(targetsystem::SetUserComment(ReadNarrowString(bag, tag)));
+            break;
+        case SystemTag::kLocaleCode:
+            status = ConvertStatusCode(targetsystem::SetLanguageName(ReadNarrowString(bag, tag)));
+            persistFlag = 1;
+            break;
+        case SystemTag::kLegacyTimeZone:
+        case SystemTag::kOlsonTimeZone:
+            status = timeAssistant_.PersistSystemPropertyTimezone(tag, bag, persistFlag);
+            break;
+        case SystemTag::kWebServiceEnabled: {
+            bool enabled = false;
+            status = BagGetBool(bag, tag, enabled);
+            webServiceSettings_.SetWebServiceEnabled(enabled);
+            persistFlag = 1;
+            break;
+        }
+        default:
+            break;
+    }
+}
+
+}  // namespace nVQKESTSYSAPICHASSISEXPERT100

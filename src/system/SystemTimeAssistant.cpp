@@ -1,0 +1,230 @@
+#include "system/SystemTimeAssistant.h"
+
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdint>
+
+#include "property/BagAccess.h"
+#include "support/ConvertStatusCode.h"
+#include "support/Exceptions.h"
+#include "support/ExternalApplication.h"
+#include "support/StatusHolder.h"
+#include "support/Sysroot.h"
+#include "support/SystemClock.h"
+#include "support/TextConversion.h"
+#include "support/TraceGate.h"
+#include "system/PropertyBag2.h"
+#include "system/SystemItemTags.h"
+#include "system/SystemItemValidation.h"
+#include "vq/targetcfg/System.h"
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
+namespace {
+
+namespace targetsystem = vq::targetcfg::system;
+
+constexpr char kLegacyToOlsonSection[] = "LegacyToOlson";
+constexpr char kOlsonToLegacySection[] = "OlsonToLegacy";
+constexpr char kUnmappedLegacyTimeZone[] = "CUT0";
+constexpr wchar_t kTimeZoneMessage[] = L"Timezone not supported.";
+
+// The hardware-clock arguments: without a usable drift file the clock is taken as UTC and the
+// drift file is left alone.
+constexpr wchar_t kHardwareClockArgumentsWithoutAdjtime[] = L"--systohc --noadjfile --utc";
+constexpr wchar_t kHardwareClockArguments[] = L"--systohc";
+
+__extension__ typedef __int128 Wide;
+__extension__ typedef unsigned __int128 UnsignedWide;
+constexpr int64_t kMicrosecondsPerSecond = 1000000;
+
+// Copies the system time to the hardware clock with the hardware-clock tool and waits for it.
+void CopySystemTimeToHardwareClock() {
+    const bool adjtimeUsable = access(kest::paths::AdjtimeFile().c_str(), R_OK | W_OK) == 0;
+    vq::dsc::osdep::ExternalApplication tool;
+    tool.StartCommandLine(
+        vq::dsc::WideFromNarrow(kest::paths::HardwareClockTool()),
+        adjtimeUsable ? kHardwareClockArguments : kHardwareClockArgumentsWithoutAdjtime);
+    tool.Wait();
+    if (tool.ExitResult() != 0) {
+        throw vq::dsc::osdep::PosixError(
+            "hardware clock update ended with " + std::to_string(tool.ExitResult()), EIO);
+    }
+}
+
+}  // namespace
+
+SystemTimeAssistant::SystemTimeAssistant() : legacyTable_(BuiltInLegacyTimeZones()) {
+    TraceIfEnabled("SystemTimeAssistant", kTraceEntry);
+    iniCache_ = IniFileManager::GetInstance();
+}
+
+SystemTimeAssistant::~SystemTimeAssistant() {
+    TraceIfEnabled("~SystemTimeAssistant", kTraceEntry);
+}
+
+HRESULT SystemTimeAssistant::Lookup(const char* section, const std::string& key,
+                                    std::string& value) {
+    std::string found;
+    const HRESULT status =
+        iniCache_->GetStringFromIni(kest::paths::TimeZoneTableFile(), section, key, found);
+    if (status != S_OK) {
+        return status;
+    }
+    if (found.empty()) {
+        return S_FALSE;
+    }
+    value = found;
+    return S_OK;
+}
+
+HRESULT SystemTimeAssistant::LookupLegacyToOlson(const std::string& legacyText,
+                                                 std::string& olsonName) {
+    return Lookup(kLegacyToOlsonSection, legacyText, olsonName);
+}
+
+HRESULT SystemTimeAssistant::LookupOlsonToLegacy(const std::string& olsonName,
+                                                 std::string& legacyText) {
+    return Lookup(kOlsonToLegacySection, olsonName, legacyText);
+}
+
+std::string SystemTimeAssistant::GetOlsonTimeZone() {
+    vq::targetcfg::NarrowString timeZone;
+    StatusHolder status;
+    status = ConvertStatusCode(targetsystem::GetTimeZone(timeZone));
+    return timeZone.str();
+}
+
+std::string SystemTimeAssistant::GetLegacyTimeZone() {
+    const std::string olsonName = GetOlsonTimeZone();
+    std::string legacyText = kUnmappedLegacyTimeZone;
+    StatusHolder status;
+    status = LookupOlsonToLegacy(olsonName, legacyText);
+    return legacyText;
+}
+
+HRESULT SystemTimeAssistant::FindLegacyOffset(const std::string& text, int32_t& seconds) const {
+    for (const LegacyTimeZone& zone : legacyTable_) {
+        if (zone.standardText == text || zone.daylightText == text) {
+            seconds = zone.offset * kSecondsPerLegacyOffsetUnit;
+            return S_OK;
+        }
+    }
+    return S_FALSE;
+}
+
+int32_t SystemTimeAssistant::GetLegacyOffsetDifference(const std::string& first,
+                                                       const std::wstring& second) const {
+    int32_t firstOffset = 0;
+    int32_t secondOffset = 0;
+    FindLegacyOffset(first, firstOffset);
+    FindLegacyOffset(vq::dsc::NarrowFromWide(second), secondOffset);
+    return firstOffset - secondOffset;
+}
+
+HRESULT SystemTimeAssistant::ValidateOlsonOrLegacyTimeZone(const std::string& text, bool olsonForm,
+                                                           CvqBStr* message) {
+    TraceIfEnabled("SystemTimeAssistant::ValidateOlsonOrLegacyTimeZone()", kTraceEntry);
+    StatusHolder status;
+    if (olsonForm) {
+        status = ConvertStatusCode(targetsystem::ValidateTimeZone(text));
+        return S_OK;
+    }
+    std::string olsonName;
+    status = LookupLegacyToOlson(text, olsonName);
+    if (status.Get() == S_FALSE) {
+        TraceIfEnabled("ValidateOlsonOrLegacyTimeZone() failed", kTraceErrors);
+        StoreValidationMessage(message, kTimeZoneMessage);
+        return UX_E_VALUE_INVALID;
+    }
+    return S_OK;
+}
+
+HRESULT SystemTimeAssistant::PersistSystemPropertyTimezone(uint32_t tag, IuxSysPropertyBag* bag,
+                                                           int32_t& /*persistFlag*/) {
+    TraceIfEnabled("SystemTimeAssistant::PersistSystemPropertyTimezone()", kTraceEntry);
+    if (bag == nullptr) {
+        return E_POINTER;
+    }
+    if (tag != SystemTag::kLegacyTimeZone && tag != SystemTag::kOlsonTimeZone) {
+        throw static_cast<long>(E_FAIL);
+    }
+    std::string newText;
+    const HRESULT read = BagGetNarrowString(bag, tag, newText);
+    if (read < 0) {
+        return read;
+    }
+    std::string olsonName;
+    if (tag == SystemTag::kLegacyTimeZone) {
+        if (newText == GetLegacyTimeZone()) {
+            return S_FALSE;
+        }
+        StatusHolder status;
+        status = LookupLegacyToOlson(newText, olsonName);
+    } else {
+        if (newText == GetOlsonTimeZone()) {
+            return S_FALSE;
+        }
+        olsonName = newText;
+    }
+    // An empty name would leave the controller without a time zone.
+    if (olsonName.empty()) {
+        TraceIfEnabled("PersistSystemPropertyTimezone() failed", kTraceErrors);
+        return UX_E_VALUE_INVALID;
+    }
+    StatusHolder status;
+    status = ConvertStatusCode(targetsystem::SetTimeZone(olsonName));
+    return S_OK;
+}
+
+HRESULT SystemTimeAssistant::PersistSystemPropertyCurrentTime(IuxSysPropertyBag* bag,
+                                                              int32_t offsetSeconds) {
+    TraceIfEnabled("SystemTimeAssistant::PersistSystemPropertyCurrentTime()", kTraceEntry);
+    if (bag == nullptr) {
+        return E_POINTER;
+    }
+    uxSysAttrTimestampUTC timestamp{};
+    StatusHolder status;
+    status = QueryPropertyBag2(bag)->GetTimestamp(SystemTag::kCurrentTime, &timestamp);
+    try {
+        vq::dsc::AbsTime time = vq::dsc::AbsTime::FromTimestamp(timestamp);
+        if (__builtin_add_overflow(time.seconds, offsetSeconds, &time.seconds)) {
+            throw vq::dsc::exception::OutOfRange();
+        }
+        SetCurrentSystemTime(time);
+    } catch (const vq::dsc::exception::Exception&) {
+        TraceIfEnabled("SystemTimeAssistant::PersistSystemPropertyCurrentTime() failed",
+                       kTraceErrors);
+        return E_FAIL;
+    }
+    return S_OK;
+}
+
+bool SystemTimeAssistant::HasRealTimeClock() {
+    for (const std::string& device : kest::paths::RealTimeClockDevices()) {
+        if (access(device.c_str(), R_OK) == 0) {
+            return true;
+        }
+    }
+    return false;
+}
+
+void SystemTimeAssistant::SetCurrentSystemTime(const vq::dsc::AbsTime& time) {
+    const Wide fractionMicroseconds = static_cast<Wide>(
+        (static_cast<UnsignedWide>(time.fraction) * kMicrosecondsPerSecond) >> 64);
+    const Wide microseconds =
+        (static_cast<Wide>(time.seconds) - vq::dsc::AbsTime::kUnixEpochSeconds) *
+            kMicrosecondsPerSecond +
+        fractionMicroseconds;
+    const Wide seconds = microseconds / kMicrosecondsPerSecond;
+    if (seconds < INT64_MIN || seconds > INT64_MAX) {
+        throw vq::dsc::exception::OutOfRange();
+    }
+    kest::SetSystemClock(static_cast<int64_t>(seconds),
+                         static_cast<int64_t>(microseconds % kMicrosecondsPerSecond));
+    if (HasRealTimeClock()) {
+        CopySystemTimeToHardwareClock();
+    }
+}
+
+}  // namespace nVQKESTSYSAPICHASSISEXPERT100
