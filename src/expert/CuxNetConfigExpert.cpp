@@ -1,6 +1,13 @@
 #include "expert/CuxNetConfigExpert.h"
 
+#include <utility>
+
 #include "expert/HostStringResult.h"
+#include "property/CuxDynamicPropertyBag.h"
+#include "property/ItemNameEnumerator.h"
+#include "property/PropertyTagEnumerator.h"
+#include "support/EntryGuard.h"
+#include "support/StatusHolder.h"
 #include "support/TraceGate.h"
 
 namespace {
@@ -9,7 +16,23 @@ constexpr CLSID kFrameworkExpertClassId = {
     0x722d1d51, 0x1c1d, 0x42fe, {0xae, 0xef, 0x5c, 0xf6, 0xc7, 0x11, 0xff, 0xa7}};
 }  // namespace
 
+// Members go in reverse order of declaration: pending tasks, then the item manager.
 CuxNetConfigExpert::~CuxNetConfigExpert() = default;
+
+HRESULT CuxNetConfigExpert::SetItemManager(const CountedPtr<ItemManagerBase>& manager) {
+    if (itemManager_) {
+        return S_FALSE;
+    }
+    itemManager_ = manager;
+    return S_OK;
+}
+
+ItemManagerBase& CuxNetConfigExpert::ItemManager() const {
+    if (!itemManager_) {
+        throw static_cast<long>(E_FAIL);
+    }
+    return *itemManager_;
+}
 
 HRESULT CuxNetConfigExpert::SetPlugPlayCallback(IUnknown* /*callback*/) {
     return E_NOTIMPL;
@@ -63,30 +86,118 @@ HRESULT CuxNetConfigExpert::Uninitialize() {
     return E_NOTIMPL;
 }
 
-HRESULT CuxNetConfigExpert::SearchForItemsAndProperties(IuxSysSearchSink* /*sink*/) {
-    return E_NOTIMPL;
+HRESULT CuxNetConfigExpert::SearchForItemsAndProperties(IuxSysSearchSink* sink) {
+    static constexpr char kFailureText[] = "Failure to populate property bag.";
+    TraceIfEnabled("CuxNetConfigExpert::SearchForItemsAndProperties()", kTraceEntry);
+    if (sink == nullptr) {
+        return E_POINTER;
+    }
+    return GuardEntryPoint(kFailureText, [&]() -> HRESULT {
+        bool delivered = false;
+        for (const CountedPtr<ItemHandler>& handler : ItemManager().GetItemHandlers(true)) {
+            CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+            HRESULT status = S_OK;
+            try {
+                status = handler->GetItemProperties(bag.Get());
+            } catch (long thrown) {
+                TraceStatus(kFailureText, static_cast<HRESULT>(thrown));
+                continue;
+            }
+            if (FAILED(status)) {
+                continue;
+            }
+            StatusHolder sinkStatus;
+            sinkStatus = sink->OnItemFound(bag.Get());
+            delivered = true;
+        }
+        return delivered ? S_OK : S_FALSE;
+    });
 }
 
-HRESULT CuxNetConfigExpert::SearchForItemNames(IuxSysEnumStringList** /*names*/) {
-    return E_NOTIMPL;
+HRESULT CuxNetConfigExpert::SearchForItemNames(IuxSysEnumStringList** names) {
+    TraceIfEnabled("CuxNetConfigExpert::SearchForItemNames()", kTraceEntry);
+    if (names == nullptr) {
+        return E_POINTER;
+    }
+    *names = nullptr;
+    return GuardEntryPoint("Failure to populate item names", [&]() -> HRESULT {
+        ItemNameList itemNames;
+        for (const CountedPtr<ItemHandler>& handler : ItemManager().GetItemHandlers(true)) {
+            itemNames.push_back(handler->ItemName());
+        }
+        *names = CreateItemNameEnumerator(std::move(itemNames)).Detach();
+        return S_OK;
+    });
 }
 
-HRESULT CuxNetConfigExpert::GetPropertiesOfItem(const wchar_t* /*item*/,
-                                                IuxSysPropertyBag** /*properties*/) {
-    return E_NOTIMPL;
+HRESULT CuxNetConfigExpert::GetPropertiesOfItem(const wchar_t* item,
+                                                IuxSysPropertyBag** properties) {
+    TraceIfEnabled("CuxNetConfigExpert::GetPropertiesOfItem()", kTraceEntry);
+    if (item == nullptr || properties == nullptr) {
+        return E_POINTER;
+    }
+    *properties = nullptr;
+    return GuardEntryPoint("Failure to get properties of item", [&]() -> HRESULT {
+        CountedPtr<ItemHandler> handler = ItemManager().GetItemHandler(item);
+        CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+        StatusHolder status;
+        status = handler->GetItemProperties(bag.Get());
+        *properties = bag.Detach();
+        return S_OK;
+    });
 }
 
-HRESULT CuxNetConfigExpert::PopulateOrRefreshProperties(const wchar_t* /*item*/, uint32_t /*count*/,
-                                                        const uint32_t* /*tags*/,
-                                                        IuxSysPropertyBag** /*properties*/) {
-    return E_NOTIMPL;
+HRESULT CuxNetConfigExpert::PopulateOrRefreshProperties(const wchar_t* item, uint32_t count,
+                                                        const uint32_t* tags,
+                                                        IuxSysPropertyBag** properties) {
+    TraceIfEnabled("CuxNetConfigExpert::PopulateOrRefreshProperties()", kTraceEntry);
+    if (item == nullptr || tags == nullptr || properties == nullptr) {
+        return E_POINTER;
+    }
+    *properties = nullptr;
+    return GuardEntryPoint("Error populating properties.", [&]() -> HRESULT {
+        CountedPtr<ItemHandler> handler = ItemManager().GetItemHandler(item);
+        CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+        StatusHolder status;
+        status = handler->RefreshProperties(count, tags, bag.Get());
+        uint32_t present = 0;
+        for (uint32_t i = 0; i < count; ++i) {
+            if (bag->HasTag(tags[i]) == S_OK) {
+                ++present;
+            }
+        }
+        if (present == 0) {
+            TraceIfEnabled("Didn't find any tags.", kTraceErrors);
+            return UX_E_PROPERTY_NOT_FOUND;
+        }
+        *properties = bag.Detach();
+        return present == count ? S_OK : S_FALSE;
+    });
 }
 
-HRESULT CuxNetConfigExpert::ValidatePropertyChanges(const wchar_t* /*item*/,
-                                                    IuxSysPropertyBag* /*changes*/,
-                                                    IuxSysEnumPropertyTag** /*validated*/,
-                                                    CvqBStr* /*message*/) {
-    return E_NOTIMPL;
+HRESULT CuxNetConfigExpert::ValidatePropertyChanges(const wchar_t* item, IuxSysPropertyBag* changes,
+                                                    IuxSysEnumPropertyTag** validated,
+                                                    CvqBStr* message) {
+    TraceIfEnabled("CuxNetConfigExpert::ValidatePropertyChanges()", kTraceEntry);
+    if (message != nullptr) {
+        *message = nullptr;
+    }
+    if (item == nullptr || changes == nullptr || validated == nullptr) {
+        return E_POINTER;
+    }
+    *validated = nullptr;
+    return GuardEntryPoint("Error validating properties", [&]() -> HRESULT {
+        CountedPtr<ItemHandler> handler = ItemManager().GetItemHandler(item);
+        PropertyTagSet validatedTags;
+        StatusHolder status;
+        status = handler->ValidatePropertyChanges(changes, validatedTags, message);
+        if (validatedTags.empty()) {
+            TraceIfEnabled("Empty validated tag set", kTraceErrors);
+            return S_FALSE;
+        }
+        *validated = CreatePropertyTagEnumerator(validatedTags).Detach();
+        return S_OK;
+    });
 }
 
 HRESULT CuxNetConfigExpert::PersistPropertyChanges(const wchar_t* /*item*/,

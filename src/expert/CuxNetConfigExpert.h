@@ -2,8 +2,14 @@
 // operations, over the reference count shared by all of the object's interfaces.
 #pragma once
 
+#include <string>
+#include <vector>
+
 #include "com/CVQComMultiThreadModelNoCS.h"
 #include "com/CVQComObjectRootEx.h"
+#include "com/CountedPtr.h"
+#include "items/ItemManagerBase.h"
+#include "items/RefCountedThreadSafePolicy.h"
 #include "uxsys/Expert.h"
 
 class CuxNetConfigExpert : public IuxSysExpert3,
@@ -26,7 +32,8 @@ class CuxNetConfigExpert : public IuxSysExpert3,
     HRESULT GetExpertVersion(CvqBStr* version) override;
     HRESULT GetExpertProgrammaticName(CvqBStr* name) override;
 
-    // IuxSysExpert and IuxSysExpert2 entry points (not available yet: E_NOTIMPL).
+    // IuxSysExpert and IuxSysExpert2 entry points: each finds the item handlers in the shared
+    // item manager and delegates to them; results are new objects the host releases.
     HRESULT Initialize() override;
     HRESULT Uninitialize() override;
     HRESULT SearchForItemsAndProperties(IuxSysSearchSink* sink) override;
@@ -44,6 +51,21 @@ class CuxNetConfigExpert : public IuxSysExpert3,
     HRESULT ReservedExpert14() override;
     HRESULT ReservedExpert17() override;
 
+    // Installs the shared item manager: S_OK and a reference of its own when the expert has
+    // none yet; S_FALSE, keeping the one it has, otherwise.
+    HRESULT SetItemManager(const CountedPtr<ItemManagerBase>& manager);
+
   protected:
     CuxNetConfigExpert() = default;
+
+  private:
+    // Deferred work started by the last persist, kept alive until the next persist,
+    // Uninitialize or destruction (whichever comes first).
+    using PendingTaskList = std::vector<CountedPtr<vq::dsc::RefCountedThreadSafePolicy>>;
+
+    // The installed item manager; throws E_FAIL (a long) when none is installed.
+    ItemManagerBase& ItemManager() const;
+
+    CountedPtr<ItemManagerBase> itemManager_;
+    PendingTaskList pendingTasks_;
 };

@@ -1,0 +1,123 @@
+// A host's view of one expert for end-to-end tests: a private sysroot with the simulated
+// controller's state file, the loaded plug-in, and small helpers that read results the way a
+// host does.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "LoadedPlugin.h"
+#include "common/TempSysroot.h"
+#include "uxsys/HostString.h"
+#include "uxsys/Interfaces.h"
+
+namespace e2e {
+
+constexpr char kControllerStatePath[] = "/var/lib/vqtargetcfg/state.ini";
+constexpr char kControllerCallLogPath[] = "/var/lib/vqtargetcfg/calls.log";
+constexpr uint32_t kItemNameTag = 0x0101D000;
+constexpr wchar_t kSystemItemName[] = L"VQ KEST Chassis";
+
+// A controller state with one device of the given type and interface name.
+inline std::string StateWithDevice(int type, const std::string& interfaceName) {
+    return "[Device0]\nType = " + std::to_string(type) + "\nInterfaceName = " + interfaceName +
+           "\nIndex = 3\n";
+}
+
+// The text of a host string, which is freed.
+inline std::wstring TakeHostString(CvqBStr str) {
+    CvqBStrHolder holder(str);
+    return std::wstring(str == nullptr ? L"" : str, CvqBStrLength(str));
+}
+
+// Every name an enumerator yields, which is released.
+inline std::vector<std::wstring> TakeNames(IuxSysEnumStringList* names) {
+    std::vector<std::wstring> result;
+    CvqBStr name = nullptr;
+    uint32_t fetched = 0;
+    while (names->Next(1, &name, &fetched) == S_OK && fetched == 1) {
+        result.push_back(TakeHostString(name));
+    }
+    names->Release();
+    return result;
+}
+
+// The item name a property bag carries.
+inline std::wstring ItemNameIn(IuxSysPropertyBag* bag) {
+    CvqBStr name = nullptr;
+    EXPECT_EQ(S_OK, bag->GetString(kItemNameTag, &name));
+    return TakeHostString(name);
+}
+
+// A search sink that records the item name of every bag and answers with a fixed status.
+class RecordingSink : public IuxSysSearchSink {
+  public:
+    explicit RecordingSink(HRESULT answer) : answer_(answer) {}
+
+    HRESULT QueryInterface(const IID& /*iid*/, void** object) override {
+        *object = nullptr;
+        return E_NOINTERFACE;
+    }
+    uint32_t AddRef() override { return ++count_; }
+    uint32_t Release() override { return --count_; }
+    HRESULT Reserved3() override { return E_NOTIMPL; }
+    HRESULT Reserved4() override { return E_NOTIMPL; }
+    HRESULT OnItemFound(IuxSysPropertyBag* item) override {
+        names.push_back(ItemNameIn(item));
+        return answer_;
+    }
+
+    std::vector<std::wstring> names;
+
+  private:
+    HRESULT answer_;
+    std::atomic<uint32_t> count_{1};
+};
+
+// A fixture with a sysroot, the plug-in and one expert from the factory.
+class ExpertHostTest : public ::testing::Test {
+  protected:
+    void SetUp() override {
+        ASSERT_NE(nullptr, plugin.Factory());
+        expert = plugin.CreateExpert();
+        ASSERT_NE(nullptr, expert);
+    }
+    void TearDown() override {
+        if (expert != nullptr) {
+            expert->Release();
+        }
+    }
+
+    void WriteControllerState(const std::string& state) const {
+        sysroot.WriteFile(kControllerStatePath, state);
+    }
+
+    // How often the controller library has been called with `callName`.
+    int ControllerCalls(const std::string& callName) const {
+        std::istringstream log(sysroot.ReadFile(kControllerCallLogPath));
+        int calls = 0;
+        for (std::string line; std::getline(log, line);) {
+            if (line.find("\t" + callName + "\t") != std::string::npos) {
+                ++calls;
+            }
+        }
+        return calls;
+    }
+
+    // The item names the expert reports.
+    std::vector<std::wstring> ItemNames(IuxSysExpert3* from) const {
+        IuxSysEnumStringList* names = nullptr;
+        EXPECT_EQ(S_OK, from->SearchForItemNames(&names));
+        return names == nullptr ? std::vector<std::wstring>{} : TakeNames(names);
+    }
+
+    kest::test::TempSysroot sysroot;
+    LoadedPlugin plugin;
+    IuxSysExpert3* expert = nullptr;
+};
+
+}  // namespace e2e

@@ -1,0 +1,110 @@
+// The item entry points as a host drives them: which items the controller yields, lookups by
+// name, refresh and search results, and the item manager that experts of one process share.
+#include <gtest/gtest.h>
+
+#include <utility>
+
+#include "ExpertHost.h"
+
+namespace e2e {
+namespace {
+
+using Names = std::vector<std::wstring>;
+
+struct DeviceCase {
+    const char* name;
+    std::string state;
+    Names items;
+};
+
+class ItemDiscoveryTest : public ExpertHostTest,
+                          public ::testing::WithParamInterface<DeviceCase> {};
+
+TEST_P(ItemDiscoveryTest, SystemItemComesFirstThenEth0InAnyCase) {
+    WriteControllerState(GetParam().state);
+    EXPECT_EQ(GetParam().items, ItemNames(expert));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Devices, ItemDiscoveryTest,
+    ::testing::Values(
+        DeviceCase{"NoStateFile", "", {kSystemItemName}},
+        DeviceCase{"Eth0", StateWithDevice(1, "eth0"), {kSystemItemName, L"eth0"}},
+        DeviceCase{"UpperCaseEth0", StateWithDevice(1, "ETH0"), {kSystemItemName, L"ETH0"}},
+        DeviceCase{"OtherEthernetName", StateWithDevice(1, "eth1"), {kSystemItemName}},
+        DeviceCase{"Eth0OfAnotherType", StateWithDevice(2, "eth0"), {kSystemItemName}},
+        DeviceCase{
+            "Eth0AfterEth1",
+            StateWithDevice(1, "eth1") + "[Device1]\nType = 1\nInterfaceName = Eth0\nIndex = 4\n",
+            {kSystemItemName, L"Eth0"}}),
+    [](const ::testing::TestParamInfo<DeviceCase>& param) { return param.param.name; });
+
+class ExpertItemsTest : public ExpertHostTest {
+  protected:
+    void SetUp() override {
+        WriteControllerState(StateWithDevice(1, "eth0"));
+        ExpertHostTest::SetUp();
+    }
+};
+
+TEST_F(ExpertItemsTest, PropertiesAreFoundByNameIgnoringCase) {
+    const std::pair<const wchar_t*, const wchar_t*> lookups[] = {
+        {L"ETH0", L"eth0"}, {L"eth0", L"eth0"}, {L"vq kest chassis", kSystemItemName}};
+    for (const auto& [asked, itemName] : lookups) {
+        IuxSysPropertyBag* bag = nullptr;
+        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(asked, &bag)) << asked;
+        ASSERT_NE(nullptr, bag);
+        EXPECT_EQ(itemName, ItemNameIn(bag));
+        bag->Release();
+    }
+    EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
+}
+
+TEST_F(ExpertItemsTest, UnknownItemIsNotFound) {
+    IuxSysPropertyBag* bag = reinterpret_cast<IuxSysPropertyBag*>(this);
+    EXPECT_EQ(UX_E_ITEM_NOT_FOUND, expert->GetPropertiesOfItem(L"eth1", &bag));
+    EXPECT_EQ(nullptr, bag);
+}
+
+TEST_F(ExpertItemsTest, RefreshWithoutTagsFindsNothing) {
+    const uint32_t tag = kItemNameTag;
+    IuxSysPropertyBag* bag = reinterpret_cast<IuxSysPropertyBag*>(this);
+    EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND, expert->PopulateOrRefreshProperties(L"eth0", 0, &tag, &bag));
+    EXPECT_EQ(nullptr, bag);
+    EXPECT_EQ(E_POINTER, expert->PopulateOrRefreshProperties(L"eth0", 1, nullptr, &bag));
+}
+
+TEST_F(ExpertItemsTest, SearchDeliversEveryItemToTheSink) {
+    RecordingSink sink(S_OK);
+    EXPECT_EQ(S_OK, expert->SearchForItemsAndProperties(&sink));
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), sink.names);
+}
+
+TEST_F(ExpertItemsTest, SearchEndsWithTheStatusOfARefusingSink) {
+    const HRESULT refusal = static_cast<HRESULT>(0x80041234u);
+    RecordingSink sink(refusal);
+    EXPECT_EQ(refusal, expert->SearchForItemsAndProperties(&sink));
+    EXPECT_EQ((Names{kSystemItemName}), sink.names);
+    EXPECT_EQ(E_POINTER, expert->SearchForItemsAndProperties(nullptr));
+}
+
+TEST_F(ExpertItemsTest, ExpertsShareOneItemManagerUntilTheLastIsReleased) {
+    IuxSysExpert3* second = plugin.CreateExpert();
+    ASSERT_NE(nullptr, second);
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert));
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second));
+    EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
+
+    EXPECT_EQ(0u, expert->Release());
+    expert = nullptr;
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second));
+    EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
+
+    EXPECT_EQ(0u, second->Release());
+    expert = plugin.CreateExpert();
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert));
+    EXPECT_EQ(2, ControllerCalls("GetDeviceHandlers"));
+}
+
+}  // namespace
+}  // namespace e2e
