@@ -1,5 +1,6 @@
-// The handler of a network adapter item: it holds the controller library's device object and
-// the device index that every network call of the adapter takes.
+// The network side of an adapter item: MAC address, primary-adapter flag, TCP/IP request mode and
+// addresses, EtherCAT master settings and the Ethernet media mode. Every read goes to the
+// controller library afresh; the handler keeps only the device object and its index.
 #pragma once
 
 #include <cstdint>
@@ -11,6 +12,27 @@
 
 class NetworkItemHandler : public ItemHandler {
   public:
+    // The base rows, then the network catalogue. Failures are thrown as a status (long).
+    HRESULT GetItemProperties(IuxSysPropertyBag* bag) override;
+    // Rewrites the whole network catalogue when a requested tag (low 12 bits ignored) is one of
+    // the network refresh tags; otherwise writes nothing. Returns S_OK; failures are thrown.
+    HRESULT RefreshProperties(uint32_t count, const uint32_t* tags,
+                              IuxSysPropertyBag* bag) override;
+    // Accepts the primary-adapter flag, the interface settings (checked as a whole) and the media
+    // mode. Making this adapter primary accepts that flag alone. Returns S_OK, E_POINTER or the
+    // violated rule's status; `message` (may be null) receives an explanation for some rules.
+    HRESULT ValidatePropertyChanges(IuxSysPropertyBag* changes, PropertyTagSet& validated,
+                                    CvqBStr* message) override;
+    // Writes the modified network settings at once and hands the adapter back in
+    // `deviceHandler` for a deferred interface restart. Returns S_OK, S_FALSE when nothing is
+    // modified, E_POINTER, or the first failure's status.
+    HRESULT PersistPropertyChanges(IuxSysPropertyBag* changes, int32_t& persistFlag,
+                                   CountedPtr<vq::targetcfg::IDeviceHandler>& deviceHandler,
+                                   bool& adapterDisabled) override;
+    // True for a description naming this item (exact, ignoring case) or an item of the same kind
+    // (same first two characters). A failed read of the name is thrown.
+    bool IsMatchingItem(IuxSysPropertyBag* description, bool& exactMatch) override;
+
     // A persisted change of this item restarts the network interface; always true.
     virtual bool NeedsInterfaceRestart();
     // True only when the library reports the adapter up.
@@ -29,6 +51,15 @@ class NetworkItemHandler : public ItemHandler {
     vq::targetcfg::IDeviceHandler* Device() const noexcept { return deviceHandler_.Get(); }
 
   private:
+    // Writes every network property; E_POINTER for a null bag, failures thrown.
+    HRESULT PopulateProperties(IuxSysPropertyBag* bag);
+    // Writes the TCP/IP address rows of an adapter in a TCP/IP mode.
+    void PopulateTcpIpAddresses(uint32_t mode, IuxSysPropertyBag* bag);
+    // Writes the EtherCAT rows of an adapter in EtherCAT mode.
+    void PopulateEtherCATSettings(const std::string& macAddress, IuxSysPropertyBag* bag);
+    // Writes the two request-mode rows of an adapter that is not in a TCP/IP mode.
+    void PopulateTcpRequestMode(uint32_t deviceIndex, IuxSysPropertyBag* bag);
+
     CountedPtr<vq::targetcfg::IDeviceHandler> deviceHandler_;
     uint32_t deviceIndex_;
 };

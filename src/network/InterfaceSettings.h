@@ -1,0 +1,23 @@
+// The interface settings of a network adapter as one unit: adapter mode, request mode, the four
+// addresses and the EtherCAT settings. Deciding whether a changes bag alters them, and storing
+// them through the target-configuration library.
+#pragma once
+
+#include <cstdint>
+
+#include "uxsys/PropertyBag.h"
+#include "uxsys/Types.h"
+
+// Sets `changed` when the settings in `bag` differ from the adapter's (device `deviceIndex`):
+// the primary role, a switch to adapter mode 1, 4 or 8, the request mode, the media mode of a
+// mode-2 adapter, and for a static address the address, mask, gateway or DNS server. Returns
+// S_OK, or E_FAIL when a non-empty address text is no address; other failures are thrown as a
+// status (long).
+HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag, bool& changed);
+
+// Stores the adapter mode with its request mode and addresses (all zero unless the adapter is in
+// a TCP/IP mode with a static address) and, in EtherCAT mode, the EtherCAT settings. Gateway and
+// DNS server are taken when `wasPrimary` is set or the bag has them. Returns S_OK or E_POINTER;
+// failures are thrown (a non-empty address text that is no address raises the runtime's
+// exception).
+HRESULT ApplyInterfaceSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, bool wasPrimary);

@@ -1,0 +1,93 @@
+// NetworkItemHandler::PersistPropertyChanges: writing the modified network settings at once and
+// handing the adapter back for its deferred interface restart.
+#include "com/CountedPtr.h"
+#include "network/BagReading.h"
+#include "network/InterfaceSettings.h"
+#include "network/LibraryCall.h"
+#include "network/NetworkItemHandler.h"
+#include "network/NetworkTags.h"
+#include "property/BagAccess.h"
+#include "support/StatusHolder.h"
+#include "support/TraceGate.h"
+#include "uxsys/StatusCodes.h"
+#include "vq/targetcfg/Network.h"
+
+namespace {
+
+namespace network = vq::targetcfg::network;
+
+}  // namespace
+
+HRESULT NetworkItemHandler::PersistPropertyChanges(
+    IuxSysPropertyBag* changes, int32_t& persistFlag,
+    CountedPtr<vq::targetcfg::IDeviceHandler>& deviceHandler, bool& adapterDisabled) {
+    if (changes == nullptr) {
+        return E_POINTER;
+    }
+    StatusHolder status;
+    status =
+        ItemHandler::PersistPropertyChanges(changes, persistFlag, deviceHandler, adapterDisabled);
+    CountedPtr<IuxSysEnumPropertyTag> modifiedTags = ModifiedTags(changes);
+    if (!modifiedTags) {
+        return S_FALSE;
+    }
+
+    try {
+        uint32_t primaryIndex = 0;
+        ThrowIfLibraryCallFailed(network::GetPrimaryDeviceIndex(primaryIndex));
+        const bool wasPrimary = DeviceIndex() == primaryIndex;
+
+        // A false flag never takes the primary role away.
+        bool primary = false;
+        BagGetBool(changes, NetworkTag::kPrimaryAdapter, primary);
+        bool madePrimary = false;
+        if (primary && !wasPrimary) {
+            ThrowIfLibraryCallFailed(network::SetPrimaryDeviceByIndex(DeviceIndex()));
+            status = changes->SetULong(NetworkTag::kAdapterMode, AdapterMode::kTcpIp);
+            madePrimary = true;
+        }
+
+        bool changed = false;
+        status = HaveInterfaceSettingsChanged(DeviceIndex(), changes, changed);
+        if (!changed && !madePrimary) {
+            return S_OK;
+        }
+
+        uint32_t newMode = 0;
+        status = changes->GetULong(NetworkTag::kAdapterMode, &newMode);
+        uint32_t currentMode = 0;
+        ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(DeviceIndex(), currentMode));
+        if (newMode != currentMode &&
+            (newMode == AdapterMode::kEtherCAT || currentMode == AdapterMode::kEtherCAT)) {
+            persistFlag |= 1;
+        }
+
+        if (NeedsInterfaceRestart()) {
+            deviceHandler = CountedPtr<vq::targetcfg::IDeviceHandler>(Device());
+            status = changes->GetULong(NetworkTag::kAdapterMode, &newMode);
+            adapterDisabled = newMode == AdapterMode::kDisabled;
+        }
+
+        if (changed) {
+            bool settingsApplied = false;
+            uint32_t tag = 0;
+            while (modifiedTags->Next(1, &tag, nullptr) == S_OK) {
+                if (NetworkTag::IsInterfaceSettingTag(tag)) {
+                    if (!settingsApplied) {
+                        settingsApplied = true;
+                        status = ApplyInterfaceSettings(DeviceIndex(), changes, wasPrimary);
+                    }
+                } else if (tag == NetworkTag::kPreferredMediaMode) {
+                    uint32_t mediaMode = 0;
+                    status = changes->GetULong(tag, &mediaMode);
+                    ThrowIfLibraryCallFailed(
+                        network::SetDeviceSettings(DeviceIndex(), mediaMode, 0, 0));
+                }
+            }
+        }
+    } catch (long failure) {
+        TraceIfEnabled("NetworkItemHandler::PersistPropertyChanges() failed", kTraceErrors);
+        return static_cast<HRESULT>(failure);
+    }
+    return S_OK;
+}

@@ -1,0 +1,85 @@
+// NetworkItemHandler::ValidatePropertyChanges: which tags of a changes bag the network side
+// accepts, and the checks they pass through.
+#include "com/CountedPtr.h"
+#include "network/LibraryCall.h"
+#include "network/NetworkItemHandler.h"
+#include "network/NetworkSettingsValidation.h"
+#include "network/NetworkTags.h"
+#include "property/BagAccess.h"
+#include "support/StatusHolder.h"
+#include "support/TraceGate.h"
+#include "uxsys/StatusCodes.h"
+#include "vq/targetcfg/Network.h"
+
+namespace {
+
+// True for the media modes an adapter may be asked for.
+bool IsAcceptedMediaMode(uint32_t mediaMode) {
+    switch (mediaMode) {
+        case 0:
+        case 1:
+        case 2:
+        case 4:
+        case 8:
+        case 0x10:
+        case 0x20:
+        case 0x40:
+            return true;
+        default:
+            return false;
+    }
+}
+
+}  // namespace
+
+HRESULT NetworkItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* changes,
+                                                    PropertyTagSet& validated, CvqBStr* message) {
+    if (changes == nullptr) {
+        return E_POINTER;
+    }
+    StatusHolder status;
+    status = ItemHandler::ValidatePropertyChanges(changes, validated, message);
+    CountedPtr<IuxSysEnumPropertyTag> tags;
+    status = changes->GetTagEnumerator(tags.Receive());
+    if (!tags) {
+        return S_OK;
+    }
+
+    try {
+        // Making this adapter primary is a change of its own: nothing else is checked with it.
+        if (EnumeratorHasTag(tags.Get(), NetworkTag::kPrimaryAdapter)) {
+            bool primary = false;
+            status = BagGetBool(changes, NetworkTag::kPrimaryAdapter, primary);
+            uint32_t primaryIndex = 0;
+            ThrowIfLibraryCallFailed(vq::targetcfg::network::GetPrimaryDeviceIndex(primaryIndex));
+            validated.insert(NetworkTag::kPrimaryAdapter);
+            if (primary && DeviceIndex() != primaryIndex) {
+                return S_OK;
+            }
+        }
+
+        status = tags->Reset();
+        bool settingsChecked = false;
+        uint32_t tag = 0;
+        while (tags->Next(1, &tag, nullptr) == S_OK) {
+            if (NetworkTag::IsInterfaceSettingTag(tag)) {
+                if (!settingsChecked) {
+                    settingsChecked = true;
+                    status = ValidateNetworkSettings(DeviceIndex(), changes, message);
+                }
+                validated.insert(tag);
+            } else if (tag == NetworkTag::kPreferredMediaMode) {
+                uint32_t mediaMode = 0;
+                status = changes->GetULong(tag, &mediaMode);
+                if (!IsAcceptedMediaMode(mediaMode)) {
+                    status = UX_E_VALUE_INVALID;
+                }
+                validated.insert(tag);
+            }
+        }
+    } catch (long failure) {
+        TraceIfEnabled("NetworkItemHandler::ValidatePropertyChanges() failed", kTraceErrors);
+        return static_cast<HRESULT>(failure);
+    }
+    return S_OK;
+}
