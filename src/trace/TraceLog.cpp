@@ -1,0 +1,116 @@
+#include "trace/TraceLog.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+
+#include "trace/FreeSpace.h"
+
+namespace kest_trace {
+
+const char* const kAbortMessage =
+    "** Available disk space is below the desired threshold. Aborting tracing. **";
+
+namespace {
+
+// Opens the log for appending without following a symbolic link, and keeps it only when it is a
+// regular file with one link: the log directory may be writable by everyone, and a planted link
+// would make this process append to a file of someone else's choosing.
+int OpenLogFile(const std::string& path) {
+    int descriptor;
+    do {
+        descriptor =
+            open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC,
+                 0666);
+    } while (descriptor < 0 && errno == EINTR);
+    if (descriptor < 0) {
+        return -1;
+    }
+    struct stat status;
+    if (fstat(descriptor, &status) != 0 || !S_ISREG(status.st_mode) || status.st_nlink != 1) {
+        close(descriptor);
+        return -1;
+    }
+    return descriptor;
+}
+
+// Writes the line and its line feed with one call, so that appends of other processes cannot
+// split it.
+void WriteLine(int descriptor, const char* line) {
+    std::string record(line);
+    record += '\n';
+    const char* data = record.data();
+    size_t left = record.size();
+    while (left > 0) {
+        ssize_t written = write(descriptor, data, left);
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
+            return;
+        }
+        data += written;
+        left -= static_cast<size_t>(written);
+    }
+}
+
+}  // namespace
+
+bool TraceLog::SetLocation(std::string directory, const std::string& fileName) {
+    if (directory.empty()) {
+        return false;
+    }
+    if (directory.back() != '/' && directory.back() != '\\') {
+        directory += '/';
+    }
+    std::string path = directory + fileName;
+    if (directory.size() > kMaxLogPathLength || path.size() > kMaxLogPathLength) {
+        return false;
+    }
+    path_ = std::move(path);
+    directory_ = path_.substr(0, path_.rfind('/') + 1);
+    return true;
+}
+
+bool TraceLog::SpaceIsShort(uint32_t threshold) const {
+    uint64_t freeBytes = 0;
+    return !CurrentFreeSpaceMeasure()(directory_.empty() ? "." : directory_, &freeBytes) ||
+           freeBytes < threshold;
+}
+
+const char* TraceLog::Append(const char* line, uint32_t threshold) {
+    if (path_.empty()) {
+        return line;
+    }
+    if (descriptor_ < 0 && !aborted_) {
+        if (threshold != 0 && SpaceIsShort(threshold)) {
+            aborted_ = true;
+        } else {
+            descriptor_ = OpenLogFile(path_);
+        }
+    }
+    if (descriptor_ < 0) {
+        return line;
+    }
+    if (threshold != 0 && SpaceIsShort(threshold)) {
+        aborted_ = true;
+        line = kAbortMessage;
+    }
+    WriteLine(descriptor_, line);
+    if (aborted_) {
+        Close();
+    }
+    return line;
+}
+
+void TraceLog::Close() {
+    if (descriptor_ >= 0) {
+        close(descriptor_);
+        descriptor_ = -1;
+    }
+}
+
+}  // namespace kest_trace

@@ -1,0 +1,105 @@
+// Helpers for tracer tests: running a test body in a child process (the tracer's state lives as
+// long as the process), capturing a standard stream, and listing files.
+#pragma once
+
+#include <dirent.h>
+#include <fcntl.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <fstream>
+#include <functional>
+#include <sstream>
+#include <string>
+#include <vector>
+
+// Runs `body` in a forked child so that it starts with a fresh tracer; failures are reported by
+// the child and make the test fail here.
+inline void RunInChild(const std::function<void()>& body) {
+    std::fflush(stdout);
+    std::fflush(stderr);
+    pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        body();
+        std::fflush(stdout);
+        std::fflush(stderr);
+        _exit(::testing::Test::HasFailure() ? 1 : 0);
+    }
+    int status = 0;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << "child status " << status;
+}
+
+// Sends what the process writes to standard output or standard error (`descriptor` 1 or 2) to
+// a file while the object lives.
+class StreamCapture {
+  public:
+    StreamCapture(int descriptor, const std::string& file)
+        : descriptor_(descriptor), file_(file), saved_(dup(descriptor)) {
+        Flush();
+        int target = open(file.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
+        dup2(target, descriptor);
+        close(target);
+    }
+    ~StreamCapture() {
+        Flush();
+        dup2(saved_, descriptor_);
+        close(saved_);
+    }
+    StreamCapture(const StreamCapture&) = delete;
+    StreamCapture& operator=(const StreamCapture&) = delete;
+
+    std::string Text() const {
+        Flush();
+        std::ifstream in(file_, std::ios::binary);
+        std::ostringstream content;
+        content << in.rdbuf();
+        return content.str();
+    }
+
+  private:
+    static void Flush() {
+        std::fflush(stdout);
+        std::fflush(stderr);
+    }
+
+    int descriptor_;
+    std::string file_;
+    int saved_;
+};
+
+// Names of the entries of `directory` (without "." and ".."), unsorted.
+inline std::vector<std::string> EntriesOf(const std::string& directory) {
+    std::vector<std::string> names;
+    if (DIR* listing = opendir(directory.c_str())) {
+        while (dirent* entry = readdir(listing)) {
+            std::string name = entry->d_name;
+            if (name != "." && name != "..") {
+                names.push_back(name);
+            }
+        }
+        closedir(listing);
+    }
+    return names;
+}
+
+inline std::string FileText(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    std::ostringstream content;
+    content << in.rdbuf();
+    return content.str();
+}
+
+// The lines of `text` without their line feeds.
+inline std::vector<std::string> LinesOf(const std::string& text) {
+    std::vector<std::string> lines;
+    std::istringstream in(text);
+    for (std::string line; std::getline(in, line);) {
+        lines.push_back(line);
+    }
+    return lines;
+}

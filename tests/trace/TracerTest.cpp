@@ -1,0 +1,328 @@
+#include <ftw.h>
+#include <sys/stat.h>
+#include <sys/statvfs.h>
+#include <unistd.h>
+
+#include <atomic>
+#include <regex>
+#include <string>
+#include <vector>
+
+#include "TraceTestSupport.h"
+#include "common/TempSysroot.h"
+#include "support/PathHelpers.h"
+#include "support/TraceGate.h"
+#include "trace/FreeSpace.h"
+#include "trace/TraceLog.h"
+#include "trace/Tracer.h"
+#include "uxsys/StatusCodes.h"
+
+using kest::test::TempSysroot;
+
+namespace {
+
+constexpr uint32_t kAllOutputs = kTraceToLogFile | kTraceToStandardOutput | kTraceToStandardError;
+const std::regex kStampLine(R"(  Thread = 0x[0-9A-F]+, Time = \d{8} \d{6}[.,]\d{3})");
+
+std::atomic<int> measurements{0};
+std::atomic<uint64_t> reportedFreeBytes{0};
+
+bool FakeMeasure(const std::string&, uint64_t* freeBytes) {
+    ++measurements;
+    *freeBytes = reportedFreeBytes;
+    return true;
+}
+
+std::wstring Wide(const std::string& text) {
+    return std::wstring(text.begin(), text.end());
+}
+
+// Regular files anywhere under `directory`.
+int RegularFilesUnder(const std::string& directory) {
+    static int count;
+    count = 0;
+    nftw(
+        directory.c_str(),
+        [](const char*, const struct stat* status, int, struct FTW*) {
+            count += S_ISREG(status->st_mode) ? 1 : 0;
+            return 0;
+        },
+        16, FTW_PHYS);
+    return count;
+}
+
+// A sysroot with an empty log directory "/log", and standard error captured.
+class TracerFixture {
+  public:
+    TracerFixture() { sysroot_.MakeDirectory("/log"); }
+
+    std::string LogDirectory() const { return sysroot_.PathOf("/log"); }
+    std::vector<std::string> LogFiles() const { return EntriesOf(LogDirectory()); }
+    // The content of the only log file (empty when there is none).
+    std::string LogText() const {
+        std::vector<std::string> files = LogFiles();
+        EXPECT_LE(files.size(), 1u);
+        return files.empty() ? std::string() : FileText(LogDirectory() + "/" + files[0]);
+    }
+    const TempSysroot& Sysroot() const { return sysroot_; }
+
+    StreamCapture& Errors() { return errors_; }
+
+  private:
+    TempSysroot sysroot_;
+    StreamCapture errors_{2, sysroot_.PathOf("/stderr.txt")};
+};
+
+TEST(TracerTest, NothingIsWrittenBeforeInitialisationOrUnderMaskZero) {
+    RunInChild([] {
+        TracerFixture fixture;
+        std::string output;
+        {
+            StreamCapture capture(1, fixture.Sysroot().PathOf("/stdout.txt"));
+            EXPECT_EQ(GetTraceMask(), 0u);
+            TraceLine(' ', "before initialisation", true);
+            TraceIfEnabled("before initialisation", 0xFFFFFFFF);
+            InitializeTracing(0, kAllOutputs, Wide(fixture.LogDirectory()), 0);
+            TraceIfEnabled("masked", 0xFFFFFFFF);
+            TraceStatus("masked", E_FAIL);
+            output = capture.Text();
+        }
+        EXPECT_TRUE(fixture.LogFiles().empty());
+        EXPECT_EQ(fixture.Errors().Text(), "");
+        EXPECT_EQ(output, "");
+    });
+}
+
+TEST(TracerTest, RecordIsTheTextLineThenTheThreadAndTimeLine) {
+    RunInChild([] {
+        TracerFixture fixture;
+        std::string output;
+        {
+            StreamCapture capture(1, fixture.Sysroot().PathOf("/stdout.txt"));
+            InitializeTracing(kTraceErrors, kAllOutputs, Wide(fixture.LogDirectory()), 0);
+            TraceStatus("Failure to persist property changes", E_FAIL);
+            TraceLine(' ', "single line", false);
+            TraceIfEnabled(std::string(3000, 'x'), kTraceErrors);
+            output = capture.Text();
+        }
+        EXPECT_EQ(GetTraceMask(), kTraceErrors);
+
+        std::vector<std::string> files = fixture.LogFiles();
+        ASSERT_EQ(files.size(), 1u);
+        char pid[16];
+        snprintf(pid, sizeof pid, "%08lX", static_cast<unsigned long>(getpid()));
+        EXPECT_TRUE(std::regex_match(
+            files[0], std::regex(R"(\d{8}_\d{6}-uxTracer-)" + std::string(pid) + R"(\.log)")))
+            << files[0];
+        std::vector<std::string> lines = LinesOf(fixture.LogText());
+        ASSERT_EQ(lines.size(), 5u);
+        EXPECT_EQ(lines[0], "  Failure to persist property changes(-2147467259)");
+        EXPECT_TRUE(std::regex_match(lines[1], kStampLine)) << lines[1];
+        EXPECT_EQ(lines[2], "  single line");
+        EXPECT_EQ(lines[3], "  " + std::string(2045, 'x'));
+        EXPECT_TRUE(std::regex_match(lines[4], kStampLine)) << lines[4];
+        EXPECT_EQ(fixture.Errors().Text(), fixture.LogText());
+        EXPECT_EQ(output, fixture.LogText());
+    });
+}
+
+TEST(TracerTest, ThresholdZeroNeverMeasuresFreeSpace) {
+    RunInChild([] {
+        TracerFixture fixture;
+        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        reportedFreeBytes = 0;
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), 0);
+        TraceIfEnabled("kept", kTraceErrors);
+        EXPECT_EQ(measurements, 0);
+        EXPECT_EQ(LinesOf(fixture.LogText()).size(), 2u);
+    });
+}
+
+TEST(TracerTest, ShortSpaceAtTheFirstLineCreatesNoFileButStandardErrorGoesOn) {
+    RunInChild([] {
+        TracerFixture fixture;
+        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        reportedFreeBytes = 1000;
+        InitializeTracing(kTraceErrors, kTraceToLogFile | kTraceToStandardError,
+                          Wide(fixture.LogDirectory()), 2000);
+        TraceLine(' ', "first", false);
+        reportedFreeBytes = 1u << 30;
+        TraceLine(' ', "second", false);
+        EXPECT_TRUE(fixture.LogFiles().empty());
+        EXPECT_EQ(fixture.Errors().Text(), "  first\n  second\n");
+        EXPECT_EQ(measurements, 1);
+    });
+}
+
+TEST(TracerTest, AbortMessageEndsTheFileOnceSpaceFallsShort) {
+    RunInChild([] {
+        TracerFixture fixture;
+        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        reportedFreeBytes = 5000;
+        InitializeTracing(kTraceErrors, kTraceToLogFile | kTraceToStandardError,
+                          Wide(fixture.LogDirectory()), 4096);
+        TraceLine(' ', "one", false);
+        TraceLine(' ', "two", false);
+        reportedFreeBytes = 4095;
+        TraceLine(' ', "three", false);
+        reportedFreeBytes = 1u << 30;
+        TraceLine(' ', "four", false);
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), 4096);
+        TraceLine(' ', "five", false);
+        EXPECT_EQ(fixture.LogText(),
+                  "  one\n  two\n" + std::string(kest_trace::kAbortMessage) + "\n");
+        EXPECT_EQ(fixture.Errors().Text(),
+                  "  one\n  two\n" + std::string(kest_trace::kAbortMessage) + "\n  four\n");
+    });
+}
+
+TEST(TracerTest, FreeSpaceBeyondThirtyTwoBitsIsMeasuredWhole) {
+    TempSysroot sysroot;
+    struct statvfs status;
+    ASSERT_EQ(statvfs(sysroot.Root().c_str(), &status), 0);
+    uint64_t freeBytes = uint64_t(status.f_frsize) * status.f_bfree;
+    if (freeBytes < (uint64_t(1) << 32) + (uint64_t(1) << 30)) {
+        GTEST_SKIP() << "needs more than 5 GiB free to measure beyond 32 bits";
+    }
+    uint64_t measured = 0;
+    ASSERT_TRUE(kest_trace::MeasureFreeSpace(sysroot.Root(), &measured));
+    EXPECT_GT(measured, uint64_t(UINT32_MAX));
+    RunInChild([] {
+        TracerFixture fixture;
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), UINT32_MAX);
+        TraceLine(' ', "room enough", false);
+        EXPECT_EQ(fixture.LogText(), "  room enough\n");
+    });
+}
+
+struct DirectoryCase {
+    std::string suffix;
+    std::string expectedDirectory;
+};
+
+class TracerDirectoryTest : public ::testing::TestWithParam<DirectoryCase> {};
+
+TEST_P(TracerDirectoryTest, OneSeparatorBetweenDirectoryAndFileName) {
+    RunInChild([param = GetParam()] {
+        TracerFixture fixture;
+        InitializeTracing(kTraceErrors, kTraceToLogFile,
+                          Wide(fixture.LogDirectory() + param.suffix), 0);
+        TraceLine(' ', "here", false);
+        std::string directory = fixture.Sysroot().PathOf(param.expectedDirectory);
+        std::vector<std::string> entries = EntriesOf(directory);
+        bool found = false;
+        for (const std::string& entry : entries) {
+            found = found || entry.find("-uxTracer-") != std::string::npos;
+        }
+        EXPECT_TRUE(found) << ::testing::PrintToString(entries);
+    });
+}
+
+INSTANTIATE_TEST_SUITE_P(Separators, TracerDirectoryTest,
+                         ::testing::Values(DirectoryCase{"", "/log"}, DirectoryCase{"/", "/log"},
+                                           DirectoryCase{"\\", "/"}));
+
+TEST(TracerTest, LaterInitialisationsChangeOutputsButNotThePath) {
+    RunInChild([] {
+        TracerFixture fixture;
+        fixture.Sysroot().MakeDirectory("/other");
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), 0);
+        TraceLine(' ', "first", false);
+        InitializeTracing(kTraceErrors, kTraceToStandardError,
+                          Wide(fixture.Sysroot().PathOf("/other")), 0);
+        TraceLine(' ', "second", false);
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.Sysroot().PathOf("/other")),
+                          0);
+        TraceLine(' ', "third", false);
+        ShutdownTracing();
+        TraceLine(' ', "after shutdown", false);
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.Sysroot().PathOf("/other")),
+                          0);
+        TraceLine(' ', "fourth", false);
+        EXPECT_EQ(fixture.LogText(), "  first\n  third\n  fourth\n");
+        EXPECT_TRUE(EntriesOf(fixture.Sysroot().PathOf("/other")).empty());
+        EXPECT_EQ(fixture.Errors().Text(), "  second\n");
+    });
+}
+
+TEST(TracerTest, OverlongPathTurnsFileOutputOffAndOtherOutputsGoOn) {
+    RunInChild([] {
+        TracerFixture fixture;
+        std::string deep = fixture.LogDirectory();
+        while (deep.size() < kest_trace::kMaxLogPathLength - 20) {
+            deep += "/abcdefghij";
+        }
+        vq::dsc::osdep::CreateDirectories(deep, 0755);
+        InitializeTracing(kTraceErrors, kTraceToLogFile | kTraceToStandardError, Wide(deep), 0);
+        TraceLine(' ', "still on standard error", false);
+        EXPECT_EQ(fixture.Errors().Text(), "  still on standard error\n");
+        EXPECT_EQ(RegularFilesUnder(fixture.LogDirectory()), 0);
+    });
+}
+
+TEST(TracerTest, PlantedLinksAtTheLogPathAreNeverFollowed) {
+    RunInChild([] {
+        TracerFixture fixture;
+        std::string victim = fixture.Sysroot().PathOf("/victim");
+        { std::ofstream(victim) << "untouched\n"; }
+        // The first initialisation names the log; its lock file shows the name.
+        InitializeTracing(kTraceErrors, kTraceToStandardError, L"", 0);
+        std::vector<std::string> locks =
+            EntriesOf(fixture.Sysroot().PathOf("/var/tmp/korvane/shared/mutex"));
+        ASSERT_EQ(locks.size(), 1u);
+        std::string logPath = fixture.LogDirectory() + "/" + locks[0];
+        ASSERT_EQ(symlink(victim.c_str(), logPath.c_str()), 0);
+        InitializeTracing(kTraceErrors, kTraceToLogFile | kTraceToStandardError,
+                          Wide(fixture.LogDirectory()), 0);
+        TraceLine(' ', "through a symbolic link", false);
+        ASSERT_EQ(unlink(logPath.c_str()), 0);
+        ASSERT_EQ(link(victim.c_str(), logPath.c_str()), 0);
+        TraceLine(' ', "through a hard link", false);
+        EXPECT_EQ(FileText(victim), "untouched\n");
+        EXPECT_EQ(fixture.Errors().Text(), "  through a symbolic link\n  through a hard link\n");
+        ASSERT_EQ(unlink(logPath.c_str()), 0);
+        TraceLine(' ', "own file", false);
+        EXPECT_EQ(FileText(logPath), "  own file\n");
+    });
+}
+
+TEST(TracerTest, ProcessesTracingToOneLogNeverInterleaveInsideARecord) {
+    RunInChild([] {
+        TracerFixture fixture;
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), 0);
+        constexpr int kChildren = 4;
+        constexpr int kRecords = 300;
+        std::vector<pid_t> children;
+        for (int c = 0; c < kChildren; ++c) {
+            pid_t child = fork();
+            if (child == 0) {
+                for (int r = 0; r < kRecords; ++r) {
+                    std::string text = "child " + std::to_string(c) + " record " +
+                                       std::to_string(r) + " " + std::string(200, 'a' + c);
+                    TraceIfEnabled(text, kTraceErrors);
+                }
+                _exit(0);
+            }
+            children.push_back(child);
+        }
+        for (pid_t child : children) {
+            int status = 0;
+            waitpid(child, &status, 0);
+            EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0);
+        }
+        std::vector<std::string> lines = LinesOf(fixture.LogText());
+        ASSERT_EQ(lines.size(), size_t(2 * kChildren * kRecords));
+        std::vector<int> next(kChildren, 0);
+        for (size_t i = 0; i < lines.size(); i += 2) {
+            int c = 0;
+            int r = 0;
+            ASSERT_EQ(sscanf(lines[i].c_str(), "  child %d record %d", &c, &r), 2) << lines[i];
+            ASSERT_TRUE(c >= 0 && c < kChildren);
+            EXPECT_EQ(r, next[c]++);
+            EXPECT_EQ(lines[i].substr(lines[i].size() - 200), std::string(200, 'a' + c));
+            EXPECT_TRUE(std::regex_match(lines[i + 1], kStampLine)) << lines[i + 1];
+        }
+    });
+}
+
+}  // namespace
