@@ -46,11 +46,6 @@ HRESULT SetAddressText(IuxSysPropertyBag* bag, uint32_t tag, const IPAddress& ad
     return BagSetNarrowString(bag, tag, address.ToString());
 }
 
-// A media-mode value from a query whose failure gives kUnknownMediaMode.
-uint32_t MediaModeOrUnknown(int32_t libraryStatus, uint32_t value) {
-    return libraryStatus == 0 ? value : kUnknownMediaMode;
-}
-
 }  // namespace
 
 NetworkItemHandler::NetworkItemHandler(std::wstring itemName, std::wstring secondName,
@@ -166,24 +161,25 @@ void NetworkItemHandler::PopulateTcpIpAddresses(uint32_t mode, IuxSysPropertyBag
         return;
     }
     uint32_t supportedMediaModes = 0;
-    supportedMediaModes = MediaModeOrUnknown(
-        network::GetSupportedDeviceSettings(deviceIndex_, &supportedMediaModes, nullptr),
-        supportedMediaModes);
+    if (network::GetSupportedDeviceSettings(deviceIndex_, &supportedMediaModes, nullptr) != 0) {
+        supportedMediaModes = kUnknownMediaMode;
+    }
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetSupportedDeviceSettings",
                      supportedMediaModes);
     status = bag->SetULong(NetworkTag::kSupportedMediaModes, supportedMediaModes);
 
     uint32_t currentMediaMode = 0;
-    currentMediaMode = MediaModeOrUnknown(
-        network::GetCurrentDeviceSettings(deviceIndex_, &currentMediaMode, nullptr, nullptr),
-        currentMediaMode);
+    if (network::GetCurrentDeviceSettings(deviceIndex_, &currentMediaMode, nullptr, nullptr) != 0) {
+        currentMediaMode = kUnknownMediaMode;
+    }
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetCurrentDeviceSettings",
                      currentMediaMode);
     status = bag->SetULong(NetworkTag::kCurrentMediaMode, currentMediaMode);
 
     uint32_t preferredMediaMode = 0;
-    preferredMediaMode = MediaModeOrUnknown(
-        network::GetPreferredMediaMode(deviceIndex_, &preferredMediaMode), preferredMediaMode);
+    if (network::GetPreferredMediaMode(deviceIndex_, &preferredMediaMode) != 0) {
+        preferredMediaMode = kUnknownMediaMode;
+    }
     status = bag->SetULong(NetworkTag::kPreferredMediaMode, preferredMediaMode);
 }
 
