@@ -1,56 +1,19 @@
 #include "Commands.h"
 
-#include "ExitCodes.h"
-#include "HostText.h"
-
-namespace {
-
-// Throws a failure naming the operation when `status` is negative.
-void CheckStatus(HRESULT status, const char* operation) {
-    if (status < 0) {
-        throw Failure(std::string(operation) + " failed with status " + StatusText(status));
-    }
-}
-
-// A string answer of the expert's identity operations.
-template <class Operation>
-std::string IdentityString(IuxSysExpert3* expert, Operation operation, const char* name) {
-    CvqBStr text = nullptr;
-    const HRESULT status = (expert->*operation)(&text);
-    std::string result = TakeHostString(text);
-    CheckStatus(status, name);
-    return result;
-}
-
-// kestcfg info: the expert's class identifier, display name, version and programmatic name.
-void RunInfo(CommandContext& context) {
-    GUID classId{};
-    CheckStatus(context.expert->GetExpertClassId(&classId), "GetExpertClassId");
-    const std::string displayName = IdentityString(
-        context.expert, &IuxSysExpert3::GetExpertDisplayName, "GetExpertDisplayName");
-    const std::string version =
-        IdentityString(context.expert, &IuxSysExpert3::GetExpertVersion, "GetExpertVersion");
-    const std::string programmaticName = IdentityString(
-        context.expert, &IuxSysExpert3::GetExpertProgrammaticName, "GetExpertProgrammaticName");
-
-    if (context.json) {
-        context.out << "{\"classId\":" << JsonQuoted(GuidText(classId))
-                    << ",\"displayName\":" << JsonQuoted(displayName)
-                    << ",\"version\":" << JsonQuoted(version)
-                    << ",\"programmaticName\":" << JsonQuoted(programmaticName) << "}\n";
-    } else {
-        context.out << "Class identifier:  " << GuidText(classId) << "\n"
-                    << "Display name:      " << displayName << "\n"
-                    << "Version:           " << version << "\n"
-                    << "Programmatic name: " << programmaticName << "\n";
-    }
-}
-
-}  // namespace
+#include <cstdint>
 
 const std::vector<CommandDescription>& AllCommands() {
     static const std::vector<CommandDescription> commands = {
-        {"info", "info", "show the expert's identity", 0, 0, &RunInfo},
+        {"info", "info", "show the expert's identity", 0, 0, ExpertUse::kIdentity, &RunInfo},
+        {"items", "items", "list the configurable items", 0, 0, ExpertUse::kItems, &RunItems},
+        {"get", "get [ITEM]", "show all properties of every item, or of ITEM", 0, 1,
+         ExpertUse::kItems, &RunGet},
+        {"refresh", "refresh ITEM TAG...", "read the named properties of ITEM afresh", 2, SIZE_MAX,
+         ExpertUse::kItems, &RunRefresh},
+        {"set", "set ITEM NAME=VALUE...", "validate and persist changed properties of ITEM", 2,
+         SIZE_MAX, ExpertUse::kItems, &RunSet},
+        {"sim", "sim init DIR", "create a demo controller under DIR (use DIR as the sysroot)", 2, 2,
+         ExpertUse::kNone, &RunSim},
     };
     return commands;
 }

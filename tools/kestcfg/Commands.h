@@ -1,5 +1,5 @@
-// kestcfg's commands: each one drives the expert through its host interfaces and prints the
-// result as text or JSON.
+// kestcfg's commands: each one drives the expert through its host interfaces, or prepares files,
+// and prints the result as text for people or as JSON for scripts.
 #pragma once
 
 #include <cstddef>
@@ -9,11 +9,19 @@
 
 #include "uxsys/Expert.h"
 
+// What a command needs of the plug-in.
+enum class ExpertUse {
+    kNone,      // the plug-in is not loaded
+    kIdentity,  // a fresh expert; Initialize is not called
+    kItems,     // an expert between Initialize and Uninitialize
+};
+
 struct CommandContext {
-    IuxSysExpert3* expert;
+    IuxSysExpert3* expert;  // null for commands that do not use the plug-in
     const std::vector<std::string>& arguments;
     bool json;
     std::ostream& out;
+    std::ostream& err;  // warnings and notes
 };
 
 struct CommandDescription {
@@ -21,7 +29,8 @@ struct CommandDescription {
     std::string synopsis;  // the command with its arguments, as the usage text shows it
     std::string summary;
     size_t minArguments;
-    size_t maxArguments;
+    size_t maxArguments;  // SIZE_MAX: no limit
+    ExpertUse expertUse;
     // Runs the command; throws CommandFailure to end with a message and an exit code.
     void (*run)(CommandContext& context);
 };
@@ -31,3 +40,11 @@ const std::vector<CommandDescription>& AllCommands();
 
 // The command called `name`, or null.
 const CommandDescription* FindCommand(const std::string& name);
+
+// The commands' bodies.
+void RunInfo(CommandContext& context);
+void RunItems(CommandContext& context);
+void RunGet(CommandContext& context);
+void RunRefresh(CommandContext& context);
+void RunSet(CommandContext& context);
+void RunSim(CommandContext& context);

@@ -38,6 +38,51 @@ std::string Utf8FromWide(const wchar_t* text, size_t count) {
     return out;
 }
 
+std::optional<std::wstring> WideFromUtf8(const std::string& text) {
+    std::wstring out;
+    out.reserve(text.size());
+    for (size_t i = 0; i < text.size();) {
+        const unsigned char lead = static_cast<unsigned char>(text[i]);
+        size_t length = 0;
+        uint32_t code = 0;
+        uint32_t smallest = 0;
+        if (lead < 0x80) {
+            length = 1;
+            code = lead;
+        } else if (lead >= 0xC2 && lead <= 0xDF) {
+            length = 2;
+            code = lead & 0x1Fu;
+            smallest = 0x80;
+        } else if (lead >= 0xE0 && lead <= 0xEF) {
+            length = 3;
+            code = lead & 0x0Fu;
+            smallest = 0x800;
+        } else if (lead >= 0xF0 && lead <= 0xF4) {
+            length = 4;
+            code = lead & 0x07u;
+            smallest = 0x10000;
+        } else {
+            return std::nullopt;
+        }
+        if (i + length > text.size()) {
+            return std::nullopt;
+        }
+        for (size_t k = 1; k < length; ++k) {
+            const unsigned char next = static_cast<unsigned char>(text[i + k]);
+            if ((next & 0xC0u) != 0x80u) {
+                return std::nullopt;
+            }
+            code = (code << 6) | (next & 0x3Fu);
+        }
+        if (code == 0 || code < smallest || code > 0x10FFFF || (code >= 0xD800 && code <= 0xDFFF)) {
+            return std::nullopt;
+        }
+        out.push_back(static_cast<wchar_t>(code));
+        i += length;
+    }
+    return out;
+}
+
 std::string TakeHostString(CvqBStr str) {
     CvqBStrHolder holder(str);
     return str == nullptr ? std::string() : Utf8FromWide(str, CvqBStrLength(str));

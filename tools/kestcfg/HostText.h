@@ -2,12 +2,16 @@
 // registry form, statuses to hexadecimal, and JSON string quoting.
 #pragma once
 
+#include <optional>
 #include <string>
 
 #include "uxsys/Types.h"
 
 // UTF-8 text of `count` wide characters; characters outside Unicode become U+FFFD.
 std::string Utf8FromWide(const wchar_t* text, size_t count);
+
+// Wide text of UTF-8 `text`; nothing when it is not valid UTF-8 or holds a zero character.
+std::optional<std::wstring> WideFromUtf8(const std::string& text);
 
 // Takes ownership of a host string from the plug-in, frees it, and returns it as UTF-8.
 std::string TakeHostString(CvqBStr str);

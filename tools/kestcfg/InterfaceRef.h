@@ -1,7 +1,9 @@
-// Owns one reference to an interface the plug-in handed out and releases it on destruction.
+// Owns one reference to a component interface and releases it on destruction.
 #pragma once
 
 #include <utility>
+
+#include "uxsys/IUnknown.h"
 
 template <class T>
 class InterfaceRef {
@@ -16,15 +18,36 @@ class InterfaceRef {
     }
     InterfaceRef(const InterfaceRef&) = delete;
     InterfaceRef& operator=(const InterfaceRef&) = delete;
-    ~InterfaceRef() {
-        if (object_ != nullptr) {
-            object_->Release();
-        }
-    }
+    ~InterfaceRef() { Reset(); }
 
     T* Get() const { return object_; }
     T* operator->() const { return object_; }
+    explicit operator bool() const { return object_ != nullptr; }
+
+    // Releases the held reference (if any) and returns the address for an operation to store a
+    // new one in.
+    T** Receive() {
+        Reset();
+        return &object_;
+    }
 
   private:
+    void Reset() {
+        if (object_ != nullptr) {
+            std::exchange(object_, nullptr)->Release();
+        }
+    }
+
     T* object_ = nullptr;
 };
+
+// Asks `object` for the interface `iid` of type T; empty when it does not offer it.
+template <class T>
+InterfaceRef<T> QueryInterfaceAs(IUnknown* object, const IID& iid) {
+    InterfaceRef<T> result;
+    void* pointer = nullptr;
+    if (object != nullptr && object->QueryInterface(iid, &pointer) >= 0 && pointer != nullptr) {
+        *result.Receive() = static_cast<T*>(pointer);
+    }
+    return result;
+}

@@ -1,11 +1,10 @@
 #include "PluginLoader.h"
 
 #include <dlfcn.h>
-#include <limits.h>
-#include <unistd.h>
 
 #include "ExitCodes.h"
 #include "HostText.h"
+#include "ProgramLocation.h"
 
 namespace {
 
@@ -17,13 +16,7 @@ std::string LoaderError() {
 }  // namespace
 
 std::string DefaultPluginPath() {
-    char program[PATH_MAX];
-    const ssize_t length = readlink("/proc/self/exe", program, sizeof program - 1);
-    if (length <= 0) {
-        throw Failure("cannot find the program's own directory; name the plug-in with --plugin");
-    }
-    const std::string path(program, static_cast<size_t>(length));
-    return path.substr(0, path.rfind('/') + 1) + kPluginFileName;
+    return ProgramDirectory() + kPluginFileName;
 }
 
 Plugin::Plugin(const std::string& path) : path_(path) {

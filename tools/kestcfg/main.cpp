@@ -6,22 +6,25 @@
 
 #include <exception>
 #include <iostream>
+#include <memory>
 #include <string>
 
 #include "CommandLine.h"
 #include "Commands.h"
 #include "ExitCodes.h"
+#include "ExpertSession.h"
 #include "PluginLoader.h"
 
 namespace {
 
-// Points KEST_SYSROOT at `directory` (made absolute), which must exist.
-void UseSysroot(const std::string& directory) {
+// Points KEST_SYSROOT at `directory` (made absolute), which must exist. `origin` names where
+// the directory came from for the error message.
+void UseSysroot(const std::string& directory, const std::string& origin) {
     char absolute[PATH_MAX];
     struct stat status {};
     if (realpath(directory.c_str(), absolute) == nullptr || stat(absolute, &status) != 0 ||
         !S_ISDIR(status.st_mode)) {
-        throw UsageError("the sysroot " + directory + " is not a directory");
+        throw UsageError("the sysroot " + directory + " (" + origin + ") is not a directory");
     }
     setenv("KEST_SYSROOT", absolute, 1);
 }
@@ -47,13 +50,26 @@ int Run(int argc, const char* const* argv) {
         throw UsageError("wrong number of arguments; usage: kestcfg [OPTIONS] " +
                          command->synopsis);
     }
+    CommandContext context{nullptr, line.arguments, line.json, std::cout, std::cerr};
+    if (command->expertUse == ExpertUse::kNone) {
+        command->run(context);
+        return kExitSuccess;
+    }
+
     if (!line.sysroot.empty()) {
-        UseSysroot(line.sysroot);
+        UseSysroot(line.sysroot, "--sysroot");
+    } else if (const char* fromEnvironment = getenv("KEST_SYSROOT");
+               fromEnvironment != nullptr && *fromEnvironment != '\0') {
+        UseSysroot(fromEnvironment, "KEST_SYSROOT");
     }
     const Plugin plugin(line.plugin.empty() ? DefaultPluginPath()
                                             : PluginPathArgument(line.plugin));
     const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
-    CommandContext context{expert.Get(), line.arguments, line.json, std::cout};
+    context.expert = expert.Get();
+    std::unique_ptr<ExpertSession> session;
+    if (command->expertUse == ExpertUse::kItems) {
+        session = std::make_unique<ExpertSession>(expert.Get());
+    }
     command->run(context);
     return kExitSuccess;
 }
@@ -64,12 +80,16 @@ int main(int argc, char** argv) {
     try {
         return Run(argc, argv);
     } catch (const CommandFailure& failure) {
-        std::cerr << "kestcfg: " << failure.what() << "\n";
+        std::cout.flush();
+        if (*failure.what() != '\0') {
+            std::cerr << "kestcfg: " << failure.what() << "\n";
+        }
         if (failure.Code() == kExitUsageError) {
             std::cerr << "Try 'kestcfg --help' for more information.\n";
         }
         return failure.Code();
     } catch (const std::exception& failure) {
+        std::cout.flush();
         std::cerr << "kestcfg: " << failure.what() << "\n";
         return kExitFailure;
     }

@@ -1,0 +1,49 @@
+// kestcfg info: the expert's class identifier, display name, version and programmatic name.
+#include "Commands.h"
+#include "ExitCodes.h"
+#include "HostText.h"
+#include "StatusNames.h"
+
+namespace {
+
+// Throws a failure naming the operation when `status` is negative.
+void CheckStatus(HRESULT status, const char* operation) {
+    if (status < 0) {
+        throw Failure(std::string(operation) + " failed with " + StatusWithName(status));
+    }
+}
+
+// A string answer of the expert's identity operations.
+template <class Operation>
+std::string IdentityString(IuxSysExpert3* expert, Operation operation, const char* name) {
+    CvqBStr text = nullptr;
+    const HRESULT status = (expert->*operation)(&text);
+    std::string result = TakeHostString(text);
+    CheckStatus(status, name);
+    return result;
+}
+
+}  // namespace
+
+void RunInfo(CommandContext& context) {
+    GUID classId{};
+    CheckStatus(context.expert->GetExpertClassId(&classId), "GetExpertClassId");
+    const std::string displayName = IdentityString(
+        context.expert, &IuxSysExpert3::GetExpertDisplayName, "GetExpertDisplayName");
+    const std::string version =
+        IdentityString(context.expert, &IuxSysExpert3::GetExpertVersion, "GetExpertVersion");
+    const std::string programmaticName = IdentityString(
+        context.expert, &IuxSysExpert3::GetExpertProgrammaticName, "GetExpertProgrammaticName");
+
+    if (context.json) {
+        context.out << "{\"classId\":" << JsonQuoted(GuidText(classId))
+                    << ",\"displayName\":" << JsonQuoted(displayName)
+                    << ",\"version\":" << JsonQuoted(version)
+                    << ",\"programmaticName\":" << JsonQuoted(programmaticName) << "}\n";
+    } else {
+        context.out << "Class identifier:  " << GuidText(classId) << "\n"
+                    << "Display name:      " << displayName << "\n"
+                    << "Version:           " << version << "\n"
+                    << "Programmatic name: " << programmaticName << "\n";
+    }
+}

@@ -1,0 +1,51 @@
+#include "ItemAccess.h"
+
+#include "ExitCodes.h"
+#include "HostText.h"
+#include "StatusNames.h"
+#include "uxsys/HostString.h"
+#include "uxsys/StatusCodes.h"
+
+std::wstring ItemArgument(const std::string& text) {
+    std::optional<std::wstring> item = WideFromUtf8(text);
+    if (!item) {
+        throw UsageError("the item name is not valid UTF-8 text");
+    }
+    return *item;
+}
+
+std::vector<std::wstring> ItemNames(IuxSysExpert3* expert) {
+    InterfaceRef<IuxSysEnumStringList> names;
+    const HRESULT status = expert->SearchForItemNames(names.Receive());
+    if (status < 0 || !names) {
+        throw Failure("listing the items failed with " + StatusWithName(status));
+    }
+    std::vector<std::wstring> result;
+    for (;;) {
+        CvqBStrHolder name;
+        uint32_t fetched = 0;
+        const HRESULT next = names->Next(1, name.Receive(), &fetched);
+        if (next < 0) {
+            throw Failure("reading the item names failed with " + StatusWithName(next));
+        }
+        if (next != S_OK || fetched != 1) {
+            return result;
+        }
+        result.emplace_back(name.Get() != nullptr ? name.Get() : L"", CvqBStrLength(name.Get()));
+    }
+}
+
+HRESULT CurrentProperties(IuxSysExpert3* expert, const std::wstring& item,
+                          InterfaceRef<IuxSysPropertyBag2>* bag) {
+    InterfaceRef<IuxSysPropertyBag> properties;
+    const HRESULT status = expert->GetPropertiesOfItem(item.c_str(), properties.Receive());
+    if (status < 0) {
+        return status;
+    }
+    *bag = QueryInterfaceAs<IuxSysPropertyBag2>(properties.Get(), IID_IuxSysPropertyBag2);
+    return *bag ? status : E_NOINTERFACE;
+}
+
+std::string ItemText(const std::wstring& item) {
+    return Utf8FromWide(item.data(), item.size());
+}

@@ -1,0 +1,22 @@
+// Reaching the plug-in's items: their names and their current properties.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "InterfaceRef.h"
+#include "uxsys/Expert.h"
+
+// The item name a user typed, as wide text. Throws a usage error for text that is not UTF-8.
+std::wstring ItemArgument(const std::string& text);
+
+// The names of all items in the plug-in's order. Throws a failure with the status.
+std::vector<std::wstring> ItemNames(IuxSysExpert3* expert);
+
+// The item's current properties (GetPropertiesOfItem) as a bag with the timestamp operations.
+// Returns the plug-in's status; the bag is set only on success.
+HRESULT CurrentProperties(IuxSysExpert3* expert, const std::wstring& item,
+                          InterfaceRef<IuxSysPropertyBag2>* bag);
+
+// The item name as UTF-8 for output.
+std::string ItemText(const std::wstring& item);

@@ -1,0 +1,65 @@
+#include "PropertyListing.h"
+
+#include "BagValues.h"
+#include "HostText.h"
+#include "PropertyCatalogue.h"
+#include "StatusNames.h"
+#include "TextTable.h"
+#include "ValueText.h"
+#include "uxsys/StatusCodes.h"
+
+namespace {
+
+NumberStyle StyleOf(uint32_t tag) {
+    const PropertyDescription* description = FindProperty(tag);
+    return description != nullptr ? description->style : NumberStyle::kDecimal;
+}
+
+}  // namespace
+
+std::vector<PropertyEntry> ReadProperties(IuxSysPropertyBag2* bag,
+                                          const std::vector<uint32_t>& tags) {
+    std::vector<PropertyEntry> entries;
+    entries.reserve(tags.size());
+    for (const uint32_t tag : tags) {
+        PropertyEntry entry{tag, S_OK, PropertyValue()};
+        entry.status = ReadBagValue(bag, tag, &entry.value);
+        entries.push_back(std::move(entry));
+    }
+    return entries;
+}
+
+void WritePropertyTable(std::ostream& out, const std::vector<PropertyEntry>& entries,
+                        const std::string& indent) {
+    TextTable table({"TAG", "NAME", "TYPE", "VALUE"});
+    for (const PropertyEntry& entry : entries) {
+        if (entry.status < 0) {
+            table.AddRow({TagText(entry.tag), TagDisplayName(entry.tag), "-",
+                          "(unreadable: " + StatusWithName(entry.status) + ")"});
+        } else {
+            table.AddRow({TagText(entry.tag), TagDisplayName(entry.tag),
+                          TypeCodeName(TypeCodeOf(entry.value)),
+                          ValueForPeople(entry.value, StyleOf(entry.tag))});
+        }
+    }
+    table.Write(out, indent);
+}
+
+std::string PropertiesAsJson(const std::vector<PropertyEntry>& entries) {
+    std::string json = "{";
+    for (const PropertyEntry& entry : entries) {
+        if (json.size() > 1) {
+            json += ",";
+        }
+        json +=
+            JsonQuoted(TagDisplayName(entry.tag)) + ":{\"tag\":" + JsonQuoted(TagText(entry.tag));
+        if (entry.status < 0) {
+            json += ",\"error\":" + JsonQuoted(StatusWithName(entry.status));
+        } else {
+            json += ",\"type\":" + JsonQuoted(TypeCodeName(TypeCodeOf(entry.value))) +
+                    ",\"value\":" + ValueAsJson(entry.value);
+        }
+        json += "}";
+    }
+    return json + "}";
+}

@@ -1,0 +1,56 @@
+// kestcfg sim init DIR: creates a demo controller for the other commands to work on.
+#include <limits.h>
+#include <unistd.h>
+
+#include "Commands.h"
+#include "DemoController.h"
+#include "ExitCodes.h"
+#include "HostText.h"
+
+namespace {
+
+// `directory` as an absolute path without resolving links; the scripts of the demo controller
+// name their files by it.
+std::string AbsoluteDirectory(const std::string& directory) {
+    std::string path = directory;
+    if (path.front() != '/') {
+        char current[PATH_MAX];
+        if (getcwd(current, sizeof current) == nullptr) {
+            throw Failure("cannot determine the current directory");
+        }
+        path = std::string(current) + "/" + path;
+    }
+    while (path.size() > 1 && path.back() == '/') {
+        path.pop_back();
+    }
+    return path;
+}
+
+}  // namespace
+
+void RunSim(CommandContext& context) {
+    if (context.arguments[0] != "init") {
+        throw UsageError("unknown sim command " + context.arguments[0] +
+                         "; usage: kestcfg sim init DIR");
+    }
+    if (context.arguments[1].empty()) {
+        throw UsageError("sim init needs a directory");
+    }
+    const std::string root = AbsoluteDirectory(context.arguments[1]);
+    const std::vector<std::string> files = CreateDemoController(root, FindTimeZoneTable());
+
+    if (context.json) {
+        context.out << "{\"sysroot\":" << JsonQuoted(root) << ",\"files\":[";
+        for (size_t i = 0; i < files.size(); ++i) {
+            context.out << (i == 0 ? "" : ",") << JsonQuoted(files[i]);
+        }
+        context.out << "]}\n";
+        return;
+    }
+    context.out << "Created a demo controller in " << root << ":\n";
+    for (const std::string& file : files) {
+        context.out << "  " << file << "\n";
+    }
+    context.out << "Use it with: kestcfg --sysroot " << root << " items\n"
+                << "         or: export KEST_SYSROOT=" << root << "\n";
+}
