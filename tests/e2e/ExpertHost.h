@@ -22,10 +22,15 @@ constexpr char kControllerCallLogPath[] = "/var/lib/vqtargetcfg/calls.log";
 constexpr uint32_t kItemNameTag = 0x0101D000;
 constexpr wchar_t kSystemItemName[] = L"VQ KEST Chassis";
 
+// The controller's system settings that every state of these tests carries.
+constexpr char kSystemState[] =
+    "[System]\nHostName = kest-1\nLanguageName = English\nSupportedLanguages = English,German\n"
+    "TimeZone = Europe/Berlin\n";
+
 // A controller state with one device of the given type and interface name.
 inline std::string StateWithDevice(int type, const std::string& interfaceName) {
-    return "[Device0]\nType = " + std::to_string(type) + "\nInterfaceName = " + interfaceName +
-           "\nIndex = 3\n";
+    return kSystemState + ("[Device0]\nType = " + std::to_string(type) +
+                           "\nInterfaceName = " + interfaceName + "\nIndex = 3\n");
 }
 
 // The text of a host string, which is freed.
@@ -82,6 +87,7 @@ class RecordingSink : public IuxSysSearchSink {
 class ExpertHostTest : public ::testing::Test {
   protected:
     void SetUp() override {
+        sysroot.WriteFile("/etc/korvane/version", "22.5.0\n");
         ASSERT_NE(nullptr, plugin.Factory());
         expert = plugin.CreateExpert();
         ASSERT_NE(nullptr, expert);

@@ -29,6 +29,7 @@ INSTANTIATE_TEST_SUITE_P(
     Devices, ItemDiscoveryTest,
     ::testing::Values(
         DeviceCase{"NoStateFile", "", {kSystemItemName}},
+        DeviceCase{"NoDevice", kSystemState, {kSystemItemName}},
         DeviceCase{"Eth0", StateWithDevice(1, "eth0"), {kSystemItemName, L"eth0"}},
         DeviceCase{"UpperCaseEth0", StateWithDevice(1, "ETH0"), {kSystemItemName, L"ETH0"}},
         DeviceCase{"OtherEthernetName", StateWithDevice(1, "eth1"), {kSystemItemName}},
