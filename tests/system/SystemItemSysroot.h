@@ -1,0 +1,100 @@
+// A temporary sysroot for the system item: the simulated controller's files, the firmware
+// version file, the time-zone table, the web-service settings and a logging hardware-clock tool.
+#pragma once
+
+#include <fstream>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "sim/SimFixture.h"
+#include "uxsys/StatusCodes.h"
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
+namespace test {
+
+constexpr char kTimeZoneTablePath[] = "/usr/share/vqsysapi/timezone.ini";
+constexpr char kWebServicePath[] = "/etc/korvane/share/vqkest.ini";
+constexpr char kHardwareClockLog[] = "/hwclock.log";
+constexpr char kClockFile[] = "/run/kest/system-clock";
+
+// A controller with a description, identity, languages and an Olson time zone.
+constexpr char kDefaultState[] =
+    "[System]\n"
+    "DeviceDescription = KEST 9100\n"
+    "TargetClass = KEST\n"
+    "HostName = kest-01\n"
+    "TargetID = 77\n"
+    "SerialNumber = 6699\n"
+    "UserComment = rack 4\n"
+    "LanguageName = German\n"
+    "SupportedLanguages = English,German,French\n"
+    "TimeZone = America/Chicago\n"
+    "TimezoneOffset = -360\n"
+    "FullyQualifiedDNSName = kest-01.example.net\n";
+
+// A small table: two legacy texts and three Olson names.
+constexpr char kSmallTimeZoneTable[] =
+    "[LegacyToOlson]\n"
+    "CST6CDT = America/Chicago\n"
+    "PST8PDT = America/Los_Angeles\n"
+    "EST5EDT = America/New_York\n"
+    "[OlsonToLegacy]\n"
+    "America/Chicago = CST6CDT\n"
+    "America/Los_Angeles = PST8PDT\n"
+    "America/New_York = EST5EDT\n";
+
+// Runs `call`, expecting it to throw a status (a long); returns that status.
+template <class Call>
+HRESULT ThrownStatus(Call&& call) {
+    try {
+        call();
+    } catch (long status) {
+        return static_cast<HRESULT>(status);
+    }
+    ADD_FAILURE() << "no status thrown";
+    return S_OK;
+}
+
+class SystemItemSysroot : public vqsim_test::SimSysroot {
+  public:
+    SystemItemSysroot() {
+        WriteState(kDefaultState);
+        sysroot_.WriteFile("/etc/korvane/version", "22.5.0\nbuild 17\n");
+        sysroot_.WriteFile(kTimeZoneTablePath, kSmallTimeZoneTable);
+        sysroot_.MakeDirectory("/etc/korvane/share");
+        sysroot_.WriteScript("/sbin/hwclock", "echo \"$@\" >> \"$KEST_SYSROOT" +
+                                                  std::string(kHardwareClockLog) + "\"\n");
+    }
+
+    // The shipped table from the source tree, installed in place of the small one.
+    void InstallShippedTimeZoneTable() const {
+        std::ifstream shipped(KEST_SHIPPED_TIMEZONE_TABLE, std::ios::binary);
+        std::ostringstream content;
+        content << shipped.rdbuf();
+        sysroot_.WriteFile(kTimeZoneTablePath, content.str());
+    }
+
+    // The names of the library calls logged so far, in order.
+    std::vector<std::string> CallNames() const {
+        std::vector<std::string> names;
+        for (const std::string& line : CallLog()) {
+            names.push_back(line.substr(0, line.find('\t')));
+        }
+        return names;
+    }
+
+    // The logged calls whose name starts with "Set" (name, status and arguments).
+    std::vector<std::string> SetterCalls() const {
+        std::vector<std::string> setters;
+        for (const std::string& line : CallLog()) {
+            if (line.compare(0, 3, "Set") == 0) {
+                setters.push_back(line);
+            }
+        }
+        return setters;
+    }
+};
+
+}  // namespace test
+}  // namespace nVQKESTSYSAPICHASSISEXPERT100

@@ -1,0 +1,263 @@
+#include "system/SystemTimeAssistant.h"
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include "property/CuxDynamicPropertyBag.h"
+#include "support/ConvertStatusCode.h"
+#include "system/SystemItemSysroot.h"
+#include "system/SystemItemTags.h"
+#include "uxsys/HostString.h"
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
+namespace {
+
+using test::ThrownStatus;
+
+constexpr int64_t kEpoch = vq::dsc::AbsTime::kUnixEpochSeconds;
+
+class SystemTimeAssistantTest : public ::testing::Test, public test::SystemItemSysroot {
+  protected:
+    // The status a library failure code becomes when it is thrown.
+    static HRESULT Converted(int32_t libraryStatus) { return ConvertStatusCode(libraryStatus); }
+
+    bool HasCall(const std::string& name) const {
+        for (const std::string& called : CallNames()) {
+            if (called == name) {
+                return true;
+            }
+        }
+        return false;
+    }
+
+    SystemTimeAssistant assistant_;
+};
+
+TEST_F(SystemTimeAssistantTest, FindsBuiltInOffsetsOfStandardAndDaylightTexts) {
+    struct Case {
+        const char* text;
+        HRESULT result;
+        int32_t seconds;
+    };
+    const Case cases[] = {
+        {"PST8", S_OK, -28800},
+        {"PST8PDT", S_OK, -28800},
+        {"NPT-5:45", S_OK, 20700},
+        {"CUT0GDT", S_OK, 0},
+        {"MART9:30MARDT", S_OK, -34200},
+        {"TOT-13TDT", S_OK, 46800},
+        {"America/Chicago", S_FALSE, 99},
+        {"pst8pdt", S_FALSE, 99},
+        {"", S_FALSE, 99},
+    };
+    for (const Case& c : cases) {
+        int32_t seconds = 99;
+        EXPECT_EQ(c.result, assistant_.FindLegacyOffset(c.text, seconds)) << c.text;
+        EXPECT_EQ(c.seconds, seconds) << c.text;
+    }
+}
+
+TEST_F(SystemTimeAssistantTest, OffsetDifferenceCountsUnknownTextsAsZero) {
+    EXPECT_EQ(10800, assistant_.GetLegacyOffsetDifference("EST5EDT", L"PST8PDT"));
+    EXPECT_EQ(21600, assistant_.GetLegacyOffsetDifference("America/Chicago", L"CST6CDT"));
+    EXPECT_EQ(-63000, assistant_.GetLegacyOffsetDifference("UTC12", L"IST-5:30IDT"));
+    EXPECT_EQ(0, assistant_.GetLegacyOffsetDifference("Europe/Berlin", L"Asia/Tokyo"));
+}
+
+TEST_F(SystemTimeAssistantTest, TranslatesTheCurrentZoneThroughTheTable) {
+    EXPECT_EQ("America/Chicago", assistant_.GetOlsonTimeZone());
+    EXPECT_EQ("CST6CDT", assistant_.GetLegacyTimeZone());
+
+    WriteState("[System]\nTimeZone = Europe/Paris\n");
+    EXPECT_EQ("CUT0", assistant_.GetLegacyTimeZone());
+
+    std::string olsonName = "untouched";
+    EXPECT_EQ(S_OK, assistant_.LookupLegacyToOlson("PST8PDT", olsonName));
+    EXPECT_EQ("America/Los_Angeles", olsonName);
+    EXPECT_EQ(S_FALSE, assistant_.LookupLegacyToOlson("XYZ1", olsonName));
+    EXPECT_EQ("America/Los_Angeles", olsonName);
+}
+
+TEST_F(SystemTimeAssistantTest, WithoutTableEveryZoneIsCut0AndEveryLegacyTextUnknown) {
+    sysroot_.WriteFile(test::kTimeZoneTablePath, "");
+    EXPECT_EQ("CUT0", assistant_.GetLegacyTimeZone());
+    EXPECT_EQ(UX_E_VALUE_INVALID,
+              assistant_.ValidateOlsonOrLegacyTimeZone("CST6CDT", false, nullptr));
+}
+
+TEST_F(SystemTimeAssistantTest, AnEmptyTableEntryCountsAsMissing) {
+    sysroot_.WriteFile(test::kTimeZoneTablePath, "[LegacyToOlson]\nPST8PDT =\n");
+    std::string olsonName = "untouched";
+    EXPECT_EQ(S_FALSE, assistant_.LookupLegacyToOlson("PST8PDT", olsonName));
+    EXPECT_EQ("untouched", olsonName);
+}
+
+TEST_F(SystemTimeAssistantTest, LibraryFailuresAreThrownConverted) {
+    WriteState(std::string(test::kDefaultState) + "[Faults]\nGetTimeZone = -375501\n");
+    EXPECT_EQ(Converted(-375501), ThrownStatus([&] { assistant_.GetLegacyTimeZone(); }));
+}
+
+TEST_F(SystemTimeAssistantTest, ValidatesOlsonNamesThroughTheLibraryWithoutMessage) {
+    sysroot_.WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
+    CvqBStrHolder message;
+    EXPECT_EQ(S_OK,
+              assistant_.ValidateOlsonOrLegacyTimeZone("Europe/Berlin", true, message.Receive()));
+    EXPECT_EQ(Converted(-375523), ThrownStatus([&] {
+                  assistant_.ValidateOlsonOrLegacyTimeZone("Mars/Olympus", true, message.Receive());
+              }));
+    EXPECT_EQ(nullptr, message.Get());
+    EXPECT_TRUE(HasCall("ValidateTimeZone"));
+}
+
+TEST_F(SystemTimeAssistantTest, ValidatesLegacyTextsThroughTheTable) {
+    CvqBStrHolder message;
+    EXPECT_EQ(S_OK, assistant_.ValidateOlsonOrLegacyTimeZone("PST8PDT", false, message.Receive()));
+    EXPECT_EQ(nullptr, message.Get());
+    EXPECT_EQ(UX_E_VALUE_INVALID,
+              assistant_.ValidateOlsonOrLegacyTimeZone("XYZ1", false, message.Receive()));
+    ASSERT_NE(nullptr, message.Get());
+    EXPECT_STREQ(L"Timezone not supported.", message.Get());
+    EXPECT_EQ(UX_E_VALUE_INVALID, assistant_.ValidateOlsonOrLegacyTimeZone("XYZ1", false, nullptr));
+}
+
+TEST_F(SystemTimeAssistantTest, PersistsATimeZoneOnlyWhenItChangesToAKnownName) {
+    struct Case {
+        const char* name;
+        uint32_t tag;
+        const wchar_t* value;  // null: the tag is not in the bag
+        HRESULT result;
+        const char* setTimeZoneCall;  // null: SetTimeZone is not called
+    };
+    const Case cases[] = {
+        {"new legacy text", SystemTag::kLegacyTimeZone, L"PST8PDT", S_OK,
+         "SetTimeZone\t0\tAmerica/Los_Angeles"},
+        {"current legacy text", SystemTag::kLegacyTimeZone, L"CST6CDT", S_FALSE, nullptr},
+        {"unmapped legacy text", SystemTag::kLegacyTimeZone, L"XYZ1", UX_E_VALUE_INVALID, nullptr},
+        {"empty legacy text", SystemTag::kLegacyTimeZone, L"", UX_E_VALUE_INVALID, nullptr},
+        {"legacy text missing", SystemTag::kLegacyTimeZone, nullptr, UX_E_PROPERTY_NOT_FOUND,
+         nullptr},
+        {"new Olson name", SystemTag::kOlsonTimeZone, L"Europe/Berlin", S_OK,
+         "SetTimeZone\t0\tEurope/Berlin"},
+        {"current Olson name", SystemTag::kOlsonTimeZone, L"America/Chicago", S_FALSE, nullptr},
+        {"empty Olson name", SystemTag::kOlsonTimeZone, L"", UX_E_VALUE_INVALID, nullptr},
+        {"Olson name missing", SystemTag::kOlsonTimeZone, nullptr, UX_E_PROPERTY_NOT_FOUND,
+         nullptr},
+    };
+    for (const Case& c : cases) {
+        WriteState(test::kDefaultState);
+        sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+        CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+        if (c.value != nullptr) {
+            bag->SetString(c.tag, c.value);
+        }
+        int32_t persistFlag = 5;
+        EXPECT_EQ(c.result, assistant_.PersistSystemPropertyTimezone(c.tag, bag.Get(), persistFlag))
+            << c.name;
+        EXPECT_EQ(5, persistFlag) << c.name;
+        const std::vector<std::string> setters = SetterCalls();
+        if (c.setTimeZoneCall == nullptr) {
+            EXPECT_TRUE(setters.empty()) << c.name;
+        } else {
+            EXPECT_EQ(std::vector<std::string>{c.setTimeZoneCall}, setters) << c.name;
+        }
+        if (c.value == nullptr) {
+            EXPECT_TRUE(CallLog().empty()) << c.name << ": a failed read calls nothing";
+        }
+    }
+}
+
+TEST_F(SystemTimeAssistantTest, PersistingATimeZoneRejectsOtherTagsAndNullBags) {
+    int32_t persistFlag = 0;
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    EXPECT_EQ(E_FAIL, ThrownStatus([&] {
+                  assistant_.PersistSystemPropertyTimezone(SystemTag::kHostName, bag.Get(),
+                                                           persistFlag);
+              }));
+    EXPECT_EQ(E_POINTER, assistant_.PersistSystemPropertyTimezone(SystemTag::kOlsonTimeZone,
+                                                                  nullptr, persistFlag));
+}
+
+class ClockTest : public SystemTimeAssistantTest {
+  protected:
+    std::string Clock() const { return sysroot_.ReadFile(test::kClockFile); }
+    std::string HardwareClockCalls() const { return sysroot_.ReadFile(test::kHardwareClockLog); }
+};
+
+TEST_F(ClockTest, SetsTheSystemClockInUnixSecondsAndWholeMicroseconds) {
+    SystemTimeAssistant::SetCurrentSystemTime(vq::dsc::AbsTime{0, kEpoch});
+    EXPECT_EQ("0 0\n", Clock());
+    // Half a second plus a hair below one microsecond more: the hair is cut off.
+    SystemTimeAssistant::SetCurrentSystemTime(
+        vq::dsc::AbsTime{(uint64_t(1) << 63) + 18446744073709ull, kEpoch + 1700000000});
+    EXPECT_EQ("1700000000 500000\n", Clock());
+    EXPECT_EQ("", HardwareClockCalls()) << "no real-time clock node";
+}
+
+TEST_F(ClockTest, CopiesToTheHardwareClockWhenARealTimeClockNodeIsReadable) {
+    struct Case {
+        const char* node;
+        bool adjtime;
+        const char* arguments;
+    };
+    const Case cases[] = {
+        {"/dev/rtc", true, "--systohc\n"},
+        {"/dev/rtc0", false, "--systohc --noadjfile --utc\n"},
+        {"/dev/misc/rtc", true, "--systohc\n"},
+        {"/dev/misc/rtc", false, "--systohc --noadjfile --utc\n"},
+    };
+    for (const Case& c : cases) {
+        test::SystemItemSysroot fresh;
+        fresh.sysroot_.WriteFile(c.node, "");
+        if (c.adjtime) {
+            fresh.sysroot_.WriteFile("/etc/adjtime", "0.0 0 0.0\n0\nUTC\n");
+        }
+        SystemTimeAssistant::SetCurrentSystemTime(vq::dsc::AbsTime{0, kEpoch + 60});
+        EXPECT_EQ("60 0\n", fresh.sysroot_.ReadFile(test::kClockFile)) << c.node;
+        EXPECT_EQ(c.arguments, fresh.sysroot_.ReadFile(test::kHardwareClockLog)) << c.node;
+        EXPECT_TRUE(SystemTimeAssistant::HasRealTimeClock());
+    }
+    EXPECT_FALSE(SystemTimeAssistant::HasRealTimeClock());
+}
+
+TEST_F(ClockTest, PersistsTheBagsTimePlusTheOffset) {
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    bag->SetTimestamp(SystemTag::kCurrentTime, {0, kEpoch + 1700000000});
+    EXPECT_EQ(S_OK, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 28800));
+    EXPECT_EQ("1700028800 0\n", Clock());
+    EXPECT_EQ(S_OK, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), -3600));
+    EXPECT_EQ("1699996400 0\n", Clock());
+}
+
+TEST_F(ClockTest, ClockFailuresBecomeEFailAfterTheSystemTimeIsSet) {
+    sysroot_.WriteFile("/dev/rtc", "");
+    sysroot_.WriteScript("/sbin/hwclock", "exit 3\n");
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    bag->SetTimestamp(SystemTag::kCurrentTime, {0, kEpoch + 100});
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+    EXPECT_EQ("100 0\n", Clock());
+
+    sysroot_.WriteScript("/sbin/hwclock", "kill -9 $$\n");
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+
+    chmod(sysroot_.PathOf("/sbin/hwclock").c_str(), 0644);
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+}
+
+TEST_F(ClockTest, TimesTheClockCannotHoldBecomeEFail) {
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    bag->SetTimestamp(SystemTag::kCurrentTime, {uint64_t(1) << 63, kEpoch - 2});
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+    bag->SetTimestamp(SystemTag::kCurrentTime, {0, INT64_MAX});
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 1));
+    EXPECT_EQ("", Clock());
+}
+
+TEST_F(ClockTest, AMissingTimeIsTheBagsStatus) {
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND,
+              ThrownStatus([&] { assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0); }));
+    EXPECT_EQ(E_POINTER, assistant_.PersistSystemPropertyCurrentTime(nullptr, 0));
+}
+
+}  // namespace
+}  // namespace nVQKESTSYSAPICHASSISEXPERT100
