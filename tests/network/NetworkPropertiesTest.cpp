@@ -126,8 +126,7 @@ TEST_F(PropertiesTest, RequestModeOfAnAdapterOutsideTcpIpFollowsTheSupportedMask
 }
 
 TEST_F(PropertiesTest, AdapterWithoutAddressReportsZeroAddresses) {
-    CountedPtr<IuxSysPropertyBag4> bag =
-        Properties(AdapterState("IPAddress =\n"));
+    CountedPtr<IuxSysPropertyBag4> bag = Properties(AdapterState("IPAddress =\n"));
     EXPECT_EQ(L"0.0.0.0", TextOf(bag.Get(), tag::kIPAddress));
     EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kAddressCount));
     EXPECT_EQ(L"0.0.0.0", TextOf(bag.Get(), tag::kSubnetMask));
