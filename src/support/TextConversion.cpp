@@ -1,9 +1,11 @@
 #include "support/TextConversion.h"
 
 #include <iconv.h>
+#include <langinfo.h>
 
 #include <cerrno>
-#include <vector>
+#include <memory>
+#include <string>
 
 #include "support/Exceptions.h"
 
@@ -57,17 +59,40 @@ class IconvDescriptor {
     iconv_t cd_;
 };
 
+// The calling thread's descriptor for one direction, reopened whenever the locale's character set
+// has changed since it was opened (opening one costs far more than a conversion).
+class CachedDescriptor {
+  public:
+    explicit CachedDescriptor(bool toNarrow) : toNarrow_(toNarrow) {}
+
+    IconvDescriptor& ForCurrentLocale() {
+        const char* codeset = nl_langinfo(CODESET);
+        if (!descriptor_ || codeset_ != codeset) {
+            descriptor_.reset();
+            descriptor_ = toNarrow_ ? std::make_unique<IconvDescriptor>("", "WCHAR_T")
+                                    : std::make_unique<IconvDescriptor>("WCHAR_T", "");
+            codeset_ = codeset;
+        }
+        return *descriptor_;
+    }
+
+  private:
+    bool toNarrow_;
+    std::string codeset_;
+    std::unique_ptr<IconvDescriptor> descriptor_;
+};
+
 }  // namespace
 
 std::string NarrowFromWide(const wchar_t* text, size_t count) {
     if (count == 0) {
         return std::string();
     }
-    thread_local IconvDescriptor toNarrow("", "WCHAR_T");
+    thread_local CachedDescriptor toNarrow(true);
     std::string out(count * 4, '\0');
-    const size_t written =
-        toNarrow.Convert(reinterpret_cast<const char*>(text), count * sizeof(wchar_t), &out[0],
-                         out.size(), sizeof(wchar_t), "?", 1);
+    const size_t written = toNarrow.ForCurrentLocale().Convert(reinterpret_cast<const char*>(text),
+                                                               count * sizeof(wchar_t), &out[0],
+                                                               out.size(), sizeof(wchar_t), "?", 1);
     out.resize(written);
     return out;
 }
@@ -76,12 +101,12 @@ std::wstring WideFromNarrow(const char* text, size_t count) {
     if (count == 0) {
         return std::wstring();
     }
-    thread_local IconvDescriptor toWide("WCHAR_T", "");
+    thread_local CachedDescriptor toWide(false);
     std::wstring out(count, L'\0');
     const wchar_t question = L'?';
-    const size_t written =
-        toWide.Convert(text, count, reinterpret_cast<char*>(&out[0]), out.size() * sizeof(wchar_t),
-                       1, reinterpret_cast<const char*>(&question), sizeof(question));
+    const size_t written = toWide.ForCurrentLocale().Convert(
+        text, count, reinterpret_cast<char*>(&out[0]), out.size() * sizeof(wchar_t), 1,
+        reinterpret_cast<const char*>(&question), sizeof(question));
     out.resize(written / sizeof(wchar_t));
     return out;
 }

@@ -4,7 +4,6 @@
 #include <cstdint>
 #include <cstring>
 #include <string>
-#include <thread>
 
 #include "support/Exceptions.h"
 #include "vq/dsc/SafeInteger.h"
@@ -134,14 +133,17 @@ TEST(StringBaseConversion, Utf8LocaleConvertsAndReplacesInvalidBytes) {
     if (std::setlocale(LC_ALL, "C.UTF-8") == nullptr) {
         GTEST_SKIP() << "no C.UTF-8 locale";
     }
-    // A fresh thread: conversion state is per thread and bound to the locale of its first use.
-    std::thread([] {
+    // Convert under the C locale first: the later change must still be honoured on this thread.
+    std::setlocale(LC_ALL, "C");
+    EXPECT_STREQ("a?b", NarrowString(L"a\u00E9b").c_str());
+    ASSERT_NE(nullptr, std::setlocale(LC_ALL, "C.UTF-8"));
+    {
         EXPECT_EQ(L"caf\u00E9", WideString("caf\xC3\xA9").str());
         EXPECT_STREQ("caf\xC3\xA9", NarrowString(L"caf\u00E9").c_str());
         EXPECT_EQ(L"a?(b", WideString("a\xC3(b").str());
         EXPECT_EQ(L"end??", WideString("end\xE2\x82").str());
         EXPECT_STREQ("a?b", NarrowString(std::wstring{L'a', wchar_t(0xD800), L'b'}).c_str());
-    }).join();
+    }
     std::setlocale(LC_ALL, previous.c_str());
 }
 
