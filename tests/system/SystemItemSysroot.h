@@ -3,6 +3,7 @@
 #pragma once
 
 #include <fstream>
+#include <map>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -18,20 +19,33 @@ constexpr char kWebServicePath[] = "/etc/korvane/share/vqkest.ini";
 constexpr char kHardwareClockLog[] = "/hwclock.log";
 constexpr char kClockFile[] = "/run/kest/system-clock";
 
-// A controller with a description, identity, languages and an Olson time zone.
-constexpr char kDefaultState[] =
-    "[System]\n"
-    "DeviceDescription = KEST 9100\n"
-    "TargetClass = KEST\n"
-    "HostName = kest-01\n"
-    "TargetID = 77\n"
-    "SerialNumber = 6699\n"
-    "UserComment = rack 4\n"
-    "LanguageName = German\n"
-    "SupportedLanguages = English,German,French\n"
-    "TimeZone = America/Chicago\n"
-    "TimezoneOffset = -360\n"
-    "FullyQualifiedDNSName = kest-01.example.net\n";
+// The [System] section of a controller with a description, identity, languages and an Olson time
+// zone; `overrides` replace or add keys, `extra` follows the section (for example a [Faults]
+// section).
+inline std::string SystemState(const std::map<std::string, std::string>& overrides = {},
+                               const std::string& extra = "") {
+    std::map<std::string, std::string> keys = {
+        {"DeviceDescription", "KEST 9100"},
+        {"TargetClass", "KEST"},
+        {"HostName", "kest-01"},
+        {"TargetID", "77"},
+        {"SerialNumber", "6699"},
+        {"UserComment", "rack 4"},
+        {"LanguageName", "German"},
+        {"SupportedLanguages", "English,German,French"},
+        {"TimeZone", "America/Chicago"},
+        {"TimezoneOffset", "-360"},
+        {"FullyQualifiedDNSName", "kest-01.example.net"},
+    };
+    for (const auto& [key, value] : overrides) {
+        keys[key] = value;
+    }
+    std::string state = "[System]\n";
+    for (const auto& [key, value] : keys) {
+        state += key + " = " + value + "\n";
+    }
+    return state + extra;
+}
 
 // A small table: two legacy texts and three Olson names.
 constexpr char kSmallTimeZoneTable[] =
@@ -59,7 +73,7 @@ HRESULT ThrownStatus(Call&& call) {
 class SystemItemSysroot : public vqsim_test::SimSysroot {
   public:
     SystemItemSysroot() {
-        WriteState(kDefaultState);
+        WriteState(SystemState());
         sysroot_.WriteFile("/etc/korvane/version", "22.5.0\nbuild 17\n");
         sysroot_.WriteFile(kTimeZoneTablePath, kSmallTimeZoneTable);
         sysroot_.MakeDirectory("/etc/korvane/share");

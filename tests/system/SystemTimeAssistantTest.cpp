@@ -93,7 +93,7 @@ TEST_F(SystemTimeAssistantTest, AnEmptyTableEntryCountsAsMissing) {
 }
 
 TEST_F(SystemTimeAssistantTest, LibraryFailuresAreThrownConverted) {
-    WriteState(std::string(test::kDefaultState) + "[Faults]\nGetTimeZone = -375501\n");
+    WriteState(test::SystemState({}, "[Faults]\nGetTimeZone = -375501\n"));
     EXPECT_EQ(Converted(-375501), ThrownStatus([&] { assistant_.GetLegacyTimeZone(); }));
 }
 
@@ -144,7 +144,7 @@ TEST_F(SystemTimeAssistantTest, PersistsATimeZoneOnlyWhenItChangesToAKnownName) 
          nullptr},
     };
     for (const Case& c : cases) {
-        WriteState(test::kDefaultState);
+        WriteState(test::SystemState());
         sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
         CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
         if (c.value != nullptr) {

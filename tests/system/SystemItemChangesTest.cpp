@@ -1,0 +1,219 @@
+// Validation and persistence of changes through the system item's handler.
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "property/CuxDynamicPropertyBag.h"
+#include "support/AbsTime.h"
+#include "support/ConvertStatusCode.h"
+#include "system/KestDeviceItemHandler.h"
+#include "system/SystemItemSysroot.h"
+#include "system/SystemItemTags.h"
+#include "uxsys/HostString.h"
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
+namespace {
+
+constexpr int64_t kEpoch = vq::dsc::AbsTime::kUnixEpochSeconds;
+constexpr uxSysAttrTimestampUTC k2023{0, kEpoch + 1700000000};
+
+class SystemItemChangesTest : public ::testing::Test, public test::SystemItemSysroot {
+  protected:
+    SystemItemChangesTest() {
+        sysroot_.WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
+        // The hardware-clock tool also logs the web-service settings it finds.
+        sysroot_.WriteFile("/dev/rtc", "");
+        sysroot_.WriteScript("/sbin/hwclock",
+                             "cat \"$KEST_SYSROOT/etc/korvane/share/vqkest.ini\" >> "
+                             "\"$KEST_SYSROOT/hwclock.log\" 2>/dev/null || true\n");
+    }
+
+    HRESULT Validate() {
+        validated_.clear();
+        return handler_->ValidatePropertyChanges(changes_.Get(), validated_, message_.Receive());
+    }
+    HRESULT Persist() {
+        CountedPtr<vq::targetcfg::IDeviceHandler> device;
+        bool adapterDisabled = false;
+        return handler_->PersistPropertyChanges(changes_.Get(), persistFlag_, device,
+                                                adapterDisabled);
+    }
+    std::wstring Message() const { return message_.Get() ? message_.Get() : L"(none)"; }
+    std::string Clock() const { return sysroot_.ReadFile(test::kClockFile); }
+
+    CountedPtr<KestDeviceItemHandler> handler_ = MakeCounted<KestDeviceItemHandler>();
+    CountedPtr<IuxSysPropertyBag4> changes_ = CreatePropertyBag();
+    PropertyTagSet validated_;
+    CvqBStrHolder message_;
+    int32_t persistFlag_ = 0;
+};
+
+TEST_F(SystemItemChangesTest, AcceptsEverySettingOfTheItemAndIgnoresOthers) {
+    changes_->SetString(SystemTag::kHostName, L"kest-02");
+    changes_->SetString(SystemTag::kComment, L"spare");
+    changes_->SetString(SystemTag::kLocaleCode, L"fr");
+    changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
+    changes_->SetString(SystemTag::kLegacyTimeZone, L"PST8PDT");
+    changes_->SetString(SystemTag::kOlsonTimeZone, L"Europe/Berlin");
+    changes_->SetBool(SystemTag::kWebServiceEnabled, 1);
+    changes_->SetString(SystemTag::kDeviceDescription, L"not a setting");
+    EXPECT_EQ(S_OK, Validate());
+    EXPECT_EQ((PropertyTagSet{SystemTag::kHostName, SystemTag::kComment, SystemTag::kLocaleCode,
+                              SystemTag::kCurrentTime, SystemTag::kLegacyTimeZone,
+                              SystemTag::kOlsonTimeZone, SystemTag::kWebServiceEnabled}),
+              validated_);
+    EXPECT_EQ(nullptr, message_.Get());
+    EXPECT_TRUE(SetterCalls().empty()) << "validation changes nothing";
+}
+
+TEST_F(SystemItemChangesTest, StopsAtTheFirstRejectionWithItsStatusAndMessage) {
+    struct Case {
+        const char* name;
+        uint32_t tag;
+        const wchar_t* text;  // null: the value below is set instead
+        HRESULT status;
+        const wchar_t* message;
+    };
+    const Case cases[] = {
+        {"host name", SystemTag::kHostName, L"-bad", UX_E_HOSTNAME_INVALID,
+         L"The first and last characters of the hostname must be alphanumeric."},
+        {"comment", SystemTag::kComment,
+         L"0123456789012345678901234567890123456789012345678901234567890123X", UX_E_VALUE_INVALID,
+         L"Comment length cannot exceed 64 characters."},
+        {"locale fragment", SystemTag::kLocaleCode, L"n", UX_E_VALUE_INVALID,
+         L"Locale not supported."},
+        {"empty locale", SystemTag::kLocaleCode, L"", UX_E_VALUE_INVALID, L"Locale not supported."},
+        {"legacy zone", SystemTag::kLegacyTimeZone, L"XYZ1", UX_E_VALUE_INVALID,
+         L"Timezone not supported."},
+        {"Olson zone", SystemTag::kOlsonTimeZone, L"Mars/Olympus", ConvertStatusCode(-375523),
+         L"(none)"},
+        {"time before 1970", SystemTag::kCurrentTime, nullptr, UX_E_VALUE_INVALID,
+         L"Timestamps older than 1970 are not supported."},
+        {"web switch of another type", SystemTag::kWebServiceEnabled, L"1",
+         UX_E_PROPERTY_TYPE_MISMATCH, L"(none)"},
+    };
+    for (const Case& c : cases) {
+        changes_ = CreatePropertyBag();
+        changes_->SetString(SystemTag::kHostName, L"kest-02");
+        if (c.text != nullptr) {
+            changes_->SetString(c.tag, c.text);
+        } else {
+            changes_->SetTimestamp(c.tag, {0, kEpoch - 1});
+        }
+        changes_->SetBool(0x7FFFF000, 1);
+        EXPECT_EQ(c.status, Validate()) << c.name;
+        EXPECT_EQ(c.message, Message()) << c.name;
+        const PropertyTagSet before =
+            c.tag == SystemTag::kHostName ? PropertyTagSet{} : PropertyTagSet{SystemTag::kHostName};
+        EXPECT_EQ(before, validated_) << c.name;
+        EXPECT_EQ(c.status, handler_->ValidatePropertyChanges(changes_.Get(), validated_, nullptr))
+            << c.name << " without message slot";
+    }
+}
+
+TEST_F(SystemItemChangesTest, NothingModifiedIsNothingToDo) {
+    sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+    changes_->SetString(SystemTag::kHostName, L"kest-02");
+    changes_->ClearAllModified();
+    EXPECT_EQ(S_FALSE, Validate());
+    EXPECT_EQ(S_FALSE, Persist());
+    EXPECT_EQ(E_POINTER, handler_->ValidatePropertyChanges(nullptr, validated_, nullptr));
+    EXPECT_TRUE(CallLog().empty());
+    EXPECT_TRUE(validated_.empty());
+}
+
+TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
+    struct Case {
+        const char* name;
+        std::vector<std::pair<uint32_t, const wchar_t*>> texts;
+        std::vector<std::string> setters;
+        int32_t persistFlag;
+        HRESULT result = S_OK;
+    };
+    const Case cases[] = {
+        {"host name and comment",
+         {{SystemTag::kComment, L"spare"}, {SystemTag::kHostName, L"kest-02"}},
+         {"SetHostName\t0\tkest-02", "SetUserComment\t0\tspare"},
+         1},
+        {"comment only", {{SystemTag::kComment, L"spare"}}, {"SetUserComment\t0\tspare"}, 0},
+        {"locale", {{SystemTag::kLocaleCode, L"fr"}}, {"SetLanguageName\t0\tfr"}, 1},
+        {"failing locale after host name",
+         {{SystemTag::kHostName, L"kest-02"}, {SystemTag::kLocaleCode, L"xx"}},
+         {"SetHostName\t0\tkest-02", "SetLanguageName\t-375523\txx"},
+         1,
+         ConvertStatusCode(-375523)},
+        {"Olson zone",
+         {{SystemTag::kOlsonTimeZone, L"Europe/Berlin"}},
+         {"SetTimeZone\t0\tEurope/Berlin"},
+         0},
+        {"unchanged legacy zone", {{SystemTag::kLegacyTimeZone, L"CST6CDT"}}, {}, 0},
+    };
+    for (const Case& c : cases) {
+        WriteState(test::SystemState());
+        sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+        changes_ = CreatePropertyBag();
+        for (const auto& [tag, text] : c.texts) {
+            changes_->SetString(tag, text);
+        }
+        persistFlag_ = 0;
+        EXPECT_EQ(c.result, Persist()) << c.name;
+        EXPECT_EQ(c.setters, SetterCalls()) << c.name;
+        EXPECT_EQ(c.persistFlag, persistFlag_) << c.name;
+    }
+}
+
+TEST_F(SystemItemChangesTest, RewritesTheWebServiceSwitchEvenWhenUnchanged) {
+    sysroot_.WriteFile(test::kWebServicePath, "; old\n[WebService]\nEnable = 0\n");
+    handler_ = MakeCounted<KestDeviceItemHandler>();
+    changes_->SetBool(SystemTag::kWebServiceEnabled, 0);
+    EXPECT_EQ(S_OK, Persist());
+    EXPECT_EQ(1, persistFlag_);
+    EXPECT_EQ("[WebService]\nEnable = 0\n\n", sysroot_.ReadFile(test::kWebServicePath));
+}
+
+TEST_F(SystemItemChangesTest, SetsTheClockLastAfterTheWebServiceSwitch) {
+    changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
+    changes_->SetBool(SystemTag::kWebServiceEnabled, 1);
+    EXPECT_EQ(S_OK, Persist());
+    EXPECT_EQ("1700000000 0\n", Clock()) << "no legacy zone change, no correction";
+    EXPECT_EQ("[WebService]\nEnable = 1\n\n", sysroot_.ReadFile(test::kHardwareClockLog))
+        << "the switch was saved when the hardware clock was written";
+    EXPECT_EQ(1, persistFlag_);
+}
+
+TEST_F(SystemItemChangesTest, CorrectsTheClockByTheLegacyOffsetDifference) {
+    struct Case {
+        const char* currentZone;
+        const wchar_t* newLegacyText;
+        const char* clock;
+        const char* setTimeZone;
+    };
+    const Case cases[] = {
+        {"America/Chicago", L"PST8PDT", "1700028800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
+        {"EST5EDT", L"PST8PDT", "1700010800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
+        {"PST8PDT", L"EST5EDT", "1699989200 0\n", "SetTimeZone\t0\tAmerica/New_York"},
+    };
+    for (const Case& c : cases) {
+        WriteState(test::SystemState({{"TimeZone", c.currentZone}}));
+        sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+        changes_ = CreatePropertyBag();
+        changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
+        changes_->SetString(SystemTag::kLegacyTimeZone, c.newLegacyText);
+        EXPECT_EQ(S_OK, Persist()) << c.currentZone;
+        EXPECT_EQ(c.clock, Clock()) << c.currentZone;
+        EXPECT_EQ(std::vector<std::string>{c.setTimeZone}, SetterCalls()) << c.currentZone;
+        EXPECT_EQ(0, persistFlag_);
+    }
+}
+
+TEST_F(SystemItemChangesTest, AFailingChangeStopsBeforeTheClock) {
+    changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
+    changes_->SetString(SystemTag::kLegacyTimeZone, L"XYZ1");
+    EXPECT_EQ(UX_E_VALUE_INVALID, Persist());
+    EXPECT_EQ("", Clock());
+    EXPECT_TRUE(SetterCalls().empty());
+}
+
+}  // namespace
+}  // namespace nVQKESTSYSAPICHASSISEXPERT100
