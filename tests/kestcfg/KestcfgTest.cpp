@@ -1,69 +1,12 @@
 // kestcfg as a user runs it: the built program, its standard output, error and exit code.
 #include <gtest/gtest.h>
 
-#include <fcntl.h>
-#include <spawn.h>
-#include <stdlib.h>
-#include <sys/wait.h>
-#include <unistd.h>
-
-#include <fstream>
-#include <sstream>
-#include <string>
-#include <vector>
-
-extern char** environ;
+#include "kestcfg/KestcfgRunner.h"
 
 namespace {
 
-struct RunResult {
-    int exitCode = -1;
-    std::string out;
-    std::string err;
-};
-
-std::string ReadWhole(const std::string& path) {
-    std::ifstream file(path);
-    std::ostringstream text;
-    text << file.rdbuf();
-    return text.str();
-}
-
-// Runs kestcfg with `arguments`, collecting its output in temporary files.
-RunResult RunKestcfg(const std::vector<std::string>& arguments) {
-    char directory[] = "/tmp/kestcfg-test-XXXXXX";
-    EXPECT_NE(nullptr, mkdtemp(directory));
-    const std::string outPath = std::string(directory) + "/out";
-    const std::string errPath = std::string(directory) + "/err";
-
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 1, outPath.c_str(), O_WRONLY | O_CREAT, 0600);
-    posix_spawn_file_actions_addopen(&actions, 2, errPath.c_str(), O_WRONLY | O_CREAT, 0600);
-    std::vector<std::string> words = {KESTCFG_PATH};
-    words.insert(words.end(), arguments.begin(), arguments.end());
-    std::vector<char*> argv;
-    for (std::string& word : words) {
-        argv.push_back(word.data());
-    }
-    argv.push_back(nullptr);
-
-    RunResult result;
-    pid_t child = 0;
-    const int spawned = posix_spawn(&child, KESTCFG_PATH, &actions, nullptr, argv.data(), environ);
-    posix_spawn_file_actions_destroy(&actions);
-    EXPECT_EQ(0, spawned);
-    int status = 0;
-    if (spawned == 0 && waitpid(child, &status, 0) == child && WIFEXITED(status)) {
-        result.exitCode = WEXITSTATUS(status);
-    }
-    result.out = ReadWhole(outPath);
-    result.err = ReadWhole(errPath);
-    unlink(outPath.c_str());
-    unlink(errPath.c_str());
-    rmdir(directory);
-    return result;
-}
+using kestcfg_test::RunKestcfg;
+using kestcfg_test::RunResult;
 
 TEST(KestcfgTest, InfoPrintsTheExpertsIdentity) {
     const std::string expected =
@@ -122,6 +65,13 @@ TEST(KestcfgTest, CommandLineMistakesAreUsageErrors) {
         {"info", "extra"},
         {"--sysroot", "/nonexistent/sysroot", "info"},
         {"--sysroot", KESTCFG_PATH, "info"},
+        {"get", "a", "b"},
+        {"refresh", "eth0"},
+        {"set", "eth0"},
+        {"sim"},
+        {"sim", "init"},
+        {"sim", "start", "/tmp/x"},
+        {"sim", "init", ""},
     };
     for (const std::vector<std::string>& arguments : mistakes) {
         SCOPED_TRACE(testing::PrintToString(arguments));
@@ -138,7 +88,11 @@ TEST(KestcfgTest, HelpListsTheCommands) {
     EXPECT_EQ(0u, result.out.rfind("usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] "
                                    "COMMAND",
                                    0));
-    EXPECT_NE(std::string::npos, result.out.find("\n  info "));
+    for (const char* command : {"info", "items", "get [ITEM]", "refresh ITEM TAG...",
+                                "set ITEM NAME=VALUE...", "sim init DIR"}) {
+        EXPECT_NE(std::string::npos, result.out.find(std::string("\n  ") + command + " "))
+            << command;
+    }
 }
 
 }  // namespace

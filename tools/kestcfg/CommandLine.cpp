@@ -1,5 +1,7 @@
 #include "CommandLine.h"
 
+#include <algorithm>
+
 #include "Commands.h"
 #include "ExitCodes.h"
 
@@ -70,18 +72,33 @@ std::string UsageText() {
         "usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] COMMAND [ARGUMENTS...]\n"
         "\n"
         "options:\n"
-        "  --sysroot DIR  resolve the controller's fixed paths under DIR (sets KEST_SYSROOT)\n"
+        "  --sysroot DIR  resolve the controller's fixed paths under DIR (sets KEST_SYSROOT;\n"
+        "                 without it, KEST_SYSROOT from the environment applies)\n"
         "  --plugin PATH  the plug-in to load (default: libvqkestSysApiChassisExpert.so next\n"
         "                 to kestcfg)\n"
-        "  --json         print results as JSON\n"
+        "  --json         print results as JSON, one object per line (per item)\n"
         "\n"
         "commands:\n";
+    size_t width = 0;
     for (const CommandDescription& command : AllCommands()) {
-        text += "  " + command.synopsis;
-        text.append(command.synopsis.size() < 13 ? 13 - command.synopsis.size() : 1, ' ');
-        text += command.summary + "\n";
+        width = std::max(width, command.synopsis.size());
+    }
+    for (const CommandDescription& command : AllCommands()) {
+        text += "  " + command.synopsis + std::string(width + 2 - command.synopsis.size(), ' ') +
+                command.summary + "\n";
     }
     text +=
+        "\n"
+        "Properties are named as 'kestcfg get' shows them (host-name, ip-address,\n"
+        "polling-interval, ...) or by tag number (0x0D11B000). Values follow the property's\n"
+        "type: true/false, numbers in decimal or 0x-hexadecimal, text, and times in ISO 8601\n"
+        "UTC (2030-01-02T03:04:05Z) or now.\n"
+        "\n"
+        "examples:\n"
+        "  kestcfg sim init /tmp/kest && export KEST_SYSROOT=/tmp/kest\n"
+        "  kestcfg get eth0\n"
+        "  kestcfg set eth0 polling-interval=250\n"
+        "  kestcfg refresh 'VQ KEST Chassis' current-time\n"
         "\n"
         "exit status: 0 success, 1 value rejected, 2 usage error, 3 other failure\n";
     return text;

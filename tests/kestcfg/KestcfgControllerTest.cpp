@@ -1,0 +1,247 @@
+// kestcfg against a demo controller made by "kestcfg sim init": items, get, refresh and set,
+// their output for people and as JSON, and their exit codes.
+#include <gtest/gtest.h>
+
+#include <regex>
+#include <string>
+#include <vector>
+
+#include "common/TempSysroot.h"
+#include "kestcfg/KestcfgRunner.h"
+
+namespace {
+
+using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::RunKestcfg;
+using kestcfg_test::RunResult;
+
+const char kChassis[] = "VQ KEST Chassis";
+const char kState[] = "/var/lib/vqtargetcfg/state.ini";
+
+// A fresh demo controller; KEST_SYSROOT names it for the test's lifetime, so kestcfg finds it
+// through the environment unless a test passes --sysroot.
+class KestcfgControllerTest : public testing::Test {
+  protected:
+    void SetUp() override {
+        const RunResult created = RunKestcfg({"sim", "init", sysroot_.Root()});
+        ASSERT_EQ(0, created.exitCode) << created.err;
+    }
+
+    std::string State() const { return sysroot_.ReadFile(kState); }
+
+    kest::test::TempSysroot sysroot_;
+};
+
+// True when `text` has a table row: the tag, the name, the type and the value, blank-separated.
+bool HasRow(const std::string& text, const std::string& tag, const std::string& name,
+            const std::string& type, const std::string& value) {
+    return text.find(tag + "  ") != std::string::npos &&
+           std::regex_search(text,
+                             std::regex(tag + " +" + name + " +" + type + " +" + value + "\n"));
+}
+
+TEST_F(KestcfgControllerTest, ItemsListsTheChassisAndItsAdapter) {
+    const RunResult people = RunKestcfg({"items"});
+    EXPECT_EQ(0, people.exitCode) << people.err;
+    EXPECT_EQ("VQ KEST Chassis\neth0\n", people.out);
+
+    const RunResult json = RunKestcfg({"--sysroot", sysroot_.Root(), "--json", "items"});
+    EXPECT_EQ(0, json.exitCode) << json.err;
+    EXPECT_EQ("0/item=\"VQ KEST Chassis\"\n1/item=\"eth0\"\n", FlattenJsonLines(json.out));
+}
+
+TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
+    const RunResult result = RunKestcfg({"get"});
+    ASSERT_EQ(0, result.exitCode) << result.err;
+    EXPECT_EQ(0u, result.out.find("VQ KEST Chassis\n  TAG "));
+    EXPECT_NE(std::string::npos, result.out.find("\n\neth0\n  TAG "));
+    const std::vector<std::vector<std::string>> rows = {
+        {"0x0101F000", "host-name", "text", "kest-demo"},
+        {"0x01006000", "description", "text", "VQ KEST 9100"},
+        {"0x01007000", "serial-number", "text", "00A1B2C3"},
+        {"0x0D11D000", "locale", "text", "en"},
+        {"0x0D14E000", "time-zone", "text", "Europe/Berlin"},
+        {"0x0102F000", "firmware-version", "text", "22\\.5\\.0"},
+        {"0x21004000", "web-service", "boolean", "false"},
+        {"0x01003000", "fixed-01003", "unsigned", "0x1092"},
+        {"0x0D107000", "ip-address", "text", "192\\.168\\.10\\.20"},
+        {"0x0D126000", "primary-adapter", "boolean", "true"},
+        {"0x0D102000", "adapter-mode", "unsigned", "0x02"},
+        {"0x0D103000", "supported-adapter-modes", "unsigned", "0x0B"},
+        {"0x0D11B000", "polling-interval", "unsigned", "100"},
+    };
+    for (const std::vector<std::string>& row : rows) {
+        EXPECT_TRUE(HasRow(result.out, row[0], row[1], row[2], row[3])) << row[1];
+    }
+
+    const RunResult adapter = RunKestcfg({"get", "ETH0"});
+    EXPECT_EQ(0, adapter.exitCode) << adapter.err;
+    EXPECT_EQ(0u, adapter.out.find("TAG "));
+    EXPECT_TRUE(HasRow(adapter.out, "0x0D10A000", "gateway", "text", "192\\.168\\.10\\.1"));
+    EXPECT_EQ(std::string::npos, adapter.out.find("host-name  text  kest-demo"));
+}
+
+TEST_F(KestcfgControllerTest, GetAsJsonHasOneObjectPerItemWithTypedValues) {
+    const RunResult result = RunKestcfg({"--json", "get"});
+    ASSERT_EQ(0, result.exitCode) << result.err;
+    const std::string flat = FlattenJsonLines(result.out);
+    for (const char* expected : {
+             "0/item=\"VQ KEST Chassis\"\n",
+             "0/properties/host-name/tag=\"0x0101F000\"\n",
+             "0/properties/host-name/type=\"text\"\n",
+             "0/properties/host-name/value=\"kest-demo\"\n",
+             "0/properties/web-service/value=false\n",
+             "0/properties/time-zone-offset/value=60\n",
+             "1/item=\"eth0\"\n",
+             "1/properties/polling-interval/value=100\n",
+             "1/properties/supported-adapter-modes/value=11\n",
+             "1/properties/primary-adapter/value=true\n",
+         }) {
+        EXPECT_NE(std::string::npos, flat.find(expected)) << expected;
+    }
+    EXPECT_EQ(std::string::npos, flat.find("\n2/"));
+}
+
+TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
+    const RunResult unknownItem = RunKestcfg({"get", "eth7"});
+    EXPECT_EQ(3, unknownItem.exitCode);
+    EXPECT_EQ("", unknownItem.out);
+    EXPECT_NE(std::string::npos, unknownItem.err.find("UX_E_ITEM_NOT_FOUND (0x80040375)"))
+        << unknownItem.err;
+
+    // A current language the chassis does not know makes its properties unreadable.
+    sysroot_.WriteFile(kState, std::regex_replace(State(), std::regex("LanguageName = English"),
+                                                  "LanguageName = Klingon"));
+    const RunResult unreadable = RunKestcfg({"--json", "get"});
+    EXPECT_EQ(3, unreadable.exitCode);
+    const std::string flat = FlattenJsonLines(unreadable.out);
+    EXPECT_NE(std::string::npos,
+              flat.find("0/error/status=\"E_FAIL\"\n0/error/code=\"0x80004005\""))
+        << flat;
+    EXPECT_NE(std::string::npos, flat.find("1/item=\"eth0\"")) << "the adapter is still shown";
+
+    // The chassis judges only the changed properties, so a change can still repair it.
+    const RunResult repaired = RunKestcfg({"set", kChassis, "locale=de"});
+    EXPECT_EQ(0, repaired.exitCode) << repaired.err;
+    EXPECT_NE(std::string::npos, repaired.err.find("warning: cannot read the current properties"));
+    EXPECT_NE(std::string::npos, State().find("LanguageName=German"));
+    EXPECT_EQ(0, RunKestcfg({"get", kChassis}).exitCode);
+}
+
+TEST_F(KestcfgControllerTest, RefreshReadsTheRequestedPropertiesByNameOrNumber) {
+    const RunResult result = RunKestcfg({"refresh", kChassis, "current-time", "0x0D114000"});
+    ASSERT_EQ(0, result.exitCode) << result.err;
+    EXPECT_TRUE(HasRow(result.out, "0x0D11F000", "current-time", "timestamp",
+                       "[0-9]{4}-[0-9]{2}-[0-9]{2}T[0-9]{2}:[0-9]{2}:[0-9]{2}(\\.[0-9]{3})?Z"))
+        << result.out;
+    EXPECT_TRUE(HasRow(result.out, "0x0D114000", "dns-name", "text", "kest-demo\\.local"));
+    EXPECT_EQ(3u, std::count(result.out.begin(), result.out.end(), '\n')) << "only those two";
+
+    const RunResult partly = RunKestcfg({"--json", "refresh", "eth0", "gateway", "0x0ABCD000"});
+    EXPECT_EQ(0, partly.exitCode) << partly.err;
+    EXPECT_EQ(
+        "0/item=\"eth0\"\n0/properties/gateway/tag=\"0x0D10A000\"\n"
+        "0/properties/gateway/type=\"text\"\n0/properties/gateway/value=\"192.168.10.1\"\n"
+        "0/missing/0=\"0x0ABCD000\"\n",
+        FlattenJsonLines(partly.out));
+    EXPECT_NE(std::string::npos, partly.err.find("eth0 did not provide 0x0ABCD000"));
+
+    EXPECT_EQ(3, RunKestcfg({"refresh", "eth0", "0x0ABCD000"}).exitCode);
+    EXPECT_EQ(2, RunKestcfg({"refresh", "eth0", "no-such-property"}).exitCode);
+}
+
+TEST_F(KestcfgControllerTest, SetPersistsAValidatedChangeThatTheNextReadShows) {
+    const RunResult result = RunKestcfg({"set", "eth0", "polling-interval=250"});
+    EXPECT_EQ(0, result.exitCode) << result.err;
+    EXPECT_EQ("eth0: polling-interval set to 250\n", result.out);
+    EXPECT_NE(std::string::npos, State().find("PollingInterval=250"));
+    EXPECT_TRUE(HasRow(RunKestcfg({"get", "eth0"}).out, "0x0D11B000", "polling-interval",
+                       "unsigned", "250"));
+
+    const RunResult renamed =
+        RunKestcfg({"--json", "set", kChassis, "host-name=line-4", "0x0103D000=Bay 4, Line 4"});
+    EXPECT_EQ(0, renamed.exitCode) << renamed.err;
+    EXPECT_EQ(
+        "0/item=\"VQ KEST Chassis\"\n0/accepted=true\n0/changed/host-name=\"line-4\"\n"
+        "0/changed/comment=\"Bay 4, Line 4\"\n0/restartRequired=true\n",
+        FlattenJsonLines(renamed.out));
+    EXPECT_NE(std::string::npos, State().find("HostName=line-4"));
+    EXPECT_NE(std::string::npos, State().find("UserComment=Bay 4, Line 4"));
+
+    const RunResult people = RunKestcfg({"set", kChassis, "web-service=on"});
+    EXPECT_EQ(0, people.exitCode) << people.err;
+    EXPECT_EQ(
+        "VQ KEST Chassis: web-service set to true\n"
+        "The change takes full effect after the controller restarts.\n",
+        people.out);
+}
+
+TEST_F(KestcfgControllerTest, SetOfTheClockWritesTheTimeAndRunsTheHardwareClockStandIn) {
+    const RunResult result = RunKestcfg({"set", kChassis, "current-time=2030-01-02T03:04:05Z"});
+    EXPECT_EQ(0, result.exitCode) << result.err;
+    EXPECT_EQ("1893553445 0\n", sysroot_.ReadFile("/run/kest/system-clock"));
+    EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot_.ReadFile("/var/log/hwclock.log"));
+}
+
+TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndChangeNothing) {
+    struct Case {
+        std::vector<std::string> arguments;
+        std::string message;
+    };
+    const std::vector<Case> cases = {
+        {{"set", "eth0", "polling-interval=20000"},
+         "eth0 rejected the change with UX_E_VALUE_INVALID (0x8004037F): Polling interval must "
+         "be between 1 and 10000 ms."},
+        {{"set", kChassis, "host-name=-bad"},
+         "VQ KEST Chassis rejected the change with UX_E_HOSTNAME_INVALID (0x8004037A): The first "
+         "and last characters of the hostname must be alphanumeric."},
+        {{"set", "eth0", "gateway=10.0.0.1"},
+         "eth0 rejected the change with UX_E_ADDRESS_COMBINATION_INVALID (0x80040380): The IP "
+         "address and gateway must be on the same subnet."},
+        {{"set", "eth0", "subnet-mask=255.0.255.0"},
+         "eth0 rejected the change with UX_E_SUBNET_MASK_INVALID (0x80040473)\n"},
+        {{"set", kChassis, "serial-number=00000001", "comment=ok"},
+         "VQ KEST Chassis does not accept changes to serial-number; nothing was changed"},
+    };
+    const std::string before = State();
+    for (const Case& c : cases) {
+        SCOPED_TRACE(testing::PrintToString(c.arguments));
+        const RunResult result = RunKestcfg(c.arguments);
+        EXPECT_EQ(1, result.exitCode);
+        EXPECT_EQ("", result.out);
+        EXPECT_NE(std::string::npos, result.err.find("kestcfg: " + c.message)) << result.err;
+    }
+    EXPECT_EQ(before, State());
+
+    const RunResult json = RunKestcfg({"--json", "set", "eth0", "polling-interval=0"});
+    EXPECT_EQ(1, json.exitCode);
+    EXPECT_EQ(
+        "0/item=\"eth0\"\n0/accepted=false\n0/status=\"UX_E_VALUE_INVALID\"\n"
+        "0/code=\"0x8004037F\"\n0/message=\"Polling interval must be between 1 and 10000 ms.\"\n",
+        FlattenJsonLines(json.out));
+}
+
+TEST_F(KestcfgControllerTest, SetCommandLineMistakesAreUsageErrorsThatChangeNothing) {
+    const std::vector<std::vector<std::string>> mistakes = {
+        {"set", "eth0", "polling-interval"},
+        {"set", "eth0", "=5"},
+        {"set", "eth0", "no-such-property=5"},
+        {"set", "eth0", "polling-interval=abc"},
+        {"set", "eth0", "polling-interval=-1"},
+        {"set", "eth0", "polling-interval=4294967296"},
+        {"set", kChassis, "web-service=maybe"},
+        {"set", kChassis, "current-time=2030-02-30T00:00:00Z"},
+        {"set", "eth0", "0x0ABCD000=1"},
+        {"set", "eth0", "polling-interval=5", "0x0D11B000=6"},
+    };
+    const std::string before = State();
+    for (const std::vector<std::string>& arguments : mistakes) {
+        SCOPED_TRACE(testing::PrintToString(arguments));
+        const RunResult result = RunKestcfg(arguments);
+        EXPECT_EQ(2, result.exitCode) << result.err;
+        EXPECT_EQ("", result.out);
+    }
+    EXPECT_EQ(before, State());
+}
+
+}  // namespace

@@ -1,0 +1,74 @@
+// kestcfg sim init: the demo controller's files, and its firmware-tool stand-in.
+#include <sys/stat.h>
+
+#include <gtest/gtest.h>
+
+#include "common/TempSysroot.h"
+#include "kestcfg/KestcfgRunner.h"
+
+namespace {
+
+using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::ReadWhole;
+using kestcfg_test::RunKestcfg;
+using kestcfg_test::RunProgram;
+using kestcfg_test::RunResult;
+
+mode_t PermissionsOf(const std::string& path) {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0 ? (status.st_mode & 07777) : 0;
+}
+
+TEST(KestcfgSimTest, InitCreatesTheControllerFilesWithTheShippedTimeZoneTable) {
+    kest::test::TempSysroot sysroot;
+    const std::string root = sysroot.Root() + "/controller";
+    const RunResult result = RunKestcfg({"--json", "sim", "init", root});
+    ASSERT_EQ(0, result.exitCode) << result.err;
+    EXPECT_EQ("0/sysroot=\"" + root +
+                  "\"\n0/files/0=\"/etc/korvane/version\"\n"
+                  "0/files/1=\"/etc/korvane/share/vqsysdiag.ini\"\n"
+                  "0/files/2=\"/usr/share/vqsysapi/timezone.ini\"\n0/files/3=\"/sbin/hwclock\"\n"
+                  "0/files/4=\"/usr/local/korvane/bin/fwupdate\"\n0/files/5=\"/dev/rtc0\"\n"
+                  "0/files/6=\"/var/lib/vqtargetcfg/state.ini\"\n",
+              FlattenJsonLines(result.out));
+    EXPECT_EQ("22.5.0\n", ReadWhole(root + "/etc/korvane/version"));
+    EXPECT_EQ(ReadWhole(KESTCFG_SOURCE_DATA_DIR "/timezone.ini"),
+              ReadWhole(root + "/usr/share/vqsysapi/timezone.ini"));
+    EXPECT_EQ(0755u, PermissionsOf(root + "/sbin/hwclock"));
+    EXPECT_EQ(0755u, PermissionsOf(root + "/usr/local/korvane/bin/fwupdate"));
+    const std::string state = ReadWhole(root + "/var/lib/vqtargetcfg/state.ini");
+    for (const char* line : {"InterfaceName = eth0\n", "Mode = 2\n", "RequestMode = 1\n",
+                             "IPAddress = 192.168.10.20\n"}) {
+        EXPECT_NE(std::string::npos, state.find(line)) << line;
+    }
+}
+
+TEST(KestcfgSimTest, InitNeedsANewOrEmptyDirectory) {
+    kest::test::TempSysroot sysroot;
+    sysroot.WriteFile("/existing", "keep me\n");
+    for (const std::string& directory :
+         {sysroot.Root(), sysroot.PathOf("/existing"), std::string("/")}) {
+        SCOPED_TRACE(directory);
+        const RunResult result = RunKestcfg({"sim", "init", directory});
+        EXPECT_EQ(3, result.exitCode);
+        EXPECT_EQ(0u, result.err.find("kestcfg: ")) << result.err;
+    }
+    EXPECT_EQ("keep me\n", sysroot.ReadFile("/existing"));
+    EXPECT_FALSE(sysroot.Exists("/sbin"));
+}
+
+TEST(KestcfgSimTest, FirmwareToolStandInLogsItsArgumentsAndEndsAtTheLastStage) {
+    kest::test::TempSysroot sysroot;
+    ASSERT_EQ(0, RunKestcfg({"sim", "init", sysroot.Root()}).exitCode);
+    // The plug-in starts the tool with an empty environment.
+    char* const emptyEnvironment[] = {nullptr};
+    const RunResult tool =
+        RunProgram(sysroot.PathOf("/usr/local/korvane/bin/fwupdate"),
+                   {"/var/volatile/tmp/kestsysxp.fwupdate.cfg", "3"}, emptyEnvironment);
+    EXPECT_EQ(0, tool.exitCode) << tool.err;
+    EXPECT_EQ("/var/volatile/tmp/kestsysxp.fwupdate.cfg 3\n",
+              sysroot.ReadFile("/var/log/fwupdate.log"));
+    EXPECT_EQ("5\n", sysroot.ReadFile("/var/run/firmware_update/status"));
+}
+
+}  // namespace
