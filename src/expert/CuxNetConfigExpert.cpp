@@ -1,22 +1,55 @@
 #include "expert/CuxNetConfigExpert.h"
 
+#include <new>
 #include <utility>
 
+#include "expert/DiagnosticsSettings.h"
 #include "expert/HostStringResult.h"
+#include "network/NetworkItemHandler.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "property/ItemNameEnumerator.h"
 #include "property/PropertyTagEnumerator.h"
 #include "support/EntryGuard.h"
+#include "support/Exceptions.h"
+#include "support/Mutex.h"
+#include "support/PathHelpers.h"
 #include "support/StatusHolder.h"
+#include "support/Sysroot.h"
+#include "support/TextConversion.h"
 #include "support/TraceGate.h"
+#include "trace/Tracer.h"
 
 namespace {
 // 722d1d51-1c1d-42fe-aeef-5cf6c711ffa7
 constexpr CLSID kFrameworkExpertClassId = {
     0x722d1d51, 0x1c1d, 0x42fe, {0xae, 0xef, 0x5c, 0xf6, 0xc7, 0x11, 0xff, 0xa7}};
+
+constexpr mode_t kLogDirectoryMode = 0777;
+
+// The expert lock: held by Initialize, Uninitialize and PersistPropertyChanges of every expert of
+// the process. Recursive, because a failing Initialize calls Uninitialize while holding it.
+vq::dsc::Mutex& ExpertLock() {
+    static vq::dsc::Mutex expertLock;
+    return expertLock;
+}
+
+// Creates the log directory if needed, reads the diagnostics settings and starts the tracer.
+void StartDiagnostics(IniFileManager& iniCache) {
+    const std::string logDirectory = ChooseLogDirectory();
+    if (!vq::dsc::osdep::IsDirectory(logDirectory)) {
+        vq::dsc::osdep::CreateDirectories(logDirectory, kLogDirectoryMode);
+    }
+    const DiagnosticsSettings settings =
+        ReadDiagnosticsSettings(iniCache, kest::paths::DiagnosticsSettingsFile());
+    InitializeTracing(settings.severity, settings.target, vq::dsc::WideFromNarrow(logDirectory),
+                      settings.lowDiskThreshold);
+}
+
 }  // namespace
 
-// Members go in reverse order of declaration: pending tasks, then the item manager.
+CuxNetConfigExpert::CuxNetConfigExpert() : iniCache_(IniFileManager::GetInstance()) {}
+
+// Members go in reverse order of declaration: the pending tasks, the item manager, the INI cache.
 CuxNetConfigExpert::~CuxNetConfigExpert() = default;
 
 HRESULT CuxNetConfigExpert::SetItemManager(const CountedPtr<ItemManagerBase>& manager) {
@@ -79,11 +112,49 @@ HRESULT CuxNetConfigExpert::GetExpertProgrammaticName(CvqBStr* name) {
 }
 
 HRESULT CuxNetConfigExpert::Initialize() {
-    return E_NOTIMPL;
+    try {
+        vq::dsc::ScopedLock lock(ExpertLock());
+        return InitializeUnderLock();
+    } catch (...) {
+        // Only taking the expert lock can fail here.
+        return E_FAIL;
+    }
+}
+
+HRESULT CuxNetConfigExpert::InitializeUnderLock() noexcept {
+    if (!itemManager_) {
+        return E_FAIL;
+    }
+    try {
+        StartDiagnostics(*iniCache_);
+    } catch (const std::bad_alloc&) {
+        TraceIfEnabled("Not enough memory!", kTraceErrors);
+        Uninitialize();
+        return E_OUTOFMEMORY;
+    } catch (const vq::dsc::exception::Exception& failure) {
+        TraceIfEnabled(failure.what(), kTraceErrors);
+        Uninitialize();
+        return E_FAIL;
+    } catch (...) {
+        TraceIfEnabled("Uncaught exception", kTraceErrors);
+        Uninitialize();
+        return E_FAIL;
+    }
+    TraceIfEnabled("CuxNetConfigExpert::Initialize()", kTraceEntry);
+    return S_OK;
 }
 
 HRESULT CuxNetConfigExpert::Uninitialize() {
-    return E_NOTIMPL;
+    TraceIfEnabled("CuxNetConfigExpert::Uninitialize()", kTraceEntry);
+    return GuardEntryPoint("Failure to uninitialize", [&]() -> HRESULT {
+        vq::dsc::ScopedLock lock(ExpertLock());
+        if (itemManager_) {
+            itemManager_->ClearItems();
+        }
+        pendingTasks_.clear();
+        ShutdownTracing();
+        return S_OK;
+    });
 }
 
 HRESULT CuxNetConfigExpert::SearchForItemsAndProperties(IuxSysSearchSink* sink) {
@@ -200,10 +271,34 @@ HRESULT CuxNetConfigExpert::ValidatePropertyChanges(const wchar_t* item, IuxSysP
     });
 }
 
-HRESULT CuxNetConfigExpert::PersistPropertyChanges(const wchar_t* /*item*/,
-                                                   IuxSysPropertyBag* /*changes*/,
-                                                   int32_t* /*restartRequired*/) {
-    return E_NOTIMPL;
+HRESULT CuxNetConfigExpert::PersistPropertyChanges(const wchar_t* item, IuxSysPropertyBag* changes,
+                                                   int32_t* restartRequired) {
+    TraceIfEnabled("CuxNetConfigExpert::PersistPropertyChanges()", kTraceEntry);
+    if (item == nullptr || changes == nullptr || restartRequired == nullptr) {
+        return E_POINTER;
+    }
+    *restartRequired = 0;
+    return GuardEntryPoint("Failure to persist property changes", [&]() -> HRESULT {
+        vq::dsc::ScopedLock lock(ExpertLock());
+        pendingTasks_.clear();
+        CountedPtr<ItemHandler> handler = ItemManager().GetItemHandler(item);
+        CountedPtr<vq::targetcfg::IDeviceHandler> deviceHandler;
+        bool adapterDisabled = false;
+        StatusHolder status;
+        status = handler->PersistPropertyChanges(changes, *restartRequired, deviceHandler,
+                                                 adapterDisabled);
+        status = iniCache_->FlushIniCache();
+        if (dynamic_cast<NetworkItemHandler*>(handler.Get()) != nullptr) {
+            // The interface restarts on the task's thread, after this answer reached the host.
+            CountedPtr<IuxSysPropertyBag> clone;
+            status = changes->Clone(clone.Receive());
+            pendingTasks_.reserve(1);
+            pendingTasks_.push_back(MakeCounted<DeferredPersistTask>(
+                std::move(deviceHandler), adapterDisabled, handler,
+                QueryCounted<IuxSysPropertyBag2>(clone, IID_IuxSysPropertyBag2)));
+        }
+        return S_OK;
+    });
 }
 
 HRESULT CuxNetConfigExpert::ReservedExpert13() {

@@ -2,14 +2,16 @@
 // operations, over the reference count shared by all of the object's interfaces.
 #pragma once
 
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "com/CVQComMultiThreadModelNoCS.h"
 #include "com/CVQComObjectRootEx.h"
 #include "com/CountedPtr.h"
+#include "config/IniFileManager.h"
 #include "items/ItemManagerBase.h"
-#include "items/RefCountedThreadSafePolicy.h"
+#include "network/DeferredPersistTask.h"
 #include "uxsys/Expert.h"
 
 class CuxNetConfigExpert : public IuxSysExpert3,
@@ -56,16 +58,21 @@ class CuxNetConfigExpert : public IuxSysExpert3,
     HRESULT SetItemManager(const CountedPtr<ItemManagerBase>& manager);
 
   protected:
-    CuxNetConfigExpert() = default;
+    // Takes a reference to the process-wide INI cache.
+    CuxNetConfigExpert();
 
   private:
-    // Deferred work started by the last persist, kept alive until the next persist,
+    // Interface restarts started by the last persist, kept until the next persist,
     // Uninitialize or destruction (whichever comes first).
-    using PendingTaskList = std::vector<CountedPtr<vq::dsc::RefCountedThreadSafePolicy>>;
+    using PendingTaskList = std::vector<CountedPtr<DeferredPersistTask>>;
 
+    // Initialize's work once the expert lock is held: the log directory, the diagnostics
+    // settings and the tracer. Failures end in Uninitialize.
+    HRESULT InitializeUnderLock() noexcept;
     // The installed item manager; throws E_FAIL (a long) when none is installed.
     ItemManagerBase& ItemManager() const;
 
+    std::shared_ptr<IniFileManager> iniCache_;
     CountedPtr<ItemManagerBase> itemManager_;
     PendingTaskList pendingTasks_;
 };

@@ -75,6 +75,28 @@ TEST_F(ExpertItemsTest, RefreshWithoutTagsFindsNothing) {
     EXPECT_EQ(E_POINTER, expert->PopulateOrRefreshProperties(L"eth0", 1, nullptr, &bag));
 }
 
+TEST_F(ExpertItemsTest, RefreshFindingSomeTagsReturnsTheBagWithFalse) {
+    const uint32_t tags[] = {kItemNameTag, 0x7FFFF000};
+    IuxSysPropertyBag* bag = nullptr;
+    ASSERT_EQ(S_FALSE, expert->PopulateOrRefreshProperties(L"vq kest chassis", 2, tags, &bag));
+    ASSERT_NE(nullptr, bag);
+    EXPECT_EQ(kSystemItemName, ItemNameIn(bag));
+    bag->Release();
+}
+
+TEST_F(ExpertItemsTest, ValidatingNoChangeReturnsFalseAndNoEnumerator) {
+    IuxSysPropertyBag* current = nullptr;
+    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, &current));
+    IuxSysPropertyBag* unchanged = nullptr;
+    ASSERT_EQ(S_OK, current->Clone(&unchanged));
+    current->Release();
+    IuxSysEnumPropertyTag* validated = reinterpret_cast<IuxSysEnumPropertyTag*>(this);
+    EXPECT_EQ(S_FALSE,
+              expert->ValidatePropertyChanges(kSystemItemName, unchanged, &validated, nullptr));
+    EXPECT_EQ(nullptr, validated);
+    unchanged->Release();
+}
+
 TEST_F(ExpertItemsTest, SearchDeliversEveryItemToTheSink) {
     RecordingSink sink(S_OK);
     EXPECT_EQ(S_OK, expert->SearchForItemsAndProperties(&sink));
@@ -87,6 +109,28 @@ TEST_F(ExpertItemsTest, SearchEndsWithTheStatusOfARefusingSink) {
     EXPECT_EQ(refusal, expert->SearchForItemsAndProperties(&sink));
     EXPECT_EQ((Names{kSystemItemName}), sink.names);
     EXPECT_EQ(E_POINTER, expert->SearchForItemsAndProperties(nullptr));
+}
+
+TEST_F(ExpertItemsTest, PersistingANetworkChangeRestartsTheInterfaceAfterwards) {
+    WriteControllerState(StateWithDevice(1, "eth0") +
+                         "Mode = 2\nRequestMode = 2\n[Network]\nPrimaryDeviceIndex = 9\n");
+    IuxSysPropertyBag* current = nullptr;
+    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(L"eth0", &current));
+    IuxSysPropertyBag* changes = nullptr;
+    ASSERT_EQ(S_OK, current->Clone(&changes));
+    current->Release();
+    ASSERT_EQ(S_OK, changes->SetBool(0x0D126000, 1));
+
+    int32_t restartRequired = -1;
+    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(L"eth0", changes, &restartRequired));
+    changes->Release();
+    EXPECT_EQ(0, restartRequired);
+    EXPECT_EQ(1, ControllerCalls("SetPrimaryDeviceByIndex"));
+
+    // The last reference waits for the pending restart: down, then up again.
+    EXPECT_EQ(0u, expert->Release());
+    expert = nullptr;
+    EXPECT_EQ(2, ControllerCalls("SetNetworkInterfaceState"));
 }
 
 TEST_F(ExpertItemsTest, ExpertsShareOneItemManagerUntilTheLastIsReleased) {

@@ -44,36 +44,6 @@ TEST(ItemHandlerTest, FirstFailingSetterIsThrownAndStopsTheRows) {
     EXPECT_EQ(S_FALSE, bag->HasTag(0x01037000));
 }
 
-TEST(ItemHandlerTest, BaseOperationsChangeNothing) {
-    CountedPtr<TestHandler> handler = MakeCounted<TestHandler>(L"eth0");
-    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-    const uint32_t tags[] = {0x0101D000};
-    EXPECT_EQ(S_OK, handler->RefreshProperties(1, tags, bag.Get()));
-    EXPECT_EQ(S_FALSE, bag->HasTag(0x0101D000));
-
-    PropertyTagSet validated;
-    CvqBStr message = nullptr;
-    EXPECT_EQ(S_OK, handler->ValidatePropertyChanges(bag.Get(), validated, &message));
-    EXPECT_TRUE(validated.empty());
-    EXPECT_EQ(nullptr, message);
-
-    int32_t persistFlag = 0;
-    CountedPtr<vq::targetcfg::IDeviceHandler> device;
-    bool adapterDisabled = false;
-    EXPECT_EQ(S_OK,
-              handler->PersistPropertyChanges(bag.Get(), persistFlag, device, adapterDisabled));
-    EXPECT_EQ(0, persistFlag);
-    EXPECT_FALSE(device);
-    EXPECT_FALSE(adapterDisabled);
-
-    PropertyTagSet importable;
-    EXPECT_EQ(S_OK, handler->GetImportableTags(importable));
-    EXPECT_TRUE(importable.empty());
-    bool exact = false;
-    EXPECT_FALSE(handler->IsMatchingItem(bag.Get(), exact));
-    EXPECT_FALSE(exact);
-}
-
 struct NameCase {
     const wchar_t* itemName;
     const wchar_t* asked;

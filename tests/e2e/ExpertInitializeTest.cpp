@@ -1,0 +1,149 @@
+// Initialize as a host sees it: the diagnostics settings file decides which failures reach the
+// trace log, and where the log goes. The tracer fixes its log path once per process, so each
+// host session runs in a child process of its own and the test reads the files it left.
+#include <dirent.h>
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <functional>
+#include <regex>
+#include <string>
+#include <vector>
+
+#include "ExpertHost.h"
+
+namespace e2e {
+namespace {
+
+constexpr char kSettingsPath[] = "/etc/korvane/share/vqsysdiag.ini";
+constexpr char kPrimaryLogDirectory[] = "/etc/korvane/share/vqsyslog";
+constexpr char kFallbackLogDirectory[] = "/var/local/korvane/vqsyslog";
+
+class ExpertInitializeTest : public ExpertHostTest {
+  protected:
+    void SetUp() override {
+        WriteControllerState(kSystemState);
+        ExpertHostTest::SetUp();
+    }
+
+    // Runs `session` in a child process and returns its exit code (-1 when it did not exit).
+    static int RunInChild(const std::function<int()>& session) {
+        const pid_t child = fork();
+        if (child == 0) {
+            _exit(session());
+        }
+        int status = 0;
+        if (child < 0 || waitpid(child, &status, 0) != child || !WIFEXITED(status)) {
+            return -1;
+        }
+        return WEXITSTATUS(status);
+    }
+
+    // In a child: Initialize, ask for an item that does not exist (a failure traced under the
+    // error bit), Uninitialize. 0 when every status was the expected one.
+    int SessionWithFailedLookup() {
+        return RunInChild([this] {
+            if (expert->Initialize() != S_OK) {
+                return 1;
+            }
+            IuxSysPropertyBag* bag = nullptr;
+            if (expert->GetPropertiesOfItem(L"eth7", &bag) != UX_E_ITEM_NOT_FOUND) {
+                return 2;
+            }
+            return expert->Uninitialize() == S_OK ? 0 : 3;
+        });
+    }
+
+    // The names of the trace logs in the log directory `systemPath`.
+    std::vector<std::string> TraceLogs(const std::string& systemPath) const {
+        static const std::regex logName("[0-9]{8}_[0-9]{6}-uxTracer-[0-9A-F]{8}\\.log");
+        std::vector<std::string> logs;
+        DIR* directory = opendir(sysroot.PathOf(systemPath).c_str());
+        if (directory == nullptr) {
+            return logs;
+        }
+        while (const dirent* entry = readdir(directory)) {
+            if (std::regex_match(entry->d_name, logName)) {
+                logs.push_back(entry->d_name);
+            }
+        }
+        closedir(directory);
+        return logs;
+    }
+
+    // The content of the one trace log in `systemPath` (empty when there is none).
+    std::string TraceLogText(const std::string& systemPath) const {
+        const std::vector<std::string> logs = TraceLogs(systemPath);
+        EXPECT_LE(logs.size(), 1u);
+        return logs.empty() ? std::string() : sysroot.ReadFile(systemPath + "/" + logs[0]);
+    }
+};
+
+const std::regex kNotFoundRecord(
+    "  Failure to get properties of item\\(-2147220619\\)\n"
+    "  Thread = 0x[0-9A-F]+, Time = [0-9]{8} [0-9]{6}\\.[0-9]{3}\n");
+
+TEST_F(ExpertInitializeTest, ErrorBitTracesTheFailureWithItsStatusAndStamp) {
+    sysroot.WriteFile(kSettingsPath, "[vqsyscfg]\nSeverity = 2\n");
+    ASSERT_EQ(0, SessionWithFailedLookup());
+    const std::string log = TraceLogText(kFallbackLogDirectory);
+    EXPECT_TRUE(std::regex_search(log, kNotFoundRecord)) << log;
+}
+
+TEST_F(ExpertInitializeTest, WithoutSettingsOnlyIniCacheFailuresWouldBeTraced) {
+    ASSERT_EQ(0, SessionWithFailedLookup());
+    EXPECT_TRUE(sysroot.Exists(kFallbackLogDirectory));
+    EXPECT_EQ("", TraceLogText(kFallbackLogDirectory));
+}
+
+TEST_F(ExpertInitializeTest, ExistingSharedLogDirectoryIsPreferred) {
+    sysroot.MakeDirectory(kPrimaryLogDirectory);
+    sysroot.WriteFile(kSettingsPath, "[AllComponents]\nSeverity = 0x12\n[vqsyscfg]\nSeverity=18\n");
+    ASSERT_EQ(0, SessionWithFailedLookup());
+    const std::string log = TraceLogText(kPrimaryLogDirectory);
+    EXPECT_NE(std::string::npos, log.find("  CuxNetConfigExpert::Initialize()\n")) << log;
+    EXPECT_NE(std::string::npos, log.find("  CuxNetConfigExpert::GetPropertiesOfItem()\n"));
+    EXPECT_TRUE(std::regex_search(log, kNotFoundRecord)) << log;
+    EXPECT_FALSE(sysroot.Exists(kFallbackLogDirectory));
+}
+
+struct SettingsCase {
+    const char* name;
+    const char* settings;
+    bool traced;
+};
+
+class DiagnosticsSettingsTest : public ExpertInitializeTest,
+                                public ::testing::WithParamInterface<SettingsCase> {};
+
+TEST_P(DiagnosticsSettingsTest, DecideWhetherTheErrorReachesTheLog) {
+    sysroot.WriteFile(kSettingsPath, GetParam().settings);
+    ASSERT_EQ(0, SessionWithFailedLookup());
+    EXPECT_EQ(GetParam().traced,
+              std::regex_search(TraceLogText(kFallbackLogDirectory), kNotFoundRecord));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Settings, DiagnosticsSettingsTest,
+    ::testing::Values(
+        SettingsCase{"OwnSection", "[vqsyscfg]\nSeverity = 2\n", true},
+        SettingsCase{"SharedSection", "[AllComponents]\nSeverity = 2\n", true},
+        SettingsCase{"OwnSectionWins", "[AllComponents]\nSeverity = 2\n[vqsyscfg]\nSeverity = 1\n",
+                     false},
+        SettingsCase{"NegativeFallsBack",
+                     "[vqsyscfg]\nSeverity = -2\n[AllComponents]\nSeverity = 2\n", true},
+        SettingsCase{"MalformedFallsBack",
+                     "[vqsyscfg]\nSeverity = 2x\n[AllComponents]\nSeverity = 2\n", true},
+        SettingsCase{"PlusSignAndBlanks", "[vqsyscfg]\nSeverity = \" +2 \"\n", true},
+        SettingsCase{"TooLargeIsAbsent", "[vqsyscfg]\nSeverity = 4294967298\n", false},
+        SettingsCase{"NoOutputs", "[vqsyscfg]\nSeverity = 2\nTarget = 0\n", false}),
+    [](const ::testing::TestParamInfo<SettingsCase>& param) { return param.param.name; });
+
+TEST_F(ExpertInitializeTest, LogDirectoryThatCannotBeCreatedFailsInitialize) {
+    sysroot.WriteFile("/var/local/korvane", "a file where a directory belongs\n");
+    EXPECT_EQ(0, RunInChild([this] { return expert->Initialize() == E_FAIL ? 0 : 1; }));
+}
+
+}  // namespace
+}  // namespace e2e
