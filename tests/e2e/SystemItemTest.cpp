@@ -1,0 +1,272 @@
+// The system item as a host sees it: its full catalogue, and a get and a set of each setting it
+// accepts (host name, comment, locale, time zone in both notations, clock, web service),
+// including the rejections a host shows for bad values.
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <map>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "ExpertHost.h"
+
+namespace e2e {
+namespace {
+
+constexpr uint32_t kHostNameTag = 0x0101F000;
+constexpr uint32_t kCommentTag = 0x0103D000;
+constexpr uint32_t kLocaleTag = 0x0D11D000;
+constexpr uint32_t kLocaleCodesTag = 0x0D11E000;
+constexpr uint32_t kCurrentTimeTag = 0x0D11F000;
+constexpr uint32_t kLegacyTimeZoneTag = 0x0D120000;
+constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
+constexpr uint32_t kWebServiceTag = 0x21004000;
+constexpr uint32_t kDnsNameTag = 0x0D114000;
+constexpr int64_t kUnixEpochIn1904Seconds = 2082844800;
+
+// The time-zone table the plug-in ships, from the source tree.
+std::string ShippedTimeZoneTable() {
+    std::string source = __FILE__;
+    for (int level = 0; level < 3; ++level) {
+        source.erase(source.rfind('/'));
+    }
+    std::ifstream table(source + "/data/timezone.ini", std::ios::binary);
+    std::ostringstream content;
+    content << table.rdbuf();
+    return content.str();
+}
+
+class SystemItemTest : public ExpertHostTest {
+  protected:
+    void SetUp() override {
+        WriteControllerState(std::string(kSystemState) +
+                             "DeviceDescription = KEST 9100\nSerialNumber = 0x1A2B\n"
+                             "FullyQualifiedDNSName = kest-1.example.net\n");
+        sysroot.WriteFile("/usr/share/vqsysapi/timezone.ini", ShippedTimeZoneTable());
+        for (const char* zone : {"Europe/Berlin", "America/Chicago", "America/Los_Angeles"}) {
+            sysroot.WriteFile(std::string("/usr/share/zoneinfo/") + zone, "TZif");
+        }
+        sysroot.MakeDirectory("/etc/korvane/share");
+        ExpertHostTest::SetUp();
+    }
+
+    // The system item's current properties.
+    IuxSysPropertyBag* Properties() {
+        IuxSysPropertyBag* bag = nullptr;
+        EXPECT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, &bag));
+        return bag;
+    }
+
+    std::wstring Text(uint32_t tag) {
+        IuxSysPropertyBag* bag = Properties();
+        CvqBStr text = nullptr;
+        EXPECT_EQ(S_OK, bag->GetString(tag, &text)) << std::hex << tag;
+        bag->Release();
+        return TakeHostString(text);
+    }
+
+    bool Bool(uint32_t tag) {
+        IuxSysPropertyBag* bag = Properties();
+        int32_t value = -1;
+        EXPECT_EQ(S_OK, bag->GetBool(tag, &value)) << std::hex << tag;
+        bag->Release();
+        return value != 0;
+    }
+
+    // A bag of changes: a copy of the current properties (nothing modified) with `write` applied.
+    template <class Write>
+    IuxSysPropertyBag2* Changes(Write&& write) {
+        IuxSysPropertyBag* current = Properties();
+        IuxSysPropertyBag* copy = nullptr;
+        EXPECT_EQ(S_OK, current->Clone(&copy));
+        current->Release();
+        IuxSysPropertyBag2* changes = nullptr;
+        EXPECT_EQ(S_OK,
+                  copy->QueryInterface(IID_IuxSysPropertyBag2, reinterpret_cast<void**>(&changes)));
+        copy->Release();
+        write(changes);
+        return changes;
+    }
+
+    struct Outcome {
+        HRESULT validation;
+        std::wstring message;
+        std::vector<uint32_t> validated;
+        HRESULT persistence = S_OK;
+        int32_t restartRequired = -1;
+    };
+
+    // Validates the changes and, when they pass, persists them, as a host does.
+    Outcome Apply(IuxSysPropertyBag2* changes) {
+        Outcome outcome;
+        IuxSysEnumPropertyTag* validated = nullptr;
+        CvqBStr message = nullptr;
+        outcome.validation =
+            expert->ValidatePropertyChanges(kSystemItemName, changes, &validated, &message);
+        outcome.message = TakeHostString(message);
+        uint32_t tag = 0;
+        while (validated != nullptr && validated->Next(1, &tag, nullptr) == S_OK) {
+            outcome.validated.push_back(tag);
+        }
+        if (validated != nullptr) {
+            validated->Release();
+        }
+        if (outcome.validation == S_OK) {
+            outcome.persistence =
+                expert->PersistPropertyChanges(kSystemItemName, changes, &outcome.restartRequired);
+        }
+        changes->Release();
+        return outcome;
+    }
+
+    std::string ControllerState() const { return sysroot.ReadFile(kControllerStatePath); }
+};
+
+TEST_F(SystemItemTest, GetShowsTheWholeCatalogue) {
+    const std::map<uint32_t, uint32_t> types = {
+        {0x0101C000, 2}, {0x0101D000, 6}, {0x0102A000, 2}, {0x0101F000, 6}, {0x01037000, 3},
+        {0x01001000, 1}, {0x01038000, 1}, {0x01039000, 2}, {0x0103A000, 3}, {0x01024000, 2},
+        {0x01002000, 3}, {0x01006000, 6}, {0x01005000, 3}, {0x0103C000, 6}, {0x01008000, 1},
+        {0x01004000, 6}, {0x01003000, 3}, {0x01007000, 6}, {0x0103D000, 6}, {0x0D11D000, 6},
+        {0x0D11E000, 6}, {0x0D12B000, 2}, {0x0D120000, 6}, {0x0D14E000, 6}, {0x0D129000, 1},
+        {0x0102F000, 6}, {0x0104C000, 2}, {0x0104A000, 1}, {0x0104B000, 6}, {0x01056000, 1},
+        {0x01055000, 1}, {0x21004000, 1},
+    };
+    IuxSysPropertyBag* bag = Properties();
+    ASSERT_NE(nullptr, bag);
+    IuxSysEnumPropertyTag* tags = nullptr;
+    ASSERT_EQ(S_OK, bag->GetTagEnumerator(&tags));
+    std::map<uint32_t, uint32_t> reported;
+    uint32_t tag = 0;
+    while (tags->Next(1, &tag, nullptr) == S_OK) {
+        uint32_t type = 0;
+        EXPECT_EQ(S_OK, bag->GetTagType(tag, &type));
+        reported[tag] = type;
+    }
+    tags->Release();
+    bag->Release();
+    EXPECT_EQ(types, reported);
+
+    EXPECT_EQ(L"kest-1", Text(kHostNameTag));
+    EXPECT_EQ(L"VQ KEST 9100", Text(0x01006000));
+    EXPECT_EQ(L"00001A2B", Text(0x01007000));
+    EXPECT_EQ(L"22.5.0", Text(0x0102F000));
+    EXPECT_EQ(L"en", Text(kLocaleTag));
+    EXPECT_EQ(L"en,de", Text(kLocaleCodesTag));
+    EXPECT_EQ(L"Europe/Berlin", Text(kOlsonTimeZoneTag));
+    EXPECT_EQ(L"NFT-1DFT", Text(kLegacyTimeZoneTag));
+    EXPECT_FALSE(Bool(kWebServiceTag));
+}
+
+TEST_F(SystemItemTest, RefreshAddsTheDnsNameAndTheCurrentTime) {
+    const uint32_t requested[] = {kDnsNameTag, kCurrentTimeTag};
+    IuxSysPropertyBag* bag = nullptr;
+    ASSERT_EQ(S_OK, expert->PopulateOrRefreshProperties(kSystemItemName, 2, requested, &bag));
+    ASSERT_NE(nullptr, bag);
+    CvqBStr name = nullptr;
+    EXPECT_EQ(S_OK, bag->GetString(kDnsNameTag, &name));
+    EXPECT_EQ(L"kest-1.example.net", TakeHostString(name));
+    int32_t fields[6] = {};
+    EXPECT_EQ(S_OK, bag->GetTimestampFields(kCurrentTimeTag, fields));
+    EXPECT_GE(fields[0], 2024);
+    bag->Release();
+}
+
+TEST_F(SystemItemTest, SetsHostNameCommentAndLocale) {
+    const Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
+        changes->SetString(kHostNameTag, L"kest-2");
+        changes->SetString(kCommentTag, L"spare chassis");
+        changes->SetString(kLocaleTag, L"de");
+    }));
+    EXPECT_EQ(S_OK, outcome.validation);
+    EXPECT_EQ((std::vector<uint32_t>{kHostNameTag, kCommentTag, kLocaleTag}), outcome.validated);
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ(1, outcome.restartRequired);
+    EXPECT_EQ(L"kest-2", Text(kHostNameTag));
+    EXPECT_EQ(L"spare chassis", Text(kCommentTag));
+    EXPECT_EQ(L"de", Text(kLocaleTag));
+    EXPECT_NE(std::string::npos, ControllerState().find("LanguageName=German"));
+}
+
+TEST_F(SystemItemTest, SetsTheTimeZoneInEitherNotation) {
+    Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
+        changes->SetString(kOlsonTimeZoneTag, L"America/Chicago");
+    }));
+    EXPECT_EQ(S_OK, outcome.validation);
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ(0, outcome.restartRequired);
+    EXPECT_EQ(L"America/Chicago", Text(kOlsonTimeZoneTag));
+    EXPECT_EQ(L"CST6CDT", Text(kLegacyTimeZoneTag));
+
+    outcome = Apply(Changes(
+        [](IuxSysPropertyBag2* changes) { changes->SetString(kLegacyTimeZoneTag, L"PST8PDT"); }));
+    EXPECT_EQ(S_OK, outcome.validation);
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ(L"America/Los_Angeles", Text(kOlsonTimeZoneTag));
+    EXPECT_EQ(L"PST8PDT", Text(kLegacyTimeZoneTag));
+}
+
+TEST_F(SystemItemTest, SetsTheClockAndTheHardwareClock) {
+    sysroot.WriteFile("/dev/rtc0", "");
+    sysroot.WriteScript("/sbin/hwclock", "echo \"$@\" >> \"$KEST_SYSROOT/hwclock.log\"\n");
+    const Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
+        changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds + 1700000000});
+    }));
+    EXPECT_EQ(S_OK, outcome.validation);
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ("1700000000 0\n", sysroot.ReadFile("/run/kest/system-clock"));
+    EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot.ReadFile("/hwclock.log"));
+}
+
+TEST_F(SystemItemTest, SwitchesTheWebService) {
+    Outcome outcome =
+        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 1); }));
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ(1, outcome.restartRequired);
+    EXPECT_TRUE(Bool(kWebServiceTag));
+    EXPECT_EQ("[WebService]\nEnable = 1\n\n", sysroot.ReadFile("/etc/korvane/share/vqkest.ini"));
+
+    outcome =
+        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 0); }));
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_FALSE(Bool(kWebServiceTag));
+}
+
+TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
+    struct Case {
+        uint32_t tag;
+        const wchar_t* value;
+        HRESULT status;
+        const wchar_t* message;
+    };
+    const Case cases[] = {
+        {kHostNameTag, L"", UX_E_VALUE_INVALID,
+         L"Hostname cannot be empty or length cannot exceed 63 characters."},
+        {kHostNameTag, L"kest_2", UX_E_HOSTNAME_INVALID,
+         L"Hostname must contain only alphanumeric characters and hyphens."},
+        {kHostNameTag, L"2024", UX_E_HOSTNAME_INVALID,
+         L"The hostname must include at least one non-numeric character."},
+        {kCommentTag, L"ccccccccccccccccccccccccccccccccccccccccccccccccccccccccccccccccc",
+         UX_E_VALUE_INVALID, L"Comment length cannot exceed 64 characters."},
+        {kLocaleTag, L"e", UX_E_VALUE_INVALID, L"Locale not supported."},
+        {kLocaleTag, L"fr", UX_E_VALUE_INVALID, L"Locale not supported."},
+        {kLegacyTimeZoneTag, L"NFT-11:30", UX_E_VALUE_INVALID, L"Timezone not supported."},
+    };
+    for (const Case& c : cases) {
+        const Outcome outcome = Apply(
+            Changes([&](IuxSysPropertyBag2* changes) { changes->SetString(c.tag, c.value); }));
+        EXPECT_EQ(c.status, outcome.validation) << std::hex << c.tag;
+        EXPECT_EQ(c.message, outcome.message) << std::hex << c.tag;
+        EXPECT_TRUE(outcome.validated.empty());
+    }
+    const Outcome old = Apply(Changes([](IuxSysPropertyBag2* changes) {
+        changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds - 1});
+    }));
+    EXPECT_EQ(UX_E_VALUE_INVALID, old.validation);
+    EXPECT_EQ(L"Timestamps older than 1970 are not supported.", old.message);
+    EXPECT_EQ(L"kest-1", Text(kHostNameTag)) << "nothing was persisted";
+}
+
+}  // namespace
+}  // namespace e2e
