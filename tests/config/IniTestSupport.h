@@ -1,11 +1,9 @@
-// Helpers shared by the INI engine tests: documents that destroy themselves, loading from text
-// through a file, and value lookups that say whether the key was there.
+// Helpers shared by the INI tests: loading a document from bytes and reading values back.
 #pragma once
 
 #include <gtest/gtest.h>
 
 #include <fstream>
-#include <memory>
 #include <optional>
 #include <sstream>
 #include <string>
@@ -13,10 +11,6 @@
 #include "common/TempSysroot.h"
 #include "config/IniText.h"
 #include "config/IniTextPtr.h"
-
-inline IniTextPtr NewIniText() {
-    return IniTextPtr(IniText_Create());
-}
 
 inline void WriteBytes(const std::string& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary | std::ios::trunc) << bytes;
@@ -29,12 +23,12 @@ inline std::string ReadBytes(const std::string& path) {
     return content.str();
 }
 
-// A document loaded from `bytes` with the given read flags; `result` receives the load result.
+// A document loaded from `bytes`; `result` receives the load result.
 inline IniTextPtr LoadFromBytes(const kest::test::TempSysroot& dir, const std::string& bytes,
                                 uint32_t readFlags = kIniDefaultReadFlags, int* result = nullptr) {
     std::string path = dir.PathOf("/loaded.ini");
     WriteBytes(path, bytes);
-    IniTextPtr ini = NewIniText();
+    IniTextPtr ini(IniText_Create());
     IniText_SetReadOptions(ini.get(), readFlags);
     int loaded = IniText_Load(ini.get(), path.c_str());
     if (result != nullptr) {
@@ -51,4 +45,13 @@ inline std::optional<std::string> ValueOf(const IniText* ini, const char* sectio
         return std::nullopt;
     }
     return std::string(value);
+}
+
+// What IniText_Save writes for `ini` under the given write options.
+inline std::string SavedText(const kest::test::TempSysroot& dir, IniText* ini, uint32_t flags = 0,
+                             int maxLineLength = kIniNoMaxLineLength, int split = 0) {
+    std::string path = dir.PathOf("/saved.ini");
+    IniText_SetWriteOptions(ini, maxLineLength, split, flags);
+    EXPECT_EQ(IniText_Save(ini, path.c_str()), 0);
+    return ReadBytes(path);
 }

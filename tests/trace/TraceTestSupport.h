@@ -49,6 +49,10 @@ class StreamCapture {
         Flush();
         dup2(saved_, descriptor_);
         close(saved_);
+        if (::testing::Test::HasFailure()) {  // failure reports may be among the captured text
+            std::string captured = Text();
+            (void)!write(descriptor_, captured.data(), captured.size());
+        }
     }
     StreamCapture(const StreamCapture&) = delete;
     StreamCapture& operator=(const StreamCapture&) = delete;
@@ -85,13 +89,6 @@ inline std::vector<std::string> EntriesOf(const std::string& directory) {
         closedir(listing);
     }
     return names;
-}
-
-inline std::string FileText(const std::string& path) {
-    std::ifstream in(path, std::ios::binary);
-    std::ostringstream content;
-    content << in.rdbuf();
-    return content.str();
 }
 
 // The lines of `text` without their line feeds.
