@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <optional>
+#include <ostream>
 #include <string>
 
 #include "PropertyCatalogue.h"
@@ -15,6 +16,10 @@ struct ParseCase {
     uint32_t type;
     std::optional<std::string> shown;  // ValueForPeople of the result; nothing: rejected
 };
+
+void PrintTo(const ParseCase& c, std::ostream* out) {
+    *out << TypeCodeName(c.type) << " from \"" << c.text << "\"";
+}
 
 class ParseValueTest : public testing::TestWithParam<ParseCase> {};
 
