@@ -2,7 +2,9 @@
 #pragma once
 
 #include <atomic>
+#include <chrono>
 #include <string>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -39,6 +41,9 @@ class TestManager : public ItemManagerBase {
     static inline std::atomic<int> constructedManagers{0};
 
     TestManager() { ++constructedManagers; }
+    // Lingers before the base destructor forgets the process-wide manager, so that a dying
+    // manager stays visible to other threads for a while.
+    ~TestManager() override { std::this_thread::sleep_for(std::chrono::microseconds(200)); }
 
     HRESULT ReservedManagerOperation() override { return E_NOTIMPL; }
     HRESULT RefreshItems() override { return EnumerateItems(); }
