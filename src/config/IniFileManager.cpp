@@ -1,7 +1,6 @@
 #include "config/IniFileManager.h"
 
 #include <sys/stat.h>
-#include <time.h>
 
 #include "support/Exceptions.h"
 #include "support/PathHelpers.h"
@@ -17,12 +16,6 @@ constexpr uint32_t kCacheReadFlags = kIniReadKeepEmptyValues | kIniReadStripDoub
 constexpr uint32_t kCacheWriteFlags =
     kIniWriteSafeReplacement | kIniWriteSpacedSeparator | kIniWriteSync;
 constexpr mode_t kNewFileMode = 0664;
-
-int64_t CoarseMonotonicMs() {
-    timespec now;
-    clock_gettime(CLOCK_MONOTONIC_COARSE, &now);
-    return static_cast<int64_t>(now.tv_sec) * 1000 + now.tv_nsec / 1000000;
-}
 
 std::weak_ptr<IniFileManager>& InstanceSlot() {
     static std::weak_ptr<IniFileManager> instance;
@@ -63,16 +56,12 @@ std::shared_ptr<IniFileManager> IniFileManager::GetInstance() {
 }
 
 IniFileManager::IniCacheEntry& IniFileManager::Entry(const std::string& path) {
-    int64_t now = CoarseMonotonicMs();
     auto found = entries_.find(path);
     if (found != entries_.end()) {
         IniCacheEntry& entry = found->second;
-        bool due = !entry.loaded || now - entry.checkedAtMs >= kChangeCheckIntervalMs;
-        if (!entry.modified && due) {
-            entry.checkedAtMs = now;
-            if (IniText_HasFileChanged(entry.text.get()) != 0) {
-                entry.loaded = IniText_Load(entry.text.get(), path.c_str()) == 0 || entry.loaded;
-            }
+        // A failed re-load keeps the old content.
+        if (!entry.modified && IniText_HasFileChanged(entry.text.get()) != 0) {
+            IniText_Load(entry.text.get(), path.c_str());
         }
         return entry;
     }
@@ -85,8 +74,9 @@ IniFileManager::IniCacheEntry& IniFileManager::Entry(const std::string& path) {
         throw static_cast<long>(E_OUTOFMEMORY);
     }
     IniText_SetReadOptions(text.get(), kCacheReadFlags);
-    bool loaded = IniText_Load(text.get(), path.c_str()) == 0;
-    return entries_.emplace(path, IniCacheEntry{std::move(text), false, loaded, now}).first->second;
+    // A missing or unreadable file leaves the document empty; it is cached all the same.
+    IniText_Load(text.get(), path.c_str());
+    return entries_.emplace(path, IniCacheEntry{std::move(text), false}).first->second;
 }
 
 IniText* IniFileManager::GetIniCacheEntry(const std::string& path) {
@@ -144,7 +134,6 @@ HRESULT IniFileManager::FlushIniCache() {
             return E_FAIL;
         }
         entry.modified = false;
-        entry.loaded = true;
         saved = true;
     }
     if (saved) {

@@ -1,7 +1,5 @@
 // The process-wide INI cache: one parsed document per file path, re-read when the file's
 // modification time changes, with all access serialised by one process-wide recursive lock.
-// A loaded file is examined for changes at most once per kChangeCheckIntervalMs, so a lookup
-// usually costs no system call; a file that could not be loaded is examined at every lookup.
 #pragma once
 
 #include <cstdint>
@@ -18,8 +16,6 @@ class IniFileManager {
     struct ConstructionKey {};
 
   public:
-    static constexpr int64_t kChangeCheckIntervalMs = 10;
-
     explicit IniFileManager(ConstructionKey) {}
     IniFileManager(const IniFileManager&) = delete;
     IniFileManager& operator=(const IniFileManager&) = delete;
@@ -57,9 +53,7 @@ class IniFileManager {
   private:
     struct IniCacheEntry {
         IniTextPtr text;
-        bool modified = false;    // holds changes not saved yet: never re-loaded
-        bool loaded = false;      // a load of the file succeeded
-        int64_t checkedAtMs = 0;  // monotonic time of the last examination of the file
+        bool modified = false;  // holds changes not saved yet: never re-loaded
     };
 
     IniCacheEntry& Entry(const std::string& path);
