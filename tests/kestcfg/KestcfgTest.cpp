@@ -1,6 +1,7 @@
 // kestcfg as a user runs it: the built program, its standard output, error and exit code.
 #include <gtest/gtest.h>
 
+#include "common/TempSysroot.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace {
@@ -79,6 +80,17 @@ TEST(KestcfgTest, CommandLineMistakesAreUsageErrors) {
         EXPECT_EQ(2, result.exitCode);
         EXPECT_EQ("", result.out);
         EXPECT_EQ(0u, result.err.rfind("kestcfg: ", 0)) << result.err;
+    }
+}
+
+TEST(KestcfgTest, ASysrootWithoutAControllerHasNoItemsToShow) {
+    const kest::test::TempSysroot empty;
+    for (const char* command : {"items", "get"}) {
+        const RunResult result = RunKestcfg({"--sysroot", empty.Root(), command});
+        EXPECT_EQ(3, result.exitCode) << command;
+        EXPECT_EQ("", result.out);
+        EXPECT_NE(std::string::npos, result.err.find("kestcfg: the plug-in reports no items"))
+            << result.err;
     }
 }
 

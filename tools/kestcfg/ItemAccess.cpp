@@ -29,10 +29,16 @@ std::vector<std::wstring> ItemNames(IuxSysExpert3* expert) {
             throw Failure("reading the item names failed with " + StatusWithName(next));
         }
         if (next != S_OK || fetched != 1) {
-            return result;
+            break;
         }
         result.emplace_back(name.Get() != nullptr ? name.Get() : L"", CvqBStrLength(name.Get()));
     }
+    if (result.empty()) {
+        throw Failure(
+            "the plug-in reports no items: the chassis could not be read (is "
+            "KEST_SYSROOT or --sysroot a controller made by 'kestcfg sim init'?)");
+    }
+    return result;
 }
 
 HRESULT CurrentProperties(IuxSysExpert3* expert, const std::wstring& item,

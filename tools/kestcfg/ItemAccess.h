@@ -10,7 +10,8 @@
 // The item name a user typed, as wide text. Throws a usage error for text that is not UTF-8.
 std::wstring ItemArgument(const std::string& text);
 
-// The names of all items in the plug-in's order. Throws a failure with the status.
+// The names of all items in the plug-in's order. Throws a failure with the status, or when there
+// is no item at all (the chassis item is always there unless it cannot be read).
 std::vector<std::wstring> ItemNames(IuxSysExpert3* expert);
 
 // The item's current properties (GetPropertiesOfItem) as a bag with the timestamp operations.
