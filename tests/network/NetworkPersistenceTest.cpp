@@ -4,17 +4,15 @@
 #include <gmock/gmock.h>
 
 #include "NetworkTestSupport.h"
-#include "network/NetworkTags.h"
-#include "uxsys/StatusCodes.h"
 
 namespace network_test {
 namespace {
 
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
-namespace tag = NetworkTag;
 
-// What a persist handed back.
+constexpr char kZeroAddresses[] = "\t0.0.0.0\t0.0.0.0\t0.0.0.0\t0.0.0.0";
+
 struct PersistResult {
     HRESULT status = S_OK;
     int32_t persistFlag = 0;
@@ -24,18 +22,20 @@ struct PersistResult {
 
 class PersistenceTest : public NetworkTest {
   protected:
-    // Writes `state`, then reads the adapter's properties into a bag without modified tags, as
-    // a host that edits the current properties does.
-    void StartFrom(const std::string& state) {
+    // Reads the adapter's properties (from `state`) into a bag, as a host editing them does,
+    // then writes `changes` over them and persists.
+    PersistResult Persist(const std::string& state, const std::string& changes) {
         WriteState(state);
         handler_ = MakeHandler();
         bag_ = CreatePropertyBag();
-        ASSERT_EQ(S_OK, handler_->GetItemProperties(bag_.Get()));
+        EXPECT_EQ(S_OK, handler_->GetItemProperties(bag_.Get()));
         bag_->ClearAllModified();
+        WriteRows(bag_.Get(), changes);
         ClearCallLog();
+        return PersistAgain();
     }
 
-    PersistResult Persist() {
+    PersistResult PersistAgain() {
         PersistResult result;
         try {
             result.status = handler_->PersistPropertyChanges(
@@ -51,26 +51,21 @@ class PersistenceTest : public NetworkTest {
 };
 
 TEST_F(PersistenceTest, NothingModifiedCallsNothing) {
-    StartFrom(AdapterState());
+    const PersistResult result = Persist(AdapterState(), "");
+    EXPECT_EQ(S_OK, result.status);
     PersistResult network;
     EXPECT_EQ(S_FALSE,
               handler_->NetworkItemHandler::PersistPropertyChanges(
                   bag_.Get(), network.persistFlag, network.deviceHandler, network.adapterDisabled));
-    const PersistResult ethernet = Persist();
-    EXPECT_EQ(S_OK, ethernet.status);
-    EXPECT_FALSE(ethernet.deviceHandler);
+    EXPECT_FALSE(result.deviceHandler);
     EXPECT_THAT(CallLog(), IsEmpty());
 }
 
 TEST_F(PersistenceTest, MakingTheAdapterPrimaryWritesOnlyThePrimaryRole) {
-    StartFrom(AdapterState("", 1));
-    ASSERT_EQ(S_OK, bag_->SetBool(tag::kPrimaryAdapter, 1));
-
-    const PersistResult result = Persist();
-
+    const PersistResult result = Persist(AdapterState("", 1), "primary=1");
     EXPECT_EQ(S_OK, result.status);
-    EXPECT_THAT(SetterLog(), ElementsAre("SetPrimaryDeviceByIndex\t0\t0"));
-    EXPECT_EQ(2u, ULongOf(bag_.Get(), tag::kAdapterMode));
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetPrimaryDeviceByIndex\t0\t0"));
+    EXPECT_EQ(2u, ULongOf(bag_.Get(), NetworkTag::kAdapterMode));
     ASSERT_TRUE(result.deviceHandler);
     EXPECT_EQ(0u, result.deviceHandler->GetDeviceIndex());
     EXPECT_FALSE(result.adapterDisabled);
@@ -78,118 +73,68 @@ TEST_F(PersistenceTest, MakingTheAdapterPrimaryWritesOnlyThePrimaryRole) {
 }
 
 TEST_F(PersistenceTest, MediaModeAloneIsSetWithoutTouchingPolling) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kPreferredMediaMode, 8));
-
-    const PersistResult result = Persist();
-
+    const PersistResult result = Persist(AdapterState(), "media=8");
     EXPECT_EQ(S_OK, result.status);
+    EXPECT_TRUE(result.deviceHandler);
     EXPECT_THAT(CallLog(),
                 ElementsAre("GetPrimaryDeviceIndex\t0", "GetPrimaryDeviceIndex\t0",
                             "GetDeviceModeByIndex\t0\t0", "GetDeviceTCPIPRequestModeByIndex\t0\t0",
                             "GetCurrentDeviceSettings\t0\t0", "GetDeviceModeByIndex\t0\t0",
                             "SetDeviceSettings\t0\t0\t8\t0\t0"));
-    EXPECT_TRUE(result.deviceHandler);
 }
 
-TEST_F(PersistenceTest, SwitchingToEtherCATAsksForARestartAndClearsTheAddresses) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kAdapterMode, 8));
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kEtherCATMasterId, 5));
-    ASSERT_EQ(S_OK, bag_->SetBool(tag::kEtherCATFlag, 1));
-
-    const PersistResult result = Persist();
-
-    EXPECT_EQ(S_OK, result.status);
+TEST_F(PersistenceTest, AdapterModeChangesStoreZeroAddresses) {
+    PersistResult result = Persist(AdapterState(), "mode=8 id=5 flag=1");
     EXPECT_EQ(1, result.persistFlag);
     EXPECT_FALSE(result.adapterDisabled);
-    EXPECT_THAT(SetterLog(), ElementsAre("SetEtherCATSettings\t0\t0\t5\t1",
-                                         "SetDeviceIPConfigByIndex\t0\t0\t0\t0\t8\t0.0.0.0\t0.0.0.0"
-                                         "\t0.0.0.0\t0.0.0.0"));
-}
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetEtherCATSettings\t0\t0\t5\t1",
+                                            std::string("SetDeviceIPConfigByIndex\t0\t0\t0\t0\t8") +
+                                                kZeroAddresses));
 
-TEST_F(PersistenceTest, DisablingTheAdapterReportsIt) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kAdapterMode, 1));
-
-    const PersistResult result = Persist();
-
-    EXPECT_EQ(S_OK, result.status);
-    EXPECT_TRUE(result.adapterDisabled);
+    result = Persist(AdapterState(), "mode=1");
     EXPECT_EQ(0, result.persistFlag);
-    EXPECT_THAT(SetterLog(), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t0\t1\t0.0.0.0\t0.0.0.0"
-                                         "\t0.0.0.0\t0.0.0.0"));
+    EXPECT_TRUE(result.adapterDisabled);
+    EXPECT_THAT(CallLog("Set"), ElementsAre(std::string("SetDeviceIPConfigByIndex\t0\t0\t0\t0\t1") +
+                                            kZeroAddresses));
 }
 
 TEST_F(PersistenceTest, NewStaticAddressStoresTheWholeConfiguration) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetString(tag::kIPAddress, L"192.168.1.20"));
-    ASSERT_EQ(S_OK, bag_->SetString(tag::kDnsServer, L""));
-
-    EXPECT_EQ(S_OK, Persist().status);
-
-    EXPECT_THAT(SetterLog(),
-                ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.1.20\t255.255.255.0"
-                            "\t192.168.1.1\t0.0.0.0"));
+    EXPECT_EQ(S_OK, Persist(AdapterState(), "ip=192.168.1.20 dns=").status);
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.1.20"
+                                            "\t255.255.255.0\t192.168.1.1\t0.0.0.0"));
+    // An adapter without an address yet takes the new one as well.
+    EXPECT_EQ(S_OK, Persist(AdapterState("IPAddress ="), "ip=10.0.0.3 mask=255.0.0.0").status);
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t10.0.0.3"
+                                            "\t255.0.0.0\t192.168.1.1\t192.168.1.2"));
 }
 
-TEST_F(PersistenceTest, StaticAdapterWithoutAnAddressYetTakesTheNewOne) {
-    StartFrom(AdapterState("IPAddress =\n"));
-    ASSERT_EQ(S_OK, bag_->SetString(tag::kIPAddress, L"192.168.1.30"));
-    ASSERT_EQ(S_OK, bag_->SetString(tag::kSubnetMask, L"255.255.0.0"));
-
-    EXPECT_EQ(S_OK, Persist().status);
-
-    EXPECT_THAT(SetterLog(),
-                ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.1.30\t255.255.0.0"
-                            "\t192.168.1.1\t192.168.1.2"));
-}
-
-TEST_F(PersistenceTest, GatewayThatIsNoAddressFailsTheChangeTest) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetString(tag::kGateway, L"gateway"));
+TEST_F(PersistenceTest, FailuresAreTracedAndReturnedAfterEarlierWrites) {
     CaptureTraces(kTraceErrors);
+    EXPECT_EQ(E_FAIL, Persist(AdapterState(), "gw=gateway").status);
+    EXPECT_THAT(CallLog("Set"), IsEmpty());
+    EXPECT_THAT(Traces(), ElementsAre("NetworkItemHandler::HaveInterfaceSettingsChanged() failed +",
+                                      "NetworkItemHandler::PersistPropertyChanges() failed +"));
 
-    EXPECT_EQ(E_FAIL, Persist().status);
-
-    EXPECT_THAT(SetterLog(), IsEmpty());
-    ASSERT_EQ(2u, Traces().size());
-    EXPECT_EQ("NetworkItemHandler::HaveInterfaceSettingsChanged() failed", Traces()[0].text);
-    EXPECT_EQ("NetworkItemHandler::PersistPropertyChanges() failed", Traces()[1].text);
+    EXPECT_EQ(E_INVALIDARG, Persist(AdapterState("[Faults]\nSetDeviceIPConfigByIndex = -375563", 1),
+                                    "primary=1 req=2")
+                                .status);
+    EXPECT_THAT(
+        CallLog("Set"),
+        ElementsAre("SetPrimaryDeviceByIndex\t0\t0",
+                    std::string("SetDeviceIPConfigByIndex\t-375563\t0\t0\t2\t2") + kZeroAddresses));
 }
 
-TEST_F(PersistenceTest, LibraryFailureIsReturnedAfterEarlierWrites) {
-    StartFrom(AdapterState("", 1) + "[Faults]\nSetDeviceIPConfigByIndex = -375563\n");
-    ASSERT_EQ(S_OK, bag_->SetBool(tag::kPrimaryAdapter, 1));
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kRequestMode, 2));
-
-    EXPECT_EQ(E_INVALIDARG, Persist().status);
-
-    EXPECT_THAT(SetterLog(), ElementsAre("SetPrimaryDeviceByIndex\t0\t0",
-                                         "SetDeviceIPConfigByIndex\t-375563\t0\t0\t2\t2\t0.0.0.0"
-                                         "\t0.0.0.0\t0.0.0.0\t0.0.0.0"));
-}
-
-TEST_F(PersistenceTest, OtherModifiedTagsChangeNothing) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetString(tag::kMacAddress, L"00:00:00:00:00:01"));
-
-    const PersistResult result = Persist();
-
+TEST_F(PersistenceTest, OtherTagsChangeNothingAndPollingIsSetAlone) {
+    const PersistResult result = Persist(AdapterState(), "mac=00:00:00:00:00:01");
     EXPECT_EQ(S_OK, result.status);
-    EXPECT_THAT(SetterLog(), IsEmpty());
     EXPECT_FALSE(result.deviceHandler);
-}
+    EXPECT_THAT(CallLog("Set"), IsEmpty());
 
-TEST_F(PersistenceTest, PollingSettingsAreSetWithoutTouchingTheMediaMode) {
-    StartFrom(AdapterState());
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kPollingInterval, 500));
-    EXPECT_EQ(S_OK, Persist().status);
-    ASSERT_EQ(S_OK, bag_->SetULong(tag::kPollingMode, 2));
-    EXPECT_EQ(S_OK, Persist().status);
-
-    EXPECT_THAT(SetterLog(), ElementsAre("SetDeviceSettings\t0\t0\t0\t1\t0",
-                                         "SetDeviceSettings\t0\t0\t0\t2\t500"));
+    Persist(AdapterState(), "interval=500");
+    WriteRows(bag_.Get(), "polling=2");
+    PersistAgain();
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceSettings\t0\t0\t0\t1\t0",
+                                            "SetDeviceSettings\t0\t0\t0\t2\t500"));
 }
 
 }  // namespace

@@ -3,241 +3,165 @@
 #include <gmock/gmock.h>
 
 #include "NetworkTestSupport.h"
-#include "network/NetworkTags.h"
-#include "uxsys/StatusCodes.h"
 
 namespace network_test {
 namespace {
 
 using ::testing::ElementsAre;
-using ::testing::IsEmpty;
+using ::testing::HasSubstr;
+using ::testing::Not;
 namespace tag = NetworkTag;
 
-constexpr uint32_t kMissing = 0xDEADBEEF;
+// Every row of `bag` in tag order as "tag=value;" (tags and numbers in hexadecimal).
+std::string Listing(IuxSysPropertyBag* bag) {
+    std::ostringstream rows;
+    CountedPtr<IuxSysEnumPropertyTag> tags;
+    bag->GetTagEnumerator(tags.Receive());
+    for (uint32_t next = 0; tags && tags->Next(1, &next, nullptr) == S_OK;) {
+        uint32_t type = 0;
+        int32_t value = 0;
+        bag->GetTagType(next, &type);
+        rows << std::hex << next << '=';
+        if (type == UX_PROPERTY_TYPE_STRING) {
+            const std::wstring text = TextOf(bag, next);
+            rows << std::string(text.begin(), text.end());
+        } else if (type == UX_PROPERTY_TYPE_ULONG) {
+            rows << ULongOf(bag, next);
+        } else if (bag->GetLong(next, &value) == S_OK || bag->GetBool(next, &value) == S_OK) {
+            rows << value;
+        }
+        rows << ';';
+    }
+    return rows.str();
+}
+
+// The rows every item has, then the network constants.
+constexpr char kIdentity[] =
+    "101c000=1;101d000=eth0;101f000=Ethernet Adapter eth0;102a000=3e8;1037000=150000;1038000=1;"
+    "1039000=1;103a000=5;";
 
 class PropertiesTest : public NetworkTest {
   protected:
-    // The adapter's properties after GetItemProperties on the given state.
-    CountedPtr<IuxSysPropertyBag4> Properties(const std::string& state) {
-        WriteState(state);
+    std::string Properties(const std::string& stateOverrides) {
+        WriteState(AdapterState(stateOverrides));
         CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
         EXPECT_EQ(S_OK, MakeHandler()->GetItemProperties(bag.Get()));
-        return bag;
+        return Listing(bag.Get());
     }
 
-    // The tags a refresh for `requested` writes into a new bag.
-    std::vector<uint32_t> RefreshedTags(std::vector<uint32_t> requested) {
+    std::string Refreshed(std::vector<uint32_t> requested) {
         WriteState(AdapterState());
         CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
         EXPECT_EQ(S_OK, MakeHandler()->RefreshProperties(static_cast<uint32_t>(requested.size()),
                                                          requested.data(), bag.Get()));
-        std::vector<uint32_t> tags;
-        CountedPtr<IuxSysEnumPropertyTag> enumerator;
-        bag->GetTagEnumerator(enumerator.Receive());
-        uint32_t next = 0;
-        while (enumerator && enumerator->Next(1, &next, nullptr) == S_OK) {
-            tags.push_back(next);
-        }
-        return tags;
+        return Listing(bag.Get());
     }
 };
 
-TEST_F(PropertiesTest, TcpIpAdapterReportsTheWholeCatalogue) {
-    CountedPtr<IuxSysPropertyBag4> bag = Properties(AdapterState());
-    int32_t flag = 0;
-    EXPECT_EQ(S_OK, bag->GetBool(tag::kConstantTrue, &flag));
-    EXPECT_EQ(1, flag);
-    int32_t one = 0;
-    EXPECT_EQ(S_OK, bag->GetLong(tag::kConstantOne, &one));
-    EXPECT_EQ(1, one);
-    EXPECT_EQ(5u, ULongOf(bag.Get(), tag::kConstantFive));
-    EXPECT_EQ(L"eth0", TextOf(bag.Get(), tag::kItemName));
-    EXPECT_EQ(L"00:80:2F:12:34:56", TextOf(bag.Get(), tag::kMacAddress));
-    EXPECT_EQ(S_OK, bag->GetBool(tag::kPrimaryAdapter, &flag));
-    EXPECT_EQ(1, flag);
-    EXPECT_EQ(0x3u, ULongOf(bag.Get(), tag::kSupportedRequestModes));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kRequestMode));
-    EXPECT_EQ(L"192.168.1.10", TextOf(bag.Get(), tag::kIPAddress));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kAddressCount));
-    EXPECT_EQ(L"255.255.255.0", TextOf(bag.Get(), tag::kSubnetMask));
-    EXPECT_EQ(L"192.168.1.1", TextOf(bag.Get(), tag::kGateway));
-    EXPECT_EQ(L"192.168.1.2", TextOf(bag.Get(), tag::kDnsServer));
-    EXPECT_EQ(0x7Fu, ULongOf(bag.Get(), tag::kSupportedMediaModes));
-    EXPECT_EQ(4u, ULongOf(bag.Get(), tag::kCurrentMediaMode));
-    EXPECT_EQ(4u, ULongOf(bag.Get(), tag::kPreferredMediaMode));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kEthernetConstantOne));
-    EXPECT_EQ(2u, ULongOf(bag.Get(), tag::kAdapterMode));
-    EXPECT_EQ(0x0Bu, ULongOf(bag.Get(), tag::kSupportedAdapterModes));
-    EXPECT_EQ(0x3u, ULongOf(bag.Get(), tag::kSupportedPollingModes));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kPollingMode));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kPollingInterval));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kEtherCATMasterId));
+TEST_F(PropertiesTest, CatalogueFollowsTheAdapterMode) {
+    EXPECT_EQ(kIdentity + std::string("d102000=2;d103000=b;d104000=00:80:2F:12:34:56;d105000=1;"
+                                      "d106000=3;d107000=192.168.1.10;d108000=1;"
+                                      "d109000=255.255.255.0;d10a000=192.168.1.1;"
+                                      "d10b000=192.168.1.2;d10f000=4;d110000=7f;d111000=4;"
+                                      "d119000=3;d11a000=1;d126000=1;d12c000=1;"),
+              Properties(""));
+    // Only mode 2 has media rows and polling settings; mode 0x20 still has addresses.
+    EXPECT_EQ(kIdentity + std::string("d102000=20;d103000=b;d104000=00:80:2F:12:34:56;d105000=1;"
+                                      "d106000=3;d107000=192.168.1.10;d108000=1;"
+                                      "d109000=255.255.255.0;d10a000=192.168.1.1;"
+                                      "d10b000=192.168.1.2;d119000=1;d11a000=1;d126000=1;"
+                                      "d12c000=1;"),
+              Properties("Mode = 0x20\nPollingMode = 2"));
+    EXPECT_THAT(Properties("PollingMode = 2\nPollingInterval = 250"),
+                HasSubstr("d11a000=2;d11b000=fa;"));
+    // EtherCAT without a master ID: empty addresses, request mode from the supported mask.
+    EXPECT_EQ(kIdentity + std::string("d102000=8;d103000=b;d104000=00:80:2F:12:34:56;d105000=2;"
+                                      "d106000=3;d107000=;d109000=;d10a000=;d10b000=;d119000=1;"
+                                      "d11a000=1;d126000=1;d12c000=1;"),
+              Properties("Mode = 8"));
+    EXPECT_THAT(Properties("Mode = 8\nEtherCATMasterID = 3\nEtherCATFlag = 1"),
+                HasSubstr("d118000=3;d119000=1;d11a000=1;d126000=1;d12c000=1;d155000=1;"));
 }
 
-TEST_F(PropertiesTest, PollingAdapterReportsItsInterval) {
-    CountedPtr<IuxSysPropertyBag4> bag =
-        Properties(AdapterState("PollingMode = 2\nPollingInterval = 250\n"));
-    EXPECT_EQ(2u, ULongOf(bag.Get(), tag::kPollingMode));
-    EXPECT_EQ(250u, ULongOf(bag.Get(), tag::kPollingInterval));
-}
-
-TEST_F(PropertiesTest, Mode20HasAddressesButNoMediaOrPollingRows) {
-    CountedPtr<IuxSysPropertyBag4> bag =
-        Properties(AdapterState("Mode = 0x20\nPollingMode = 2\nSupportedPollingModes = 6\n"));
-    EXPECT_EQ(L"192.168.1.10", TextOf(bag.Get(), tag::kIPAddress));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kSupportedMediaModes));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kCurrentMediaMode));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kPreferredMediaMode));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kSupportedPollingModes));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kPollingMode));
-}
-
-TEST_F(PropertiesTest, EtherCATAdapterWithoutMasterIdHasEmptyAddresses) {
-    CountedPtr<IuxSysPropertyBag4> bag = Properties(AdapterState("Mode = 8\n"));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kEtherCATMasterId));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kEtherCATFlag));
-    for (uint32_t address : {tag::kIPAddress, tag::kSubnetMask, tag::kGateway, tag::kDnsServer}) {
-        EXPECT_EQ(L"", TextOf(bag.Get(), address));
-    }
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kAddressCount));
-    EXPECT_EQ(2u, ULongOf(bag.Get(), tag::kRequestMode));
-    EXPECT_EQ(8u, ULongOf(bag.Get(), tag::kAdapterMode));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kSupportedPollingModes));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kPollingMode));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kPollingInterval));
-}
-
-TEST_F(PropertiesTest, EtherCATAdapterReportsMasterIdAndFlag) {
-    CountedPtr<IuxSysPropertyBag4> bag =
-        Properties(AdapterState("Mode = 8\nEtherCATMasterID = 3\nEtherCATFlag = 1\n"));
-    EXPECT_EQ(3u, ULongOf(bag.Get(), tag::kEtherCATMasterId));
-    int32_t flag = 0;
-    EXPECT_EQ(S_OK, bag->GetBool(tag::kEtherCATFlag, &flag));
-    EXPECT_EQ(1, flag);
-}
-
-TEST_F(PropertiesTest, RequestModeOfAnAdapterOutsideTcpIpFollowsTheSupportedMask) {
-    const std::pair<const char*, uint32_t> cases[] = {{"0x3", 2}, {"0x1", 1}, {"0x4", 0}};
-    for (const auto& testCase : cases) {
-        CountedPtr<IuxSysPropertyBag4> bag = Properties(AdapterState(
-            std::string("Mode = 1\nSupportedRequestModes = ") + testCase.first + "\n"));
-        EXPECT_EQ(testCase.second, ULongOf(bag.Get(), tag::kRequestMode)) << testCase.first;
-    }
-}
-
-TEST_F(PropertiesTest, AdapterWithoutAddressReportsZeroAddresses) {
-    CountedPtr<IuxSysPropertyBag4> bag = Properties(AdapterState("IPAddress =\n"));
-    EXPECT_EQ(L"0.0.0.0", TextOf(bag.Get(), tag::kIPAddress));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kAddressCount));
-    EXPECT_EQ(L"0.0.0.0", TextOf(bag.Get(), tag::kSubnetMask));
-    EXPECT_EQ(L"192.168.1.1", TextOf(bag.Get(), tag::kGateway));
-}
-
-TEST_F(PropertiesTest, FailedMediaAndPollingQueriesReportOne) {
-    CountedPtr<IuxSysPropertyBag4> bag = Properties(
-        AdapterState("PollingMode = 2\n[Faults]\nGetCurrentDeviceSettings = -375501\n"
-                     "GetSupportedDeviceSettings = -375501\nGetPreferredMediaMode = -1\n"));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kSupportedMediaModes));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kCurrentMediaMode));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kPreferredMediaMode));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kSupportedPollingModes));
-    EXPECT_EQ(1u, ULongOf(bag.Get(), tag::kPollingMode));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kPollingInterval));
+TEST_F(PropertiesTest, DefaultsForRequestModesMissingAddressesAndFailedQueries) {
+    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 3"), HasSubstr("d105000=2;"));
+    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 1"), HasSubstr("d105000=1;"));
+    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 4"), HasSubstr("d105000=0;"));
+    EXPECT_THAT(Properties("IPAddress ="), HasSubstr("d107000=0.0.0.0;d108000=1;d109000=0.0.0.0;"));
+    const std::string rows = Properties(
+        "PollingMode = 2\n[Faults]\nGetCurrentDeviceSettings = -375501\n"
+        "GetSupportedDeviceSettings = -375501\nGetPreferredMediaMode = -1");
+    EXPECT_THAT(rows, HasSubstr("d10f000=1;d110000=1;d111000=1;d119000=1;d11a000=1;"));
+    EXPECT_THAT(rows, Not(HasSubstr("d11b000")));
 }
 
 TEST_F(PropertiesTest, FailedTestedCallAbortsKeepingEarlierRows) {
-    WriteState(AdapterState("[Faults]\nGetDeviceModeByIndex = -375563\n"));
+    WriteState(AdapterState("[Faults]\nGetDeviceModeByIndex = -375563"));
     CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-    EXPECT_THROW(
-        {
-            try {
-                MakeHandler()->GetItemProperties(bag.Get());
-            } catch (long status) {
-                EXPECT_EQ(E_INVALIDARG, status);
-                throw;
-            }
-        },
-        long);
-    EXPECT_EQ(L"00:80:2F:12:34:56", TextOf(bag.Get(), tag::kMacAddress));
-    EXPECT_EQ(kMissing, ULongOf(bag.Get(), tag::kRequestMode));
+    long status = 0;
+    try {
+        MakeHandler()->GetItemProperties(bag.Get());
+    } catch (long thrown) {
+        status = thrown;
+    }
+    EXPECT_EQ(E_INVALIDARG, status);
+    EXPECT_EQ(kIdentity + std::string("d104000=00:80:2F:12:34:56;d126000=1;"), Listing(bag.Get()));
 }
 
 TEST_F(PropertiesTest, RefreshRewritesOnlyForItsOwnTags) {
-    EXPECT_THAT(RefreshedTags({tag::kMacAddress, tag::kSupportedAdapterModes}), IsEmpty());
-
-    const std::vector<uint32_t> network = RefreshedTags({tag::kGateway | 0x123});
-    EXPECT_EQ(15u, network.size());
-    EXPECT_EQ(std::count(network.begin(), network.end(), tag::kMacAddress), 1);
-    EXPECT_EQ(std::count(network.begin(), network.end(), tag::kAdapterMode), 0);
-
-    EXPECT_THAT(
-        RefreshedTags({tag::kPollingMode}),
-        ElementsAre(tag::kAdapterMode, tag::kSupportedAdapterModes, tag::kSupportedPollingModes,
-                    tag::kPollingMode, tag::kEthernetConstantOne));
-    EXPECT_EQ(20u, RefreshedTags({tag::kPollingMode, tag::kPrimaryAdapter}).size());
+    EXPECT_EQ("", Refreshed({tag::kMacAddress, tag::kSupportedAdapterModes}));
+    const std::string network = Refreshed({tag::kGateway | 0x123});
+    EXPECT_THAT(network, HasSubstr("1038000=1;1039000=1;103a000=5;d104000="));
+    EXPECT_THAT(network, Not(HasSubstr("d102000")));
+    EXPECT_EQ("d102000=2;d103000=b;d119000=3;d11a000=1;d12c000=1;", Refreshed({tag::kPollingMode}));
+    EXPECT_THAT(Refreshed({tag::kPollingMode, tag::kPrimaryAdapter}),
+                HasSubstr("d102000=2;d103000=b;d104000="));
 }
 
 TEST_F(PropertiesTest, LibraryCallsAreTracedUnderTheirBit) {
     CaptureTraces(kTraceLibraryCalls);
-    Properties(AdapterState());
-    std::vector<std::string> texts;
-    for (const TraceRecord& trace : Traces()) {
-        EXPECT_TRUE(trace.stamped);
-        texts.push_back(trace.text);
-    }
-    const std::string prefix = "NetworkItemHandler::PopulateProperties - ";
-    EXPECT_THAT(texts,
-                ElementsAre(prefix + "GetMACAddressByIndex(00:80:2F:12:34:56)",
-                            prefix + "GetPrimaryDeviceIndex(0)", prefix + "GetDeviceModeByIndex(2)",
-                            prefix + "GetDeviceSupportedTCPIPRequestModesByIndex(3)",
-                            prefix + "GetDeviceTCPIPRequestModeByIndex(1)",
-                            prefix + "GetIPAddressByIndex(192.168.1.10)",
-                            prefix + "GetGatewayAddressByIndex(192.168.1.1)",
-                            prefix + "GetDNSServerAddressByIndex(192.168.1.2)",
-                            prefix + "GetSupportedDeviceSettings(127)",
-                            prefix + "GetCurrentDeviceSettings(4)",
-                            "EthernetItemHandler::PopulateProperties - GetDeviceModeByIndex(2)",
-                            "EthernetItemHandler::PopulateProperties - "
-                            "GetDeviceSupportedModesByIndex(11)",
-                            "EthernetItemHandler::PopulateProperties - "
-                            "GetSupportedDeviceSettings(3)",
-                            "EthernetItemHandler::PopulateProperties - "
-                            "GetCurrentDeviceSettings(1)"));
-
+    Properties("");
+    const std::string network = "NetworkItemHandler::PopulateProperties - ";
+    const std::string ethernet = "EthernetItemHandler::PopulateProperties - ";
+    EXPECT_THAT(Traces(), ElementsAre(network + "GetMACAddressByIndex(00:80:2F:12:34:56) +",
+                                      network + "GetPrimaryDeviceIndex(0) +",
+                                      network + "GetDeviceModeByIndex(2) +",
+                                      network + "GetDeviceSupportedTCPIPRequestModesByIndex(3) +",
+                                      network + "GetDeviceTCPIPRequestModeByIndex(1) +",
+                                      network + "GetIPAddressByIndex(192.168.1.10) +",
+                                      network + "GetGatewayAddressByIndex(192.168.1.1) +",
+                                      network + "GetDNSServerAddressByIndex(192.168.1.2) +",
+                                      network + "GetSupportedDeviceSettings(127) +",
+                                      network + "GetCurrentDeviceSettings(4) +",
+                                      ethernet + "GetDeviceModeByIndex(2) +",
+                                      ethernet + "GetDeviceSupportedModesByIndex(11) +",
+                                      ethernet + "GetSupportedDeviceSettings(3) +",
+                                      ethernet + "GetCurrentDeviceSettings(1) +"));
     CaptureTraces(kTraceLibraryCalls);
-    Properties(AdapterState("Mode = 1\n"));
-    ASSERT_EQ(6u, Traces().size());
-    EXPECT_EQ("PopulateTcpRequestMode - GetDeviceSupportedTCPIPRequestModesByIndex(3)",
-              Traces()[3].text);
+    Properties("Mode = 1");
+    EXPECT_EQ("PopulateTcpRequestMode - GetDeviceSupportedTCPIPRequestModesByIndex(3) +",
+              Traces().at(3));
 }
 
-TEST_F(PropertiesTest, DescriptionsMatchByNameOrKind) {
-    WriteState(AdapterState());
+TEST_F(PropertiesTest, DescriptionsMatchByNameOrKindAndAdapterStateIsRead) {
+    WriteState(AdapterState("AdapterUp = 0"));
     CountedPtr<EthernetItemHandler> handler = MakeHandler();
-    struct {
-        const wchar_t* name;
-        bool matches;
-        bool exact;
-    } const cases[] = {{L"eth0", true, true},   {L"ETH0", true, true}, {L"eth1", true, false},
-                       {L"ETH1", false, false}, {L"et", false, false}, {L"", false, false}};
-    for (const auto& testCase : cases) {
-        CountedPtr<IuxSysPropertyBag4> description =
-            MakeBag({{tag::kItemName, BagValue::Text(testCase.name)}});
-        bool exact = !testCase.exact;
-        EXPECT_EQ(testCase.matches, handler->IsMatchingItem(description.Get(), exact));
-        EXPECT_EQ(testCase.exact, exact);
+    const std::tuple<const char*, bool, bool> cases[] = {{"eth0", true, true},
+                                                         {"ETH0", true, true},
+                                                         {"eth1", true, false},
+                                                         {"ETH1", false, false},
+                                                         {"et", false, false}};
+    for (const auto& [name, matches, exact] : cases) {
+        bool exactMatch = !exact;
+        EXPECT_EQ(matches,
+                  handler->IsMatchingItem(MakeBag(std::string("name=") + name).Get(), exactMatch));
+        EXPECT_EQ(exact, exactMatch) << name;
     }
-    bool exact = false;
-    EXPECT_THROW(handler->IsMatchingItem(CreatePropertyBag().Get(), exact), long);
-}
-
-TEST_F(PropertiesTest, AdapterIsUpOnlyWhenTheLibrarySaysSo) {
+    bool exactMatch = false;
+    EXPECT_THROW(handler->IsMatchingItem(CreatePropertyBag().Get(), exactMatch), long);
+    EXPECT_FALSE(handler->IsAdapterUp());
     WriteState(AdapterState());
-    EXPECT_TRUE(MakeHandler()->IsAdapterUp());
-    WriteState(AdapterState("AdapterUp = 0\n"));
-    EXPECT_FALSE(MakeHandler()->IsAdapterUp());
-    WriteState(AdapterState("[Faults]\nGetAdapterState = -375501\n"));
-    EXPECT_FALSE(MakeHandler()->IsAdapterUp());
+    EXPECT_TRUE(handler->IsAdapterUp());
 }
 
 }  // namespace

@@ -1,23 +1,20 @@
 // A simulated controller with one Ethernet adapter "eth0" (device index 0, the primary adapter,
 // TCP/IP mode 2 with a static address) under a temporary sysroot, the adapter's handler, bags
-// filled from short tables, and the library's call log.
+// written from short row texts, the library's call log and captured traces.
 #pragma once
 
 #include <gtest/gtest.h>
 
-#include <cstdint>
 #include <cstdlib>
-#include <map>
 #include <mutex>
+#include <regex>
 #include <sstream>
 #include <string>
-#include <utility>
 #include <vector>
 
-#include "com/CountedPtr.h"
 #include "common/TempSysroot.h"
-#include "items/RefCountedThreadSafePolicy.h"
 #include "network/EthernetItemHandler.h"
+#include "network/NetworkTags.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/TraceGate.h"
 #include "vq/targetcfg/TargetConfig.h"
@@ -27,110 +24,95 @@ namespace network_test {
 constexpr char kStatePath[] = "/var/lib/vqtargetcfg/state.ini";
 constexpr char kCallLogPath[] = "/var/lib/vqtargetcfg/calls.log";
 
-// The adapter as most tests start from it. `deviceOverrides` holds "Key = value" lines that
-// replace the device's line with that key or, for a new key, are added.
-inline std::string AdapterState(const std::string& deviceOverrides = "",
-                                uint32_t primaryIndex = 0) {
-    std::vector<std::string> lines = {
-        "Type = 1",
-        "InterfaceName = eth0",
-        "Index = 0",
-        "MACAddress = 00:80:2F:12:34:56",
-        "Mode = 2",
-        "SupportedModes = 0x0B",
-        "RequestMode = 1",
-        "SupportedRequestModes = 0x3",
-        "IPAddress = 192.168.1.10",
-        "SubnetMask = 255.255.255.0",
-        "Gateway = 192.168.1.1",
-        "DNSServer = 192.168.1.2",
-        "SupportedMediaModes = 0x7F",
-        "CurrentMediaMode = 4",
-        "PreferredMediaMode = 4",
-        "SupportedPollingModes = 0x3",
-        "PollingMode = 1",
-        "PollingInterval = 100",
-        "InterfaceUp = 1",
-        "AdapterUp = 1",
-    };
-    std::istringstream overrides(deviceOverrides);
-    for (std::string line; std::getline(overrides, line);) {
-        const std::string key = line.substr(0, line.find(' '));
-        bool replaced = false;
-        for (std::string& existing : lines) {
-            if (existing.compare(0, key.size() + 1, key + " ") == 0) {
-                existing = line;
-                replaced = true;
-            }
-        }
-        if (!replaced) {
-            lines.push_back(line);
-        }
-    }
-    std::string state =
-        "[Network]\nPrimaryDeviceIndex = " + std::to_string(primaryIndex) + "\n[Device0]\n";
-    for (const std::string& line : lines) {
-        state += line + "\n";
+// The adapter's state; each "Key = value" line of `overrides` replaces the line of that key or,
+// for a new key, is added (a "[Faults]" section, too).
+inline std::string AdapterState(const std::string& overrides = "", int primaryIndex = 0) {
+    std::string state = "[Network]\nPrimaryDeviceIndex = " + std::to_string(primaryIndex) +
+                        "\n[Device0]\nType = 1\nInterfaceName = eth0\nIndex = 0\n"
+                        "MACAddress = 00:80:2F:12:34:56\nMode = 2\nSupportedModes = 0x0B\n"
+                        "RequestMode = 1\nSupportedRequestModes = 0x3\nIPAddress = 192.168.1.10\n"
+                        "SubnetMask = 255.255.255.0\nGateway = 192.168.1.1\n"
+                        "DNSServer = 192.168.1.2\nSupportedMediaModes = 0x7F\n"
+                        "CurrentMediaMode = 4\nPreferredMediaMode = 4\nSupportedPollingModes = 3\n"
+                        "PollingMode = 1\nPollingInterval = 100\nInterfaceUp = 1\nAdapterUp = 1\n";
+    std::istringstream lines(overrides);
+    for (std::string line; std::getline(lines, line);) {
+        const std::regex key("(^|\n)" + line.substr(0, line.find(' ')) + " = [^\n]*");
+        state = std::regex_search(state, key) ? std::regex_replace(state, key, "$1" + line)
+                                              : state + line + "\n";
     }
     return state;
 }
 
-// One value for a bag: a boolean, an unsigned number or a text.
-struct BagValue {
-    enum class Kind { kBool, kULong, kText } kind;
-    uint32_t number = 0;
-    std::wstring text;
-
-    static BagValue Bool(bool value) { return {Kind::kBool, value ? 1u : 0u, {}}; }
-    static BagValue ULong(uint32_t value) { return {Kind::kULong, value, {}}; }
-    static BagValue Text(std::wstring value) { return {Kind::kText, 0, std::move(value)}; }
-};
-using BagRows = std::map<uint32_t, BagValue>;
-
-// A new bag holding `rows`, every one of them modified.
-inline CountedPtr<IuxSysPropertyBag4> MakeBag(const BagRows& rows) {
-    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-    for (const auto& row : rows) {
-        switch (row.second.kind) {
-            case BagValue::Kind::kBool:
-                EXPECT_EQ(S_OK, bag->SetBool(row.first, static_cast<int32_t>(row.second.number)));
-                break;
-            case BagValue::Kind::kULong:
-                EXPECT_EQ(S_OK, bag->SetULong(row.first, row.second.number));
-                break;
-            case BagValue::Kind::kText:
-                EXPECT_EQ(S_OK, bag->SetString(row.first, row.second.text.c_str()));
-                break;
+// Writes `rows` into `bag`, each a blank-separated "name=value": names primary and flag are
+// booleans (0/1), ip, mask, gw, dns, mac and name texts, the rest numbers; "-name" removes it.
+inline void WriteRows(IuxSysPropertyBag* bag, const std::string& rows) {
+    struct Row {
+        const char* name;
+        uint32_t tag;
+        char kind;  // b boolean, u number, t text
+    };
+    static const Row kRows[] = {
+        {"primary", NetworkTag::kPrimaryAdapter, 'b'},
+        {"flag", NetworkTag::kEtherCATFlag, 'b'},
+        {"ip", NetworkTag::kIPAddress, 't'},
+        {"mask", NetworkTag::kSubnetMask, 't'},
+        {"gw", NetworkTag::kGateway, 't'},
+        {"dns", NetworkTag::kDnsServer, 't'},
+        {"mac", NetworkTag::kMacAddress, 't'},
+        {"name", NetworkTag::kItemName, 't'},
+        {"mode", NetworkTag::kAdapterMode, 'u'},
+        {"modes", NetworkTag::kSupportedAdapterModes, 'u'},
+        {"req", NetworkTag::kRequestMode, 'u'},
+        {"media", NetworkTag::kPreferredMediaMode, 'u'},
+        {"id", NetworkTag::kEtherCATMasterId, 'u'},
+        {"polling", NetworkTag::kPollingMode, 'u'},
+        {"pollmodes", NetworkTag::kSupportedPollingModes, 'u'},
+        {"interval", NetworkTag::kPollingInterval, 'u'},
+    };
+    std::istringstream tokens(rows);
+    for (std::string token; tokens >> token;) {
+        const bool remove = token[0] == '-';
+        const std::string name = token.substr(remove ? 1 : 0, token.find('=') - (remove ? 1 : 0));
+        const std::string value = remove ? "" : token.substr(token.find('=') + 1);
+        const Row* row = nullptr;
+        for (const Row& candidate : kRows) {
+            row = name == candidate.name ? &candidate : row;
+        }
+        ASSERT_NE(nullptr, row) << token;
+        if (remove) {
+            bag->RemoveTag(row->tag);
+        } else if (row->kind == 't') {
+            ASSERT_EQ(S_OK,
+                      bag->SetString(row->tag, std::wstring(value.begin(), value.end()).c_str()));
+        } else if (row->kind == 'b') {
+            ASSERT_EQ(S_OK, bag->SetBool(row->tag, std::stoi(value)));
+        } else {
+            ASSERT_EQ(S_OK, bag->SetULong(row->tag, std::stoul(value, nullptr, 0)));
         }
     }
+}
+
+inline CountedPtr<IuxSysPropertyBag4> MakeBag(const std::string& rows) {
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    WriteRows(bag.Get(), rows);
     return bag;
 }
 
-// The unsigned value of `tag`, or `missing` when the bag does not hold one.
-inline uint32_t ULongOf(IuxSysPropertyBag* bag, uint32_t tag, uint32_t missing = 0xDEADBEEF) {
-    uint32_t value = missing;
-    return bag->GetULong(tag, &value) == S_OK ? value : missing;
+// The unsigned value of `tag`, or 0xDEADBEEF when the bag has none.
+inline uint32_t ULongOf(IuxSysPropertyBag* bag, uint32_t tag) {
+    uint32_t value = 0xDEADBEEF;
+    return bag->GetULong(tag, &value) == S_OK ? value : 0xDEADBEEF;
 }
 
-// The text of `tag`, or "<missing>" when the bag does not hold one.
 inline std::wstring TextOf(IuxSysPropertyBag* bag, uint32_t tag) {
     CvqBStrHolder text;
-    if (bag->GetString(tag, text.Receive()) != S_OK) {
-        return L"<missing>";
-    }
-    return std::wstring(text.Get(), CvqBStrLength(text.Get()));
+    return bag->GetString(tag, text.Receive()) == S_OK ? text.Get() : L"<missing>";
 }
 
-// One line of the call log: its monotonic time and the line without it.
 struct LoggedCall {
-    double milliseconds;
-    std::string call;
-};
-
-// Traces written while a test runs: text and whether the thread/time line followed.
-struct TraceRecord {
-    std::string text;
-    bool stamped;
+    double milliseconds;  // CLOCK_MONOTONIC
+    std::string call;     // name, status and inputs, tab-separated
 };
 
 class NetworkTest : public ::testing::Test {
@@ -138,13 +120,12 @@ class NetworkTest : public ::testing::Test {
     void TearDown() override { SetTraceGate(0, nullptr); }
 
     void WriteState(const std::string& state) const { sysroot_.WriteFile(kStatePath, state); }
-    std::string State() const { return sysroot_.ReadFile(kStatePath); }
+    void ClearCallLog() const { sysroot_.WriteFile(kCallLogPath, ""); }
 
     // The Ethernet handler of the controller's first device.
-    CountedPtr<EthernetItemHandler> MakeHandler() const {
+    static CountedPtr<EthernetItemHandler> MakeHandler() {
         vq::dsc::Vector<vq::targetcfg::IDeviceHandler*> devices;
         vq::targetcfg::GetDeviceHandlers(devices);
-        EXPECT_FALSE(devices.empty());
         CountedPtr<EthernetItemHandler> handler;
         if (!devices.empty()) {
             handler =
@@ -156,57 +137,39 @@ class NetworkTest : public ::testing::Test {
         return handler;
     }
 
-    // Forgets the calls logged so far.
-    void ClearCallLog() const { sysroot_.WriteFile(kCallLogPath, ""); }
-
-    // The logged calls in order.
     std::vector<LoggedCall> TimedCallLog() const {
         std::vector<LoggedCall> calls;
         std::istringstream log(sysroot_.ReadFile(kCallLogPath));
         for (std::string line; std::getline(log, line);) {
             const size_t tab = line.find('\t');
-            calls.push_back(
-                {std::strtod(line.substr(0, tab).c_str(), nullptr), line.substr(tab + 1)});
+            calls.push_back({std::strtod(line.c_str(), nullptr), line.substr(tab + 1)});
         }
         return calls;
     }
 
-    // The logged calls without their times.
-    std::vector<std::string> CallLog() const {
+    // The logged calls whose names begin with `prefix` ("" for all), without their times.
+    std::vector<std::string> CallLog(const std::string& prefix = "") const {
         std::vector<std::string> calls;
         for (const LoggedCall& call : TimedCallLog()) {
-            calls.push_back(call.call);
-        }
-        return calls;
-    }
-
-    // The logged calls that change the controller (names beginning with "Set").
-    std::vector<std::string> SetterLog() const {
-        std::vector<std::string> calls;
-        for (const std::string& call : CallLog()) {
-            if (call.compare(0, 3, "Set") == 0) {
-                calls.push_back(call);
+            if (call.call.compare(0, prefix.size(), prefix) == 0) {
+                calls.push_back(call.call);
             }
         }
         return calls;
     }
 
-    // Captures traces under `mask` from now on.
+    // Captures traces under `mask` from now on, the stamped ones marked with a final " +".
     static void CaptureTraces(uint32_t mask) {
         Traces().clear();
         SetTraceGate(mask, [](char, const char* text, bool stamped) {
-            std::lock_guard<std::mutex> lock(TraceMutex());
-            Traces().push_back({text, stamped});
+            static std::mutex mutex;
+            std::lock_guard<std::mutex> lock(mutex);
+            Traces().push_back(std::string(text) + (stamped ? " +" : ""));
         });
     }
-    // The captured traces; read them once the traced work has finished.
-    static std::vector<TraceRecord>& Traces() {
-        static std::vector<TraceRecord> traces;
+    static std::vector<std::string>& Traces() {
+        static std::vector<std::string> traces;
         return traces;
-    }
-    static std::mutex& TraceMutex() {
-        static std::mutex mutex;
-        return mutex;
     }
 
     kest::test::TempSysroot sysroot_;
