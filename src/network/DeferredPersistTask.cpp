@@ -2,10 +2,10 @@
 
 #include <utility>
 
+#include "network/BagReading.h"
 #include "network/LibraryCall.h"
 #include "network/NetworkTags.h"
 #include "support/Sleep.h"
-#include "support/StatusHolder.h"
 #include "support/TraceGate.h"
 #include "vq/targetcfg/Network.h"
 
@@ -64,14 +64,10 @@ void DeferredPersistTask::Run() {
 }
 
 void DeferredPersistTask::ReapplyLinkSpeed() {
-    StatusHolder status;
-    uint32_t adapterMode = 0;
-    status = changes_->GetULong(NetworkTag::kAdapterMode, &adapterMode);
-    if (adapterMode != AdapterMode::kTcpIp) {
+    if (ReadULong(changes_.Get(), NetworkTag::kAdapterMode) != AdapterMode::kTcpIp) {
         return;
     }
-    uint32_t mediaMode = 0;
-    status = changes_->GetULong(NetworkTag::kPreferredMediaMode, &mediaMode);
+    const uint32_t mediaMode = ReadULong(changes_.Get(), NetworkTag::kPreferredMediaMode);
     ThrowIfLibraryCallFailed(vq::targetcfg::network::SetDeviceSettings(
         deviceHandler_->GetDeviceIndex(), mediaMode, 0, 0));
 }

@@ -37,3 +37,8 @@ bool IsValidIPv4Text(const std::wstring& text, bool allowZero, bool allowLoopbac
     const uint32_t lastOctet = address & kLastOctetMask;
     return lastOctet != 0 && lastOctet != kLastOctetMask;
 }
+
+vq::dsc::osdep::IPAddress ZeroIPv4Address() {
+    const uint8_t zero[4] = {};
+    return vq::dsc::osdep::IPAddress(zero, sizeof(zero), vq::dsc::osdep::IPFamily::IPv4);
+}

@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <string>
 
+#include "vq/dsc/IPAddress.h"
+
 // The host-order value of 255.255.255.255, which is also what an unparsable text gives.
 constexpr uint32_t kIPv4Broadcast = 0xFFFFFFFF;
 constexpr uint32_t kIPv4Loopback = 0x7F000001;
@@ -17,3 +19,6 @@ bool IsValidIPv4Text(const std::wstring& text, bool allowZero, bool allowLoopbac
 
 // The host-order value of `text` as inet_addr parses it (kIPv4Broadcast when it does not parse).
 uint32_t ParseIPv4(const std::wstring& text);
+
+// The IPv4 address 0.0.0.0 (an address of family IPv4, unlike the unset address).
+vq::dsc::osdep::IPAddress ZeroIPv4Address();

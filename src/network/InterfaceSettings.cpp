@@ -2,6 +2,8 @@
 
 #include <string>
 
+#include "network/BagReading.h"
+#include "network/IPv4Text.h"
 #include "network/LibraryCall.h"
 #include "network/NetworkTags.h"
 #include "property/BagAccess.h"
@@ -43,11 +45,6 @@ bool RestartsOnModeSwitch(uint32_t mode) {
     return mode == AdapterMode::kDisabled || mode == 4 || mode == AdapterMode::kEtherCAT;
 }
 
-IPAddress ZeroIPv4Address() {
-    const uint8_t zero[4] = {};
-    return IPAddress(zero, sizeof(zero), vq::dsc::osdep::IPFamily::IPv4);
-}
-
 // True when the bag's preferred media mode differs from the adapter's current one.
 bool HasMediaModeChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
     uint32_t newMediaMode = 0;
@@ -69,17 +66,18 @@ bool HaveStaticAddressesChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
     const IPAddress newGateway = ReadAddress(bag, NetworkTag::kGateway);
     const IPAddress newDnsServer = ReadAddress(bag, NetworkTag::kDnsServer);
 
-    IPAddress address;
-    IPAddress mask;
-    // An adapter without an address yet has nothing to compare with: its unset address differs
-    // from any new one.
+    // The adapter's addresses start as 0.0.0.0, the value its properties show when the library
+    // has none, so reading those properties back is no change. An adapter without an address
+    // is no failure here: any new address differs from it.
+    IPAddress address = ZeroIPv4Address();
+    IPAddress mask = address;
     const int32_t addressStatus =
         network::GetIPAddressByIndex(deviceIndex, 0, address, mask, nullptr);
     if (addressStatus != vq::targetcfg::status::kNoAddress) {
         ThrowIfLibraryCallFailed(addressStatus);
     }
-    IPAddress gateway;
-    IPAddress dnsServer;
+    IPAddress gateway = ZeroIPv4Address();
+    IPAddress dnsServer = gateway;
     network::GetGatewayAddressByIndex(deviceIndex, gateway);
     network::GetDNSServerAddressByIndex(deviceIndex, dnsServer);
     return newAddress != address || newMask != mask || newGateway != gateway ||
@@ -101,8 +99,7 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
         return S_OK;
     }
 
-    uint32_t newMode = 0;
-    status = bag->GetULong(NetworkTag::kAdapterMode, &newMode);
+    const uint32_t newMode = ReadULong(bag, NetworkTag::kAdapterMode);
     uint32_t currentMode = 0;
     ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(deviceIndex, currentMode));
     if (newMode != currentMode && RestartsOnModeSwitch(newMode)) {
@@ -110,8 +107,7 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
         return S_OK;
     }
 
-    uint32_t newRequestMode = 0;
-    status = bag->GetULong(NetworkTag::kRequestMode, &newRequestMode);
+    const uint32_t newRequestMode = ReadULong(bag, NetworkTag::kRequestMode);
     uint32_t currentRequestMode = 0;
     ThrowIfLibraryCallFailed(
         network::GetDeviceTCPIPRequestModeByIndex(deviceIndex, currentRequestMode));
@@ -142,23 +138,20 @@ HRESULT ApplyInterfaceSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, boo
     if (bag == nullptr) {
         return E_POINTER;
     }
-    StatusHolder status;
     IPAddress address = ZeroIPv4Address();
     IPAddress mask = address;
     IPAddress gateway = address;
     IPAddress dnsServer = address;
     uint32_t requestMode = 0;
 
-    uint32_t mode = 0;
-    status = bag->GetULong(NetworkTag::kAdapterMode, &mode);
+    const uint32_t mode = ReadULong(bag, NetworkTag::kAdapterMode);
     if (mode == AdapterMode::kEtherCAT) {
         bool flag = false;
         BagGetBool(bag, NetworkTag::kEtherCATFlag, flag);
-        uint32_t masterId = 0;
-        status = bag->GetULong(NetworkTag::kEtherCATMasterId, &masterId);
+        const uint32_t masterId = ReadULong(bag, NetworkTag::kEtherCATMasterId);
         ThrowIfLibraryCallFailed(network::SetEtherCATSettings(deviceIndex, masterId, flag));
     } else if (AdapterMode::IsTcpIp(mode)) {
-        status = bag->GetULong(NetworkTag::kRequestMode, &requestMode);
+        requestMode = ReadULong(bag, NetworkTag::kRequestMode);
         if (requestMode == RequestMode::kStatic) {
             address = ReadAddress(bag, NetworkTag::kIPAddress);
             mask = ReadAddress(bag, NetworkTag::kSubnetMask);

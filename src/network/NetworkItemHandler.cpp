@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "items/ItemManagerBase.h"
+#include "network/IPv4Text.h"
 #include "network/LibraryCall.h"
 #include "network/NetworkTags.h"
 #include "property/BagAccess.h"
@@ -35,11 +36,6 @@ const PropertyTagSet& NetworkRefreshTags() {
         NetworkTag::kEtherCATFlag,     NetworkTag::kEtherCATMasterId,
     };
     return tags;
-}
-
-IPAddress ZeroIPv4Address() {
-    const uint8_t zero[4] = {};
-    return IPAddress(zero, sizeof(zero), vq::dsc::osdep::IPFamily::IPv4);
 }
 
 HRESULT SetAddressText(IuxSysPropertyBag* bag, uint32_t tag, const IPAddress& address) {

@@ -53,8 +53,7 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
             return S_OK;
         }
 
-        uint32_t newMode = 0;
-        status = changes->GetULong(NetworkTag::kAdapterMode, &newMode);
+        const uint32_t newMode = ReadULong(changes, NetworkTag::kAdapterMode);
         uint32_t currentMode = 0;
         ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(DeviceIndex(), currentMode));
         if (newMode != currentMode &&
@@ -64,8 +63,8 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
 
         if (NeedsInterfaceRestart()) {
             deviceHandler = CountedPtr<vq::targetcfg::IDeviceHandler>(Device());
-            status = changes->GetULong(NetworkTag::kAdapterMode, &newMode);
-            adapterDisabled = newMode == AdapterMode::kDisabled;
+            adapterDisabled =
+                ReadULong(changes, NetworkTag::kAdapterMode) == AdapterMode::kDisabled;
         }
 
         if (changed) {
@@ -78,10 +77,8 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
                         status = ApplyInterfaceSettings(DeviceIndex(), changes, wasPrimary);
                     }
                 } else if (tag == NetworkTag::kPreferredMediaMode) {
-                    uint32_t mediaMode = 0;
-                    status = changes->GetULong(tag, &mediaMode);
                     ThrowIfLibraryCallFailed(
-                        network::SetDeviceSettings(DeviceIndex(), mediaMode, 0, 0));
+                        network::SetDeviceSettings(DeviceIndex(), ReadULong(changes, tag), 0, 0));
                 }
             }
         }

@@ -1,6 +1,7 @@
 // NetworkItemHandler::ValidatePropertyChanges: which tags of a changes bag the network side
 // accepts, and the checks they pass through.
 #include "com/CountedPtr.h"
+#include "network/BagReading.h"
 #include "network/LibraryCall.h"
 #include "network/NetworkItemHandler.h"
 #include "network/NetworkSettingsValidation.h"
@@ -69,9 +70,7 @@ HRESULT NetworkItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* changes,
                 }
                 validated.insert(tag);
             } else if (tag == NetworkTag::kPreferredMediaMode) {
-                uint32_t mediaMode = 0;
-                status = changes->GetULong(tag, &mediaMode);
-                if (!IsAcceptedMediaMode(mediaMode)) {
+                if (!IsAcceptedMediaMode(ReadULong(changes, tag))) {
                     status = UX_E_VALUE_INVALID;
                 }
                 validated.insert(tag);

@@ -3,6 +3,7 @@
 #include <string>
 
 #include "network/AddressRules.h"
+#include "network/BagReading.h"
 #include "network/IPv4Text.h"
 #include "network/LibraryCall.h"
 #include "network/NetworkTags.h"
@@ -93,13 +94,9 @@ HRESULT ValidateNetworkSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, Cv
     if (bag == nullptr) {
         return E_POINTER;
     }
-    StatusHolder status;
-    uint32_t adapterMode = 0;
-    status = bag->GetULong(NetworkTag::kAdapterMode, &adapterMode);
+    const uint32_t adapterMode = ReadULong(bag, NetworkTag::kAdapterMode);
     if (adapterMode == AdapterMode::kEtherCAT) {
-        uint32_t masterId = 0;
-        status = bag->GetULong(NetworkTag::kEtherCATMasterId, &masterId);
-        if (masterId > kHighestMasterId) {
+        if (ReadULong(bag, NetworkTag::kEtherCATMasterId) > kHighestMasterId) {
             Reject(message, kMasterIdOutOfRange, UX_E_VALUE_INVALID);
         }
         return S_OK;
@@ -108,8 +105,7 @@ HRESULT ValidateNetworkSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, Cv
         return S_OK;
     }
 
-    uint32_t requestMode = 0;
-    status = bag->GetULong(NetworkTag::kRequestMode, &requestMode);
+    const uint32_t requestMode = ReadULong(bag, NetworkTag::kRequestMode);
     if (!IsAcceptedRequestMode(requestMode)) {
         ThrowStatus(UX_E_VALUE_INVALID);
     }
