@@ -71,18 +71,6 @@ HRESULT CuxNetConfigExpert::SetPlugPlayCallback(IUnknown* /*callback*/) {
     return E_NOTIMPL;
 }
 
-HRESULT CuxNetConfigExpert::GetImportableTags(const wchar_t* /*item*/,
-                                              IuxSysEnumPropertyTag** /*tags*/) {
-    return E_NOTIMPL;
-}
-
-HRESULT CuxNetConfigExpert::GetMatchingItems(IuxSysPropertyBag* /*description*/,
-                                             CvqBStr* /*exactName*/,
-                                             IuxSysEnumStringList** /*names*/,
-                                             void** /*reserved*/) {
-    return E_NOTIMPL;
-}
-
 HRESULT CuxNetConfigExpert::ReservedImportExport5() {
     return E_NOTIMPL;
 }

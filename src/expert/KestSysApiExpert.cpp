@@ -1,6 +1,8 @@
 #include "expert/KestSysApiExpert.h"
 
 #include "expert/HostStringResult.h"
+#include "support/CurrentExceptionToStatus.h"
+#include "support/Sysroot.h"
 #include "support/TraceGate.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
@@ -11,6 +13,7 @@ constexpr CLSID kKestExpertClassId = {
     0x999d9aa4, 0x5475, 0x4ca7, {0xa5, 0x60, 0x93, 0xc5, 0x1b, 0x5b, 0xfc, 0xeb}};
 }  // namespace
 
+// Members go in reverse order of declaration: the callback, then the firmware update.
 KestSysApiExpert::~KestSysApiExpert() = default;
 
 HRESULT KestSysApiExpert::GetExpertClassId(GUID* classId) {
@@ -27,15 +30,44 @@ HRESULT KestSysApiExpert::GetExpertDisplayName(CvqBStr* name) {
     return StoreNewHostString(L"KEST Configuration", name);
 }
 
-HRESULT KestSysApiExpert::PrepareFirmwareUpdate(const wchar_t* /*item*/, uint32_t /*flags*/,
-                                                uint32_t /*imageSize*/, CvqBStr* /*updateId*/) {
-    return E_NOTIMPL;
+HRESULT KestSysApiExpert::Initialize() {
+    const HRESULT status = CuxNetConfigExpert::Initialize();
+    if (FAILED(status)) {
+        return status;
+    }
+    try {
+        firmwareUpdate_.SetStagingPath(kest::paths::FirmwareStagingFile());
+    } catch (...) {
+        const HRESULT failure = CurrentExceptionToStatus();
+        CuxNetConfigExpert::Uninitialize();
+        return failure;
+    }
+    return S_OK;
 }
 
-HRESULT KestSysApiExpert::StartFirmwareUpdate(const wchar_t* /*item*/, const wchar_t* /*updateId*/,
+HRESULT KestSysApiExpert::Uninitialize() {
+    const HRESULT status = CuxNetConfigExpert::Uninitialize();
+    const HRESULT waited = firmwareUpdate_.WaitForWorker();
+    return FAILED(waited) ? waited : status;
+}
+
+HRESULT KestSysApiExpert::SetPlugPlayCallback(IUnknown* callback) {
+    TraceIfEnabled("KestSysApiExpert::SetPlugPlayCallback()", kTraceEntry);
+    plugPlayCallback_ = CountedPtr<IUnknown>(callback);
+    return S_OK;
+}
+
+HRESULT KestSysApiExpert::PrepareFirmwareUpdate(const wchar_t* /*item*/, uint32_t /*flags*/,
+                                                uint32_t imageSize, CvqBStr* updateId) {
+    TraceIfEnabled("KestSysApiExpert::PrepareFirmwareUpdate()", kTraceEntry);
+    return firmwareUpdate_.Prepare(imageSize, updateId);
+}
+
+HRESULT KestSysApiExpert::StartFirmwareUpdate(const wchar_t* /*item*/, const wchar_t* updateId,
                                               uint32_t /*flags*/, void* /*reserved*/,
-                                              IUnknown* /*imageSource*/) {
-    return E_NOTIMPL;
+                                              IUnknown* imageSource) {
+    TraceIfEnabled("KestSysApiExpert::StartFirmwareUpdate()", kTraceEntry);
+    return firmwareUpdate_.Start(updateId, imageSource);
 }
 
 HRESULT KestSysApiExpert::ReservedFirmware5() {
@@ -46,9 +78,10 @@ HRESULT KestSysApiExpert::ReservedFirmware6() {
     return E_NOTIMPL;
 }
 
-HRESULT KestSysApiExpert::GetFirmwareUpdateStatus(const wchar_t* /*item*/, int32_t* /*state*/,
-                                                  int32_t* /*percent*/) {
-    return E_NOTIMPL;
+HRESULT KestSysApiExpert::GetFirmwareUpdateStatus(const wchar_t* /*item*/, int32_t* state,
+                                                  int32_t* percent) {
+    TraceIfEnabled("KestSysApiExpert::GetFirmwareUpdateStatus()", kTraceEntry);
+    return firmwareUpdate_.GetStatus(state, percent);
 }
 
 HRESULT KestSysApiExpert::HandleFrameworkNotification(uint32_t /*notification*/,

@@ -2,8 +2,10 @@
 // framework notifications. Created only as CVQComObject<KestSysApiExpert>.
 #pragma once
 
+#include "com/CountedPtr.h"
 #include "com/InterfaceMap.h"
 #include "expert/CuxNetConfigExpert.h"
+#include "expert/FirmwareUpdater.h"
 #include "uxsys/Expert.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
@@ -26,7 +28,18 @@ class KestSysApiExpert : public CuxNetConfigExpert,
     HRESULT GetExpertClassId(GUID* classId) override;
     HRESULT GetExpertDisplayName(CvqBStr* name) override;
 
-    // IuxSysExpertFirmware (not available yet: E_NOTIMPL); slots 5 and 6 are unsupported.
+    // The framework's Initialize, then the firmware staging path. A failure to set the path
+    // undoes the framework's part.
+    HRESULT Initialize() override;
+    // The framework's Uninitialize, then waits for a running firmware update to end. E_FAIL,
+    // without waiting, on the update's own worker thread.
+    HRESULT Uninitialize() override;
+
+    // Keeps one reference to `callback` (null drops the one held) and never calls it.
+    HRESULT SetPlugPlayCallback(IUnknown* callback) override;
+
+    // IuxSysExpertFirmware: announce, start and follow an update of the controller's firmware
+    // (the item, flag and reserved arguments are not used); slots 5 and 6 are unsupported.
     HRESULT PrepareFirmwareUpdate(const wchar_t* item, uint32_t flags, uint32_t imageSize,
                                   CvqBStr* updateId) override;
     HRESULT StartFirmwareUpdate(const wchar_t* item, const wchar_t* updateId, uint32_t flags,
@@ -40,7 +53,12 @@ class KestSysApiExpert : public CuxNetConfigExpert,
 
   protected:
     KestSysApiExpert() = default;
+    // Releases the plug-and-play callback, then waits for a running firmware update to end.
     ~KestSysApiExpert() override;
+
+  private:
+    FirmwareUpdater firmwareUpdate_;
+    CountedPtr<IUnknown> plugPlayCallback_;
 };
 
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100
