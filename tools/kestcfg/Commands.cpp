@@ -12,6 +12,9 @@ const std::vector<CommandDescription>& AllCommands() {
          ExpertUse::kItems, &RunRefresh},
         {"set", "set ITEM NAME=VALUE...", "validate and persist changed properties of ITEM", 2,
          SIZE_MAX, ExpertUse::kItems, &RunSet},
+        {"firmware", "firmware ITEM IMAGE",
+         "install the firmware image file IMAGE on ITEM, showing the update's progress", 2, 2,
+         ExpertUse::kItems, &RunFirmware},
         {"sim", "sim init DIR", "create a demo controller under DIR (use DIR as the sysroot)", 2, 2,
          ExpertUse::kNone, &RunSim},
     };

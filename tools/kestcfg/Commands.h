@@ -47,4 +47,5 @@ void RunItems(CommandContext& context);
 void RunGet(CommandContext& context);
 void RunRefresh(CommandContext& context);
 void RunSet(CommandContext& context);
+void RunFirmware(CommandContext& context);
 void RunSim(CommandContext& context);
