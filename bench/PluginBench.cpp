@@ -1,0 +1,167 @@
+// The plug-in as a host drives it: GetPropertiesOfItem and ValidatePropertyChanges of both items.
+// `--library=simulated` (the default) runs it on the simulated controller library;
+// `--library=double` loads the in-memory library double first, so that the plug-in binds to it
+// through the shared soname and the figures show the plug-in's own cost.
+#include <benchmark/benchmark.h>
+#include <dlfcn.h>
+
+#include <cstdio>
+#include <cstring>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#include "PluginHost.h"
+
+namespace {
+
+using kest_bench::kEthernetItemName;
+using kest_bench::kSystemItemName;
+
+constexpr uint32_t kHostNameTag = 0x0101F000;
+constexpr uint32_t kCommentTag = 0x0103D000;
+constexpr uint32_t kLocaleTag = 0x0D11D000;
+constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
+constexpr uint32_t kIPAddressTag = 0x0D107000;
+
+// Releases a host-interface pointer.
+struct Release {
+    void operator()(IUnknown* object) const { object->Release(); }
+};
+using BagPtr = std::unique_ptr<IuxSysPropertyBag2, Release>;
+
+// The item's properties as a changes bag with nothing modified yet.
+BagPtr ChangesOf(IuxSysExpert3& expert, const wchar_t* item) {
+    IuxSysPropertyBag* properties = nullptr;
+    if (expert.GetPropertiesOfItem(item, &properties) != S_OK) {
+        throw std::runtime_error("GetPropertiesOfItem failed");
+    }
+    IuxSysPropertyBag2* changes = nullptr;
+    const HRESULT status =
+        properties->QueryInterface(IID_IuxSysPropertyBag2, reinterpret_cast<void**>(&changes));
+    properties->Release();
+    if (status != S_OK) {
+        throw std::runtime_error("the bag has no IuxSysPropertyBag2");
+    }
+    changes->ClearAllModified();
+    return BagPtr(changes);
+}
+
+// Validates `changes` once; the status, with the enumerator and message given back.
+HRESULT Validate(IuxSysExpert3& expert, const wchar_t* item, IuxSysPropertyBag* changes) {
+    IuxSysEnumPropertyTag* validated = nullptr;
+    CvqBStr message = nullptr;
+    const HRESULT status = expert.ValidatePropertyChanges(item, changes, &validated, &message);
+    if (validated != nullptr) {
+        validated->Release();
+    }
+    CvqBStrFree(message);
+    return status;
+}
+
+void GetProperties(benchmark::State& state, IuxSysExpert3* expert, const wchar_t* item) {
+    for (auto _ : state) {
+        IuxSysPropertyBag* properties = nullptr;
+        if (expert->GetPropertiesOfItem(item, &properties) != S_OK) {
+            state.SkipWithError("GetPropertiesOfItem failed");
+            break;
+        }
+        properties->Release();
+    }
+}
+
+void ValidateChanges(benchmark::State& state, IuxSysExpert3* expert, const wchar_t* item,
+                     IuxSysPropertyBag* changes) {
+    for (auto _ : state) {
+        if (Validate(*expert, item, changes) != S_OK) {
+            state.SkipWithError("ValidatePropertyChanges failed");
+            break;
+        }
+    }
+}
+
+// Takes "--library=NAME" out of the arguments; "simulated" when absent.
+std::string TakeLibraryChoice(int& argc, char** argv) {
+    std::string library = "simulated";
+    constexpr char kOption[] = "--library=";
+    int kept = 0;
+    for (int i = 0; i < argc; ++i) {
+        if (std::strncmp(argv[i], kOption, sizeof kOption - 1) == 0) {
+            library = argv[i] + sizeof kOption - 1;
+        } else {
+            argv[kept++] = argv[i];
+        }
+    }
+    argc = kept;
+    return library;
+}
+
+int Run(int argc, char** argv) {
+    const std::string library = TakeLibraryChoice(argc, argv);
+    if (library != "simulated" && library != "double") {
+        std::fprintf(stderr, "unknown --library=%s (simulated or double)\n", library.c_str());
+        return 2;
+    }
+    // Loaded first and globally, the double is the libvqtargetcfg.so.1 the plug-in binds to.
+    void* libraryDouble = nullptr;
+    if (library == "double") {
+        libraryDouble = dlopen(KEST_LIBRARY_DOUBLE_PATH, RTLD_NOW | RTLD_GLOBAL);
+        if (libraryDouble == nullptr) {
+            std::fprintf(stderr, "cannot load the library double: %s\n", dlerror());
+            return 1;
+        }
+    }
+    kest::test::TempSysroot sysroot;
+    kest_bench::WriteControllerSysroot(sysroot);
+    kest_bench::LoadedExpert loaded;
+    IuxSysExpert3& expert = loaded.Expert();
+
+    BagPtr systemChanges = ChangesOf(expert, kSystemItemName);
+    systemChanges->SetString(kHostNameTag, L"kest-2");
+    systemChanges->SetString(kCommentTag, L"second controller");
+    systemChanges->SetString(kLocaleTag, L"de");
+    systemChanges->SetString(kOlsonTimeZoneTag, L"America/Chicago");
+    BagPtr ethernetChanges = ChangesOf(expert, kEthernetItemName);
+    ethernetChanges->SetString(kIPAddressTag, L"192.168.1.20");
+    if (Validate(expert, kSystemItemName, systemChanges.get()) != S_OK ||
+        Validate(expert, kEthernetItemName, ethernetChanges.get()) != S_OK) {
+        std::fprintf(stderr, "the benchmark's changes do not validate\n");
+        return 1;
+    }
+    // The simulated library logs every call; the double must not have been bypassed.
+    const bool simulatorCalled = sysroot.Exists("/var/lib/vqtargetcfg/calls.log");
+    if (simulatorCalled != (library == "simulated")) {
+        std::fprintf(stderr, "the plug-in is not bound to the %s library\n", library.c_str());
+        return 1;
+    }
+
+    const std::string suffix = "/" + library;
+    benchmark::RegisterBenchmark(("Plugin_GetPropertiesOfItem/system" + suffix).c_str(),
+                                 GetProperties, &expert, kSystemItemName);
+    benchmark::RegisterBenchmark(("Plugin_GetPropertiesOfItem/eth0" + suffix).c_str(),
+                                 GetProperties, &expert, kEthernetItemName);
+    benchmark::RegisterBenchmark(("Plugin_ValidatePropertyChanges/system" + suffix).c_str(),
+                                 ValidateChanges, &expert, kSystemItemName, systemChanges.get());
+    benchmark::RegisterBenchmark(("Plugin_ValidatePropertyChanges/eth0" + suffix).c_str(),
+                                 ValidateChanges, &expert, kEthernetItemName,
+                                 ethernetChanges.get());
+    benchmark::Initialize(&argc, argv);
+    if (benchmark::ReportUnrecognizedArguments(argc, argv)) {
+        return 2;
+    }
+    benchmark::RunSpecifiedBenchmarks();
+    benchmark::Shutdown();
+    return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return Run(argc, argv);
+    } catch (const std::exception& failure) {
+        std::fprintf(stderr, "kest_bench_plugin: %s\n", failure.what());
+        return 1;
+    }
+}
