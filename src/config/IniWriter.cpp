@@ -37,8 +37,12 @@ size_t PieceLength(std::string_view rest, size_t limit, char splitCharacter, boo
             return true;
         }
         std::string_view remainder = rest.substr(cut);
+        // The last piece ends with the value's last character, so a remainder starting with that
+        // same quote character would be read back without its quotes once it is the last piece.
+        bool enclosedLater = remainder.front() == rest.back() &&
+                             (remainder.front() == '"' || remainder.front() == '\'');
         return ReadsBackUnquoted(rest.substr(0, cut)) && !IsIniSpace(remainder.front()) &&
-               (remainder.size() > limit || ReadsBackUnquoted(remainder));
+               !enclosedLater && (remainder.size() > limit || ReadsBackUnquoted(remainder));
     };
     if (splitCharacter != 0) {
         for (size_t cut = limit; cut > 0; --cut) {
