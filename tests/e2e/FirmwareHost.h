@@ -82,6 +82,9 @@ class FirmwareHostTest : public ExpertHostTest {
   protected:
     void SetUp() override {
         WriteControllerState(kSystemState);
+        // The tracer keeps the first log location it is given for the whole process: without
+        // outputs, these in-process sessions leave it to the tests that check the log.
+        sysroot.WriteFile("/etc/korvane/share/vqsysdiag.ini", "[vqsyscfg]\nTarget = 0\n");
         sysroot.MakeDirectory(kStagingDirectory);
         sysroot.MakeDirectory("/var/run/firmware_update");
         sysroot.MakeDirectory("/tool");
