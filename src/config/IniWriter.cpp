@@ -9,6 +9,8 @@
 #include <cstdlib>
 #include <vector>
 
+#include "config/IniReader.h"
+
 namespace kest_ini {
 namespace {
 
@@ -176,9 +178,7 @@ bool WriteAll(int descriptor, std::string_view text) {
 
 int FormatIni(const IniDocument& document, const WriteOptions& options, std::string& out) {
     bool comments = (options.flags & kIniWriteComments) != 0;
-    if ((options.flags & kIniWriteByteOrderMark) != 0) {
-        out += "\xEF\xBB\xBF";
-    }
+    const size_t start = out.size();
     for (size_t i = 0; i < document.SectionCount(); ++i) {
         const IniSection& section = document.SectionAt(i);
         if (comments) {
@@ -206,6 +206,12 @@ int FormatIni(const IniDocument& document, const WriteOptions& options, std::str
     }
     if (comments) {
         AppendLines(document.trailingComments, out);
+    }
+    // Text that itself starts like a byte-order mark (a name or comment of the unnamed section)
+    // gets a UTF-8 mark in front, so that loading neither drops those bytes nor refuses the file.
+    if ((options.flags & kIniWriteByteOrderMark) != 0 ||
+        TextStart(std::string_view(out).substr(start)) != 0) {
+        out.insert(start, "\xEF\xBB\xBF");
     }
     return 0;
 }
