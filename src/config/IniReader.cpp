@@ -20,6 +20,28 @@ bool IsLineEnd(char c) {
     return c == '\n' || c == '\r' || c == '\0';
 }
 
+// The number of a key named base " Line" digits, or false for any other name.
+bool LineNumber(std::string_view name, uint32_t* number, size_t* baseLength) {
+    size_t digits = name.size();
+    while (digits > 0 && name[digits - 1] >= '0' && name[digits - 1] <= '9') {
+        --digits;
+    }
+    if (digits == name.size() || digits < kLineSuffix.size() ||
+        name.substr(digits - kLineSuffix.size(), kLineSuffix.size()) != kLineSuffix) {
+        return false;
+    }
+    uint64_t value = 0;
+    for (size_t i = digits; i < name.size(); ++i) {
+        value = value * 10 + static_cast<uint64_t>(name[i] - '0');
+        if (value > UINT32_MAX) {
+            return false;
+        }
+    }
+    *number = static_cast<uint32_t>(value);
+    *baseLength = digits - kLineSuffix.size();
+    return true;
+}
+
 // Builds a document line by line.
 class Parser {
   public:
@@ -124,28 +146,6 @@ class Parser {
         pending_.clear();
     }
 
-    // The number of a key named base " Line" digits, or false for any other name.
-    static bool LineNumber(std::string_view name, uint32_t* number, size_t* baseLength) {
-        size_t digits = name.size();
-        while (digits > 0 && name[digits - 1] >= '0' && name[digits - 1] <= '9') {
-            --digits;
-        }
-        if (digits == name.size() || digits < kLineSuffix.size() ||
-            name.substr(digits - kLineSuffix.size(), kLineSuffix.size()) != kLineSuffix) {
-            return false;
-        }
-        uint64_t value = 0;
-        for (size_t i = digits; i < name.size(); ++i) {
-            value = value * 10 + static_cast<uint64_t>(name[i] - '0');
-            if (value > UINT32_MAX) {
-                return false;
-            }
-        }
-        *number = static_cast<uint32_t>(value);
-        *baseLength = digits - kLineSuffix.size();
-        return true;
-    }
-
     // Joins each run of keys "x Line1", "x Line2", ... into one key "x".
     void JoinLineKeys(IniSection& section) const {
         uint32_t number = 0;
@@ -198,6 +198,12 @@ class ScopedDescriptor {
 };
 
 }  // namespace
+
+bool ContinuesSplitValue(std::string_view keyName) {
+    uint32_t number = 0;
+    size_t baseLength = 0;
+    return LineNumber(keyName, &number, &baseLength) && number != 1;
+}
 
 void ParseIni(std::string_view text, uint32_t readFlags, IniDocument& document) {
     Parser parser(readFlags, document);

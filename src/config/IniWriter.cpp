@@ -82,11 +82,13 @@ void AppendKeyLine(std::string_view name, std::string_view separator, char quote
     out += '\n';
 }
 
-int AppendKey(const IniKey& key, const WriteOptions& options, std::string& out) {
+// Writes the key line, split over numbered " Line" keys when it is too long and `splittable`.
+int AppendKey(const IniKey& key, const WriteOptions& options, bool splittable, std::string& out) {
     std::string_view separator = (options.flags & kIniWriteSpacedSeparator) != 0 ? " = " : "=";
     int quoteLength = key.quote != 0 ? 2 : 0;
     size_t lineLength = key.name.size() + separator.size() + key.value.size() + quoteLength;
-    if (options.maxLineLength <= 0 || lineLength <= static_cast<size_t>(options.maxLineLength)) {
+    if (!splittable || options.maxLineLength <= 0 ||
+        lineLength <= static_cast<size_t>(options.maxLineLength)) {
         AppendKeyLine(key.name, separator, key.quote, key.value, out);
         return 0;
     }
@@ -194,7 +196,10 @@ int FormatIni(const IniDocument& document, const WriteOptions& options, std::str
             if (comments) {
                 AppendLines(key.comments, out);
             }
-            int result = AppendKey(key, options, out);
+            // Pieces followed by a key that reads as a further piece would take that key in.
+            bool splittable =
+                k + 1 == section.keys.Size() || !ContinuesSplitValue(section.keys.At(k + 1).name);
+            int result = AppendKey(key, options, splittable, out);
             if (result < 0) {
                 return result;
             }

@@ -61,3 +61,26 @@ TEST(IniReadBackMarkTest, NamesThatLookLikeAByteOrderMarkReadBack) {
         }
     }
 }
+
+// A value followed by a key whose name reads as a further piece of it (" Line" and a number
+// other than 1) is written on one line, so that key is not joined to it when loading.
+TEST(IniReadBackPiecesTest, KeysNamedLikePiecesStayKeys) {
+    TempSysroot dir;
+    const std::string longValue(60, 'v');
+    IniTextPtr ini(IniText_Create());
+    IniText_SetRaw(ini.get(), "S", "a", longValue.c_str(), 0);
+    IniText_SetRaw(ini.get(), "S", "b Line2", "other key", 0);
+    IniText_SetRaw(ini.get(), "S", "c", longValue.c_str(), 0);
+    IniText_SetRaw(ini.get(), "S", "d", longValue.c_str(), 0);
+    IniText_SetRaw(ini.get(), "S", "d Line0009", "literal", 0);
+    const std::string saved = SavedText(dir, ini.get(), 0, 40);
+    EXPECT_NE(saved.find("\na=" + longValue + "\n"), std::string::npos) << saved;
+    EXPECT_NE(saved.find("c Line0002="), std::string::npos) << saved;
+    IniTextPtr loaded = LoadFromBytes(dir, saved);
+    EXPECT_EQ(ValueOf(loaded.get(), "S", "a"), longValue);
+    EXPECT_EQ(ValueOf(loaded.get(), "S", "b Line2"), "other key");
+    EXPECT_EQ(ValueOf(loaded.get(), "S", "c"), longValue);
+    EXPECT_EQ(ValueOf(loaded.get(), "S", "d"), longValue);
+    EXPECT_EQ(ValueOf(loaded.get(), "S", "d Line0009"), "literal");
+    EXPECT_EQ(IniText_GetKeyCount(loaded.get(), "S"), 5);
+}
