@@ -125,6 +125,10 @@ bool IPAddress::TryParse(const std::string& text) {
     if (text.empty()) {
         return true;
     }
+    // The C library parsers stop at a zero character and would ignore whatever follows it.
+    if (text.find('\0') != std::string::npos) {
+        return false;
+    }
     // Each attempt fills its own value, so a failed one leaves nothing behind.
     IPAddress ipv6;
     if (text.find(':') != std::string::npos && ParseIPv6(text, ipv6.bytes, ipv6.zoneIndex)) {
