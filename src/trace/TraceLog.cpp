@@ -37,11 +37,9 @@ int OpenLogFile(const std::string& path) {
     return descriptor;
 }
 
-// Writes the line and its line feed with one call, so that appends of other processes cannot
+// Writes the record (whole lines) with one call, so that appends of other processes cannot
 // split it.
-void WriteLine(int descriptor, const char* line) {
-    std::string record(line);
-    record += '\n';
+void WriteRecord(int descriptor, const std::string& record) {
     const char* data = record.data();
     size_t left = record.size();
     while (left > 0) {
@@ -99,11 +97,28 @@ const char* TraceLog::Append(const char* line, uint32_t threshold) {
         aborted_ = true;
         line = kAbortMessage;
     }
-    WriteLine(descriptor_, line);
+    WriteRecord(descriptor_, std::string(line) + '\n');
     if (aborted_) {
         Close();
     }
     return line;
+}
+
+void TraceLog::AppendTwoLines(const char* first, const char* second) {
+    if (path_.empty()) {
+        return;
+    }
+    if (descriptor_ < 0 && !aborted_) {
+        descriptor_ = OpenLogFile(path_);
+    }
+    if (descriptor_ < 0) {
+        return;
+    }
+    std::string record(first);
+    record += '\n';
+    record += second;
+    record += '\n';
+    WriteRecord(descriptor_, record);
 }
 
 void TraceLog::Close() {

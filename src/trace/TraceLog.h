@@ -33,6 +33,9 @@ class TraceLog {
     // was open. Returns what the other outputs should write: the line, or the abort message
     // that replaced it. A file that cannot be opened costs only the line.
     const char* Append(const char* line, uint32_t threshold);
+    // Appends two lines with one write, as two Appends without a threshold would: nothing when
+    // the log has no location, was stopped or cannot be opened.
+    void AppendTwoLines(const char* first, const char* second);
 
     // Closes the file if open; a later Append opens it again unless the log was stopped.
     void Close();

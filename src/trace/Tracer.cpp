@@ -67,13 +67,8 @@ std::string BuildLogFileName() {
     return name;
 }
 
-// Writes one line to every chosen output.
-void WriteLine(const char* line) {
-    TracerState& state = State();
-    uint32_t outputs = state.outputs.load(std::memory_order_relaxed);
-    if ((outputs & kTraceToLogFile) != 0) {
-        line = state.log.Append(line, state.threshold.load(std::memory_order_relaxed));
-    }
+// Writes a line to standard error and standard output, as far as they are chosen outputs.
+void WriteToStandardStreams(uint32_t outputs, const char* line) {
     if ((outputs & kTraceToStandardError) != 0) {
         std::fprintf(stderr, "%s\n", line);
     }
@@ -81,6 +76,34 @@ void WriteLine(const char* line) {
         std::fprintf(stdout, "%s\n", line);
         std::fflush(stdout);
     }
+}
+
+// Writes one line to every chosen output.
+void WriteLine(const char* line) {
+    TracerState& state = State();
+    uint32_t outputs = state.outputs.load(std::memory_order_relaxed);
+    if ((outputs & kTraceToLogFile) != 0) {
+        line = state.log.Append(line, state.threshold.load(std::memory_order_relaxed));
+    }
+    WriteToStandardStreams(outputs, line);
+}
+
+// Writes two lines to every chosen output. Without a free-space check to run between them, the
+// log file receives both with one write: a system call fewer for every record.
+void WriteTwoLines(const char* first, const char* second) {
+    TracerState& state = State();
+    uint32_t outputs = state.outputs.load(std::memory_order_relaxed);
+    const bool toLogFile = (outputs & kTraceToLogFile) != 0;
+    if (toLogFile && state.threshold.load(std::memory_order_relaxed) != 0) {
+        WriteLine(first);
+        WriteLine(second);
+        return;
+    }
+    if (toLogFile) {
+        state.log.AppendTwoLines(first, second);
+    }
+    WriteToStandardStreams(outputs, first);
+    WriteToStandardStreams(outputs, second);
 }
 
 }  // namespace
@@ -119,12 +142,21 @@ void TraceLine(char kind, const char* text, bool withStamp) {
     }
     char line[kLineBufferSize];
     std::snprintf(line, sizeof line, "%c %s", kind, text != nullptr ? text : "");
-    WriteLine(line);
-    if (withStamp) {
-        std::snprintf(line, sizeof line, "  Thread = 0x%lX, Time = %s",
-                      static_cast<unsigned long>(pthread_self()), LocalTimeText(3).c_str());
+    if (!withStamp) {
         WriteLine(line);
+        return;
     }
+    std::string time;
+    try {
+        time = LocalTimeText(3);
+    } catch (...) {
+        WriteLine(line);  // the text line goes out even when the time cannot be told
+        throw;
+    }
+    char stamp[kLineBufferSize];
+    std::snprintf(stamp, sizeof stamp, "  Thread = 0x%lX, Time = %s",
+                  static_cast<unsigned long>(pthread_self()), time.c_str());
+    WriteTwoLines(line, stamp);
 }
 
 uint32_t GetTraceMask() {

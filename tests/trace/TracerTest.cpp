@@ -128,6 +128,21 @@ TEST(TracerTest, ThresholdZeroNeverMeasuresAndTheAbortMessageEndsTheFile) {
     });
 }
 
+TEST(TracerTest, WithAThresholdEveryLineOfARecordIsMeasuredBeforeItIsWritten) {
+    RunInChild([] {
+        TracerFixture fixture;
+        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        reportedFreeBytes = 4096;
+        InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), 4096);
+        TraceIfEnabled("record", kTraceErrors);
+        EXPECT_EQ(measurements, 3);  // before opening, then before each of the two lines
+        std::vector<std::string> lines = LinesOf(fixture.LogText());
+        ASSERT_EQ(lines.size(), 2u);
+        EXPECT_EQ(lines[0], "  record");
+        EXPECT_TRUE(std::regex_match(lines[1], kStampLine)) << lines[1];
+    });
+}
+
 TEST(TracerTest, FreeSpaceBeyondThirtyTwoBitsIsMeasuredWhole) {
     TempSysroot sysroot;
     struct statvfs status;
