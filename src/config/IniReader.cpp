@@ -6,6 +6,7 @@
 
 #include <cerrno>
 #include <string>
+#include <unordered_map>
 #include <utility>
 #include <vector>
 
@@ -176,7 +177,38 @@ class Parser {
             }
             joined.push_back(std::move(first));
         }
+        if (document_.UniqueNames()) {
+            joined = MergeRepeatedNames(std::move(joined));
+        }
         document_.ResetKeys(section, std::move(joined));
+    }
+
+    // Under unique names a joined run may take the name of another key. As with a repeated key
+    // line, the first key of the name stays in place with the later value, quote mark and line,
+    // and gains the later key's comments.
+    std::vector<std::unique_ptr<IniKey>> MergeRepeatedNames(
+        std::vector<std::unique_ptr<IniKey>> keys) const {
+        NameRules rules(document_.CaseSensitive());
+        std::unordered_map<std::string_view, IniKey*, NameRules, NameRules> firstOfName(
+            keys.size(), rules, rules);
+        std::vector<std::unique_ptr<IniKey>> merged;
+        merged.reserve(keys.size());
+        for (std::unique_ptr<IniKey>& key : keys) {
+            auto found = firstOfName.find(key->name);
+            if (found == firstOfName.end()) {
+                firstOfName.emplace(key->name, key.get());
+                merged.push_back(std::move(key));
+                continue;
+            }
+            IniKey& first = *found->second;
+            first.value = std::move(key->value);
+            first.quote = key->quote;
+            first.line = key->line;
+            first.comments.insert(first.comments.end(),
+                                  std::make_move_iterator(key->comments.begin()),
+                                  std::make_move_iterator(key->comments.end()));
+        }
+        return merged;
     }
 
     uint32_t flags_;
