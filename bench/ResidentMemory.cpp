@@ -1,8 +1,6 @@
 // Measures what the plug-in adds to a host's resident memory: the resident set before dlopen,
 // after loading the plug-in (with the simulated controller library it links) and after the
 // factory and Initialize, in a temporary sysroot. Prints one JSON object, sizes in KiB.
-#include <unistd.h>
-
 #include <cstdio>
 #include <fstream>
 #include <stdexcept>
@@ -12,22 +10,24 @@
 
 namespace {
 
-// The resident set of this process in KiB, from the kernel's summary of its mappings.
-long ResidentKiB() {
+struct Resident {
+    long totalKiB = 0;
+    long anonymousKiB = 0;  // heap, stacks and written data pages; the rest maps files
+};
+
+// The resident set of this process, from the kernel's summary of its mappings.
+Resident MeasureResident() {
     std::ifstream rollup("/proc/self/smaps_rollup");
+    Resident resident;
+    bool found = false;
     for (std::string line; std::getline(rollup, line);) {
-        long kib = 0;
-        if (std::sscanf(line.c_str(), "Rss: %ld kB", &kib) == 1) {
-            return kib;
-        }
+        found = std::sscanf(line.c_str(), "Rss: %ld kB", &resident.totalKiB) == 1 || found;
+        std::sscanf(line.c_str(), "Anonymous: %ld kB", &resident.anonymousKiB);
     }
-    std::ifstream statm("/proc/self/statm");
-    long sizePages = 0;
-    long residentPages = 0;
-    if (!(statm >> sizePages >> residentPages)) {
-        throw std::runtime_error("cannot read the resident set size");
+    if (!found) {
+        throw std::runtime_error("cannot read /proc/self/smaps_rollup");
     }
-    return residentPages * (sysconf(_SC_PAGESIZE) / 1024);
+    return resident;
 }
 
 }  // namespace
@@ -36,12 +36,12 @@ int main() {
     try {
         kest::test::TempSysroot sysroot;
         kest_bench::WriteControllerSysroot(sysroot);
-        const long before = ResidentKiB();
-        long afterInitialize = 0;
-        long afterProperties = 0;
+        const Resident before = MeasureResident();
+        Resident afterInitialize;
+        Resident afterProperties;
         {
             kest_bench::LoadedExpert loaded;
-            afterInitialize = ResidentKiB();
+            afterInitialize = MeasureResident();
             for (const wchar_t* item :
                  {kest_bench::kSystemItemName, kest_bench::kEthernetItemName}) {
                 IuxSysPropertyBag* properties = nullptr;
@@ -50,11 +50,13 @@ int main() {
                 }
                 properties->Release();
             }
-            afterProperties = ResidentKiB();
+            afterProperties = MeasureResident();
         }
         std::printf(
-            "{\"before_kib\": %ld, \"after_initialize_kib\": %ld, \"after_properties_kib\": %ld}\n",
-            before, afterInitialize, afterProperties);
+            "{\"before_kib\": %ld, \"after_initialize_kib\": %ld, \"after_properties_kib\": %ld, "
+            "\"anonymous_added_by_initialize_kib\": %ld}\n",
+            before.totalKiB, afterInitialize.totalKiB, afterProperties.totalKiB,
+            afterInitialize.anonymousKiB - before.anonymousKiB);
         return 0;
     } catch (const std::exception& failure) {
         std::fprintf(stderr, "kest_resident_memory: %s\n", failure.what());

@@ -112,6 +112,7 @@ def main():
             verdict(size <= 512 * 1024))
     added = memory["after_initialize_kib"] - memory["before_kib"]
     row("Resident memory added by load + `Initialize`", f"{added} KiB",
+        f"{memory['anonymous_added_by_initialize_kib']} KiB of it anonymous (heap, data); "
         f"host before load {memory['before_kib']} KiB; after both items' properties "
         f"+{memory['after_properties_kib'] - memory['before_kib']} KiB", "–", "< 1024 KiB",
         verdict(added < 1024))
