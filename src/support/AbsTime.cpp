@@ -54,9 +54,10 @@ std::string DecimalPointText(DecimalPoint choice) {
 }
 
 std::tm BreakDown(int64_t seconds, bool utc) {
-    const std::time_t unixTime =
-        SafeInteger<std::time_t>(SafeInteger<int64_t>(seconds) - AbsTime::kUnixEpochSeconds)
-            .Value();
+    // Narrowed on its own: where time_t has 32 bits, a time it cannot hold is out of range.
+    const int64_t unixSeconds =
+        (SafeInteger<int64_t>(seconds) - AbsTime::kUnixEpochSeconds).Value();
+    const std::time_t unixTime = SafeInteger<std::time_t>(unixSeconds).Value();
     std::tm fields{};
     if ((utc ? gmtime_r(&unixTime, &fields) : localtime_r(&unixTime, &fields)) == nullptr) {
         throw exception::OutOfRange();
@@ -122,6 +123,14 @@ std::wstring AbsTimeToString(const AbsTime& time, const AbsTimeFormat& format) {
     const size_t length = std::strftime(text, sizeof(text), combined.c_str(), &fields);
 #pragma GCC diagnostic pop
     return WideFromNarrow(text, length);
+}
+
+ScaledFraction ScaleFraction(uint64_t fraction, uint32_t perSecond) {
+    // fraction * perSecond = high * 2^32 + (low mod 2^32); high stays below 2^64.
+    const uint64_t mask = 0xFFFFFFFFu;
+    const uint64_t low = (fraction & mask) * perSecond;
+    const uint64_t high = (fraction >> 32) * perSecond + (low >> 32);
+    return ScaledFraction{high >> 32, (high << 32) | (low & mask)};
 }
 
 AbsTime LocalDateTimeToAbsTime(const LocalDateTime& fields) {

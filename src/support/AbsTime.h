@@ -54,6 +54,17 @@ struct AbsTimeFormat {
 // time that the C library cannot break down.
 std::wstring AbsTimeToString(const AbsTime& time, const AbsTimeFormat& format = AbsTimeFormat());
 
+// A fraction of a second counted in units of 1/perSecond s: the whole units, and the rest in
+// units of 2^-64 of one unit.
+struct ScaledFraction {
+    uint64_t whole;
+    uint64_t remainder;
+};
+
+// `fraction` (units of 2^-64 s) in units of 1/`perSecond` s, exactly. Built from 32-bit halves,
+// so it needs no 128-bit integer type (32-bit targets have none).
+ScaledFraction ScaleFraction(uint64_t fraction, uint32_t perSecond);
+
 // A local calendar date and time; fields outside their usual ranges are normalised.
 struct LocalDateTime {
     int year;    // e.g. 2024

@@ -8,10 +8,6 @@
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
-// 128-bit integers for exact fixed-point arithmetic on timestamps.
-__extension__ typedef __int128 Wide;
-__extension__ typedef unsigned __int128 UnsignedWide;
-
 constexpr size_t kMaxHostNameLength = 63;
 constexpr size_t kMaxCommentLength = 64;
 
@@ -95,22 +91,21 @@ ValidationVerdict CheckLocaleCode(const std::wstring& localeCode, const std::wst
 }
 
 ValidationVerdict CheckCurrentTime(const uxSysAttrTimestampUTC& time) {
-    // Whole milliseconds since the Unix epoch, then the fraction's share of a millisecond in
-    // units of 2^-64 ms; both exact, so the rounding below is exact too.
-    const Wide wholeMilliseconds =
-        (static_cast<Wide>(time.seconds) - vq::dsc::AbsTime::kUnixEpochSeconds) * 1000;
-    const UnsignedWide scaledFraction = static_cast<UnsignedWide>(time.fraction) * 1000;
-    const Wide fractionMilliseconds = static_cast<Wide>(scaledFraction >> 64);
-    const uint64_t remainder = static_cast<uint64_t>(scaledFraction);
+    // The time, rounded half to even to whole milliseconds since the Unix epoch, must not be
+    // negative. Only in the second before the epoch does the fraction decide: from 999.5 ms on
+    // it rounds up to the epoch (-1 ms is odd, so the exact half rounds up too).
+    constexpr int64_t kEpoch = vq::dsc::AbsTime::kUnixEpochSeconds;
     constexpr uint64_t kHalf = uint64_t(1) << 63;
-    Wide milliseconds = wholeMilliseconds + fractionMilliseconds;
-    if (remainder > kHalf || (remainder == kHalf && (milliseconds & 1) != 0)) {
-        ++milliseconds;
+    if (time.seconds >= kEpoch) {
+        return ValidationVerdict();
     }
-    if (milliseconds < 0) {
-        return Reject(UX_E_VALUE_INVALID, kTimestampMessage);
+    if (time.seconds == kEpoch - 1) {
+        const vq::dsc::ScaledFraction milliseconds = vq::dsc::ScaleFraction(time.fraction, 1000);
+        if (milliseconds.whole == 999 && milliseconds.remainder >= kHalf) {
+            return ValidationVerdict();
+        }
     }
-    return ValidationVerdict();
+    return Reject(UX_E_VALUE_INVALID, kTimestampMessage);
 }
 
 void StoreValidationMessage(CvqBStr* slot, const wchar_t* text) {

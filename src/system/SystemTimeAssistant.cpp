@@ -34,9 +34,7 @@ constexpr wchar_t kTimeZoneMessage[] = L"Timezone not supported.";
 constexpr wchar_t kHardwareClockArgumentsWithoutAdjtime[] = L"--systohc --noadjfile --utc";
 constexpr wchar_t kHardwareClockArguments[] = L"--systohc";
 
-__extension__ typedef __int128 Wide;
-__extension__ typedef unsigned __int128 UnsignedWide;
-constexpr int64_t kMicrosecondsPerSecond = 1000000;
+constexpr uint32_t kMicrosecondsPerSecond = 1000000;
 
 // Copies the system time to the hardware clock with the hardware-clock tool and waits for it.
 void CopySystemTimeToHardwareClock() {
@@ -210,18 +208,16 @@ bool SystemTimeAssistant::HasRealTimeClock() {
 }
 
 void SystemTimeAssistant::SetCurrentSystemTime(const vq::dsc::AbsTime& time) {
-    const Wide fractionMicroseconds = static_cast<Wide>(
-        (static_cast<UnsignedWide>(time.fraction) * kMicrosecondsPerSecond) >> 64);
-    const Wide microseconds =
-        (static_cast<Wide>(time.seconds) - vq::dsc::AbsTime::kUnixEpochSeconds) *
-            kMicrosecondsPerSecond +
-        fractionMicroseconds;
-    const Wide seconds = microseconds / kMicrosecondsPerSecond;
-    if (seconds < INT64_MIN || seconds > INT64_MAX) {
+    // Whole Unix seconds and the fraction cut to whole microseconds; the clock cannot go back
+    // before the Unix epoch.
+    int64_t unixSeconds = 0;
+    if (__builtin_sub_overflow(time.seconds, vq::dsc::AbsTime::kUnixEpochSeconds, &unixSeconds) ||
+        unixSeconds < 0) {
         throw vq::dsc::exception::OutOfRange();
     }
-    kest::SetSystemClock(static_cast<int64_t>(seconds),
-                         static_cast<int64_t>(microseconds % kMicrosecondsPerSecond));
+    const uint64_t microseconds =
+        vq::dsc::ScaleFraction(time.fraction, kMicrosecondsPerSecond).whole;
+    kest::SetSystemClock(unixSeconds, static_cast<int64_t>(microseconds));
     if (HasRealTimeClock()) {
         CopySystemTimeToHardwareClock();
     }

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <ctime>
 #include <string>
 
 #include "support/AbsTime.h"
@@ -55,6 +56,39 @@ TEST(AbsTimeToString, FractionRoundingAndLayoutInUtc) {
     tooPrecise.fractionDigits = 20;
     EXPECT_THROW(AbsTimeToString(AbsTime::Now(), tooPrecise), OutOfRange);
     EXPECT_THROW(AbsTimeToString(AbsTime::Invalid()), OutOfRange);
+}
+
+TEST(ScaleFraction, SplitsExactlyIntoWholeUnitsAndTheRest) {
+    const struct {
+        uint64_t fraction;
+        uint32_t perSecond;
+        uint64_t whole;
+        uint64_t remainder;
+    } rows[] = {{uint64_t{1} << 63, 1000, 500, 0},
+                {uint64_t{1} << 62, 1000000, 250000, 0},
+                {~uint64_t{0}, 1000, 999, ~uint64_t{0} - 999},
+                {~uint64_t{0}, 0xFFFFFFFFu, 0xFFFFFFFEu, ~uint64_t{0} - 0xFFFFFFFEu},
+                {(uint64_t{1} << 63) + 18446744073709ull, 1000000, 500000, 18446744073709000000ull},
+                {0, 1000000, 0, 0}};
+    for (const auto& row : rows) {
+        const vq::dsc::ScaledFraction scaled = vq::dsc::ScaleFraction(row.fraction, row.perSecond);
+        EXPECT_EQ(row.whole, scaled.whole) << row.fraction << " / " << row.perSecond;
+        EXPECT_EQ(row.remainder, scaled.remainder) << row.fraction << " / " << row.perSecond;
+    }
+}
+
+// Where time_t has 32 bits (ARMv7 Linux), a time past January 2038 must not wrap to 1901.
+TEST(AbsTimeToString, TimesBeyondTheSystemTimeAreOutOfRangeNeverWrapped) {
+    const AbsTime year2100 = AbsTime::FromUnixTime(4102444800, 0);
+    AbsTimeFormat dateOnly;
+    dateOnly.dateFormat = "%Y%m%d";
+    dateOnly.timeFormat = "";
+    dateOnly.utc = true;
+    if (sizeof(std::time_t) >= sizeof(int64_t)) {
+        EXPECT_EQ(L"21000101", AbsTimeToString(year2100, dateOnly));
+    } else {
+        EXPECT_THROW(AbsTimeToString(year2100, dateOnly), OutOfRange);
+    }
 }
 
 TEST(LocalDateTimeToAbsTime, NormalisesAndRoundTripsThroughLocalFormatting) {

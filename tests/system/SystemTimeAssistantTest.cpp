@@ -220,6 +220,8 @@ TEST_F(ClockTest, TimesTheClockCannotHoldBecomeEFail) {
     CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
     bag->SetTimestamp(SystemTag::kCurrentTime, {uint64_t(1) << 63, kEpoch - 2});
     EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+    bag->SetTimestamp(SystemTag::kCurrentTime, {0, kEpoch - 2});
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
     bag->SetTimestamp(SystemTag::kCurrentTime, {0, INT64_MAX});
     EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 1));
     EXPECT_EQ("", Clock());
