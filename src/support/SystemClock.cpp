@@ -92,6 +92,10 @@ void SetSystemClock(int64_t seconds, int64_t microseconds) {
     if (microseconds < 0 || microseconds > 999999) {
         throw vq::dsc::exception::InvalidArgument();
     }
+    // Where time_t has 32 bits, a time past January 2038 would wrap to 1901.
+    if (static_cast<int64_t>(static_cast<time_t>(seconds)) != seconds) {
+        throw vq::dsc::exception::OutOfRange();
+    }
     if (HasSysroot()) {
         WriteRedirectedClock(seconds, microseconds);
         return;

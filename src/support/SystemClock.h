@@ -7,8 +7,9 @@
 namespace kest {
 
 // Sets the system clock to `seconds` (Unix time) and `microseconds` (0 to 999999, else
-// vq::dsc::exception::InvalidArgument). Under a sysroot, replaces the redirected clock file
-// with the line "SECONDS MICROSECONDS". Failures raise vq::dsc::osdep::PosixError.
+// vq::dsc::exception::InvalidArgument); seconds that time_t cannot hold raise
+// vq::dsc::exception::OutOfRange. Under a sysroot, replaces the redirected clock file with the
+// line "SECONDS MICROSECONDS". Failures raise vq::dsc::osdep::PosixError.
 void SetSystemClock(int64_t seconds, int64_t microseconds);
 
 }  // namespace kest

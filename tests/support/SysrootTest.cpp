@@ -3,6 +3,7 @@
 #include <glob.h>
 #include <stdlib.h>
 
+#include <ctime>
 #include <string>
 #include <vector>
 
@@ -109,6 +110,19 @@ TEST(SystemClockTest, RefusesBadMicrosecondsAndReportsWriteFailures) {
     EXPECT_FALSE(sysroot.Exists("/run"));
     sysroot.WriteFile("/run", "not a directory");
     EXPECT_THROW(kest::SetSystemClock(1, 0), vq::dsc::osdep::PosixError);
+}
+
+// 2100-01-01: the clock takes it where time_t has 64 bits and refuses it, never wrapping to
+// 1901, where time_t has 32 bits (ARMv7 Linux).
+TEST(SystemClockTest, ATimeBeyondTimeTIsRefusedNotWrapped) {
+    kest::test::TempSysroot sysroot;
+    if (sizeof(time_t) >= sizeof(int64_t)) {
+        kest::SetSystemClock(4102444800, 0);
+        EXPECT_EQ("4102444800 0\n", sysroot.ReadFile("/run/kest/system-clock"));
+    } else {
+        EXPECT_THROW(kest::SetSystemClock(4102444800, 0), vq::dsc::exception::OutOfRange);
+        EXPECT_FALSE(sysroot.Exists("/run"));
+    }
 }
 
 }  // namespace
