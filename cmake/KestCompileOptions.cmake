@@ -4,6 +4,11 @@ target_compile_options(kest_compile_options INTERFACE
   -Wall -Wextra -Wpedantic -Wshadow -Wcast-align -Wformat=2 -Wundef
   $<$<BOOL:${KEST_WERROR}>:-Werror>)
 
+# The large-file interfaces on 32-bit targets (ARMv7): without them stat, statvfs and readdir
+# fail with EOVERFLOW on large inode numbers, block counts and directory offsets. On 64-bit
+# targets these interfaces are the only ones.
+add_compile_definitions(_FILE_OFFSET_BITS=64)
+
 if(KEST_SANITIZE)
   set(KEST_SANITIZE_FLAGS -fsanitize=${KEST_SANITIZE} -fno-omit-frame-pointer
       -fno-sanitize-recover=all)
