@@ -20,7 +20,10 @@ inline CvqBStr CvqBStrAllocLen(const wchar_t* text, uint64_t count) {
     }
     const uint32_t count32 = static_cast<uint32_t>(count);
     std::memcpy(block, &count32, sizeof(count32));
-    wchar_t* chars = reinterpret_cast<wchar_t*>(static_cast<char*>(block) + sizeof(uint32_t));
+    // malloc aligns for every type, so four bytes on the characters are aligned for wchar_t.
+    static_assert(alignof(wchar_t) <= sizeof(uint32_t), "characters follow the count");
+    wchar_t* chars =
+        static_cast<wchar_t*>(static_cast<void*>(static_cast<char*>(block) + sizeof(uint32_t)));
     if (count != 0) {
         std::memcpy(chars, text, static_cast<size_t>(count) * sizeof(wchar_t));
     }

@@ -4,6 +4,7 @@
 
 #include <cctype>
 #include <cstddef>
+#include <cstdint>
 #include <string_view>
 
 namespace kest_ini {
@@ -35,11 +36,12 @@ class NameRules {
 
     size_t operator()(std::string_view name) const {
         std::string_view trimmed = TrimIniSpace(name);
-        size_t hash = 14695981039346656037ull;
+        uint64_t hash = 14695981039346656037ull;
         for (char c : trimmed) {
             hash = (hash ^ Fold(c)) * 1099511628211ull;
         }
-        return hash;
+        // Where size_t has 32 bits the high half is folded in: the low half alone mixes poorly.
+        return static_cast<size_t>(sizeof(size_t) < sizeof(hash) ? hash ^ (hash >> 32) : hash);
     }
 
     bool operator()(std::string_view left, std::string_view right) const {

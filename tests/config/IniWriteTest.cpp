@@ -5,6 +5,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cstring>
 #include <functional>
 #include <string>
 #include <vector>
@@ -74,13 +75,15 @@ std::vector<std::string> NamesCreatedBy(const std::string& directory,
     int watch = inotify_init1(IN_NONBLOCK | IN_CLOEXEC);
     inotify_add_watch(watch, directory.c_str(), IN_CREATE);
     EXPECT_EQ(save(), 0);
-    alignas(inotify_event) char buffer[4096];
+    char buffer[4096];
     ssize_t length = read(watch, buffer, sizeof buffer);
     std::vector<std::string> names;
     for (ssize_t offset = 0; offset < length;) {
-        const auto* event = reinterpret_cast<const inotify_event*>(buffer + offset);
-        names.emplace_back(event->name);
-        offset += static_cast<ssize_t>(sizeof(inotify_event) + event->len);
+        // Copied out rather than cast: the buffer's records need not suit every alignment.
+        inotify_event event;
+        std::memcpy(&event, buffer + offset, sizeof event);
+        names.emplace_back(buffer + offset + sizeof event);
+        offset += static_cast<ssize_t>(sizeof event + event.len);
     }
     close(watch);
     return names;
