@@ -70,8 +70,18 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
     return result;
 }
 
+// Runs the built kestcfg; when the tests run under an emulator (a cross build), through the
+// same emulator command.
 inline RunResult RunKestcfg(const std::vector<std::string>& arguments) {
-    return RunProgram(KESTCFG_PATH, arguments);
+    std::vector<std::string> command = {KEST_TEST_EMULATOR};
+    if (command.empty()) {
+        return RunProgram(KESTCFG_PATH, arguments);
+    }
+    const std::string launcher = command.front();
+    command.erase(command.begin());
+    command.push_back(KESTCFG_PATH);
+    command.insert(command.end(), arguments.begin(), arguments.end());
+    return RunProgram(launcher, command);
 }
 
 // Parses `jsonLines` (one JSON document per line) with python3 and returns every scalar as a
