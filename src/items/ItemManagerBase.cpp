@@ -68,6 +68,9 @@ CountedPtr<ItemHandler> ItemManagerBase::FindItemHandler(const std::wstring& ite
 }
 
 CountedPtr<ItemHandler> ItemManagerBase::GetItemHandler(const std::wstring& itemName) {
+    // Held throughout, so another expert's ClearItems cannot empty the list between the
+    // discovery and the second look.
+    vq::dsc::ScopedLock lock(ItemLock());
     CountedPtr<ItemHandler> handler = FindItemHandler(itemName);
     if (handler) {
         return handler;
@@ -81,10 +84,11 @@ CountedPtr<ItemHandler> ItemManagerBase::GetItemHandler(const std::wstring& item
 }
 
 ItemHandlerList ItemManagerBase::GetItemHandlers(bool enumerateFirst) {
+    // Taken before the discovery, so the snapshot holds the items it found.
+    vq::dsc::ScopedLock lock(ItemLock());
     if (enumerateFirst) {
         EnumerateItems();
     }
-    vq::dsc::ScopedLock lock(ItemLock());
     return handlers_;
 }
 
