@@ -1,0 +1,127 @@
+// One property bag locked and written from several threads at once: each locker writes a group of
+// tags under the caller lock (taken twice, as nested callers do), other threads copy the bag and
+// enumerate its tags without the lock. Every copy and every look inside a locked section sees a
+// whole group, enumerations are ascending snapshots, and no write is lost.
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <thread>
+#include <vector>
+
+#include "com/CountedPtr.h"
+#include "property/CuxDynamicPropertyBag.h"
+
+namespace {
+
+constexpr uint32_t kGroupTags[] = {0x100, 0x200, 0x300, 0x400};
+constexpr uint32_t kCounterTag = 0x10;
+constexpr int kLockers = 4;
+constexpr int kRoundsPerLocker = 400;
+constexpr int kObservers = 2;
+
+// True when every group tag holds the same value.
+bool GroupIsWhole(IuxSysPropertyBag* bag) {
+    uint32_t first = 0;
+    if (bag->GetULong(kGroupTags[0], &first) != S_OK) {
+        return false;
+    }
+    for (uint32_t tag : kGroupTags) {
+        uint32_t value = 0;
+        if (bag->GetULong(tag, &value) != S_OK || value != first) {
+            return false;
+        }
+    }
+    return true;
+}
+
+// True when the enumerator yields strictly ascending tags.
+bool Ascending(IuxSysEnumPropertyTag* tags) {
+    uint32_t previous = 0;
+    bool first = true;
+    uint32_t batch[3];
+    uint32_t fetched = 0;
+    HRESULT status = S_OK;
+    do {
+        status = tags->Next(3, batch, &fetched);
+        for (uint32_t i = 0; i < fetched; ++i) {
+            if (!first && batch[i] <= previous) {
+                return false;
+            }
+            previous = batch[i];
+            first = false;
+        }
+    } while (status == S_OK);
+    return status == S_FALSE;
+}
+
+TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
+    const CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    ASSERT_EQ(S_OK, bag->SetULong(kCounterTag, 0));
+    for (uint32_t tag : kGroupTags) {
+        ASSERT_EQ(S_OK, bag->SetULong(tag, 0));
+    }
+    std::atomic<int> lockersRunning{kLockers};
+    std::atomic<int> brokenGroups{0};
+    std::atomic<int> failedCalls{0};
+    std::atomic<int> unorderedEnumerations{0};
+
+    std::vector<std::thread> threads;
+    for (int locker = 0; locker < kLockers; ++locker) {
+        threads.emplace_back([&, locker] {
+            const uint32_t privateTag = 0x1000 + static_cast<uint32_t>(locker);
+            for (int round = 1; round <= kRoundsPerLocker; ++round) {
+                const uint32_t value = static_cast<uint32_t>(locker * 100000 + round);
+                failedCalls += bag->LockBag() != S_OK;
+                failedCalls += bag->LockBag() != S_OK;
+                for (uint32_t tag : kGroupTags) {
+                    failedCalls += bag->SetULong(tag, value) != S_OK;
+                    std::this_thread::yield();
+                }
+                brokenGroups += !GroupIsWhole(bag.Get());
+                uint32_t counter = 0;
+                failedCalls += bag->GetULong(kCounterTag, &counter) != S_OK;
+                failedCalls += bag->SetULong(kCounterTag, counter + 1) != S_OK;
+                // One level of the lock given back, the other still held: a tag of this locker
+                // appears, and outside the lock every other round it goes again.
+                failedCalls += bag->UnlockBag() != S_OK;
+                failedCalls += bag->SetLong(privateTag, round) != S_OK;
+                failedCalls += bag->UnlockBag() != S_OK;
+                if (round % 2 == 0) {
+                    failedCalls += bag->RemoveTag(privateTag) != S_OK;
+                }
+            }
+            --lockersRunning;
+        });
+    }
+    for (int observer = 0; observer < kObservers; ++observer) {
+        threads.emplace_back([&] {
+            while (lockersRunning > 0) {
+                CountedPtr<IuxSysPropertyBag> copy;
+                failedCalls += bag->Clone(copy.Receive()) != S_OK;
+                brokenGroups += !GroupIsWhole(copy.Get());
+                CountedPtr<IuxSysEnumPropertyTag> tags;
+                failedCalls += bag->GetTagEnumerator(tags.Receive()) != S_OK;
+                unorderedEnumerations += !Ascending(tags.Get());
+                CountedPtr<IuxSysEnumPropertyTag> modified;
+                failedCalls += bag->GetModifiedTagEnumerator(modified.Receive()) != S_OK;
+                unorderedEnumerations += !Ascending(modified.Get());
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+
+    EXPECT_EQ(0, failedCalls.load());
+    EXPECT_EQ(0, brokenGroups.load());
+    EXPECT_EQ(0, unorderedEnumerations.load());
+    uint32_t counter = 0;
+    EXPECT_EQ(S_OK, bag->GetULong(kCounterTag, &counter));
+    EXPECT_EQ(static_cast<uint32_t>(kLockers * kRoundsPerLocker), counter);
+    EXPECT_EQ(E_FAIL, bag->UnlockBag()) << "every caller lock was given back";
+    for (int locker = 0; locker < kLockers; ++locker) {
+        EXPECT_EQ(S_FALSE, bag->HasTag(0x1000 + static_cast<uint32_t>(locker)));
+    }
+}
+
+}  // namespace

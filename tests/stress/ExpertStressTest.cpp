@@ -1,0 +1,180 @@
+// Experts under concurrency, through the loaded plug-in as a host uses it: many threads create,
+// initialise, query and release experts at once, and searches and reads run while another
+// thread persists changes. Every call must succeed and every value read must be one that was
+// written at some point.
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <mutex>
+#include <set>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "e2e/ExpertHost.h"
+
+namespace {
+
+using e2e::kSystemItemName;
+
+constexpr uint32_t kHostNameTag = 0x0101F000;
+constexpr uint32_t kCommentTag = 0x0103D000;
+constexpr uint32_t kWebServiceTag = 0x21004000;
+constexpr int kLifecycleThreads = 6;
+constexpr int kLifecycleRounds = 20;
+constexpr int kReaderThreads = 4;
+constexpr int kPersists = 40;
+
+// Counts the calls that did not give the expected result, by name.
+class Failures {
+  public:
+    void Check(bool ok, const char* what) {
+        if (!ok) {
+            std::lock_guard<std::mutex> hold(lock_);
+            failed_.insert(what);
+        }
+    }
+    std::set<std::string> Failed() const { return failed_; }
+
+  private:
+    std::mutex lock_;
+    std::set<std::string> failed_;
+};
+
+class StressExpertTest : public e2e::ExpertHostTest {
+  protected:
+    void SetUp() override {
+        WriteControllerState(std::string(e2e::kSystemState) +
+                             "UserComment = initial\n[Device0]\nType = 1\nInterfaceName = eth0\n");
+        sysroot.MakeDirectory("/etc/korvane/share");
+        ExpertHostTest::SetUp();
+    }
+
+    // The system item's string property `tag`, read through `from`; empty when a call fails.
+    static std::wstring ReadText(IuxSysExpert3* from, uint32_t tag, Failures& failures) {
+        IuxSysPropertyBag* bag = nullptr;
+        const HRESULT got = from->GetPropertiesOfItem(kSystemItemName, &bag);
+        failures.Check(got == S_OK && bag != nullptr, "GetPropertiesOfItem");
+        if (bag == nullptr) {
+            return std::wstring();
+        }
+        CvqBStr text = nullptr;
+        failures.Check(bag->GetString(tag, &text) == S_OK, "GetString");
+        bag->Release();
+        return e2e::TakeHostString(text);
+    }
+
+    // A bag of changes made from the system item's properties with `write` applied.
+    template <class Write>
+    static IuxSysPropertyBag* Changes(IuxSysExpert3* from, Failures& failures, Write&& write) {
+        IuxSysPropertyBag* current = nullptr;
+        failures.Check(from->GetPropertiesOfItem(kSystemItemName, &current) == S_OK,
+                       "GetPropertiesOfItem");
+        if (current == nullptr) {
+            return nullptr;
+        }
+        IuxSysPropertyBag* changes = nullptr;
+        failures.Check(current->Clone(&changes) == S_OK, "Clone");
+        current->Release();
+        if (changes != nullptr) {
+            write(changes);
+        }
+        return changes;
+    }
+};
+
+TEST_F(StressExpertTest, ThreadsCreateQueryAndReleaseExperts) {
+    Failures failures;
+    const std::vector<std::wstring> expectedNames = {kSystemItemName, L"eth0"};
+    std::vector<std::thread> threads;
+    for (int t = 0; t < kLifecycleThreads; ++t) {
+        threads.emplace_back([&, t] {
+            for (int round = 0; round < kLifecycleRounds; ++round) {
+                IuxSysExpert3* own = nullptr;
+                failures.Check(plugin.Factory()(&own) == S_OK && own != nullptr, "factory");
+                if (own == nullptr) {
+                    continue;
+                }
+                failures.Check(own->Initialize() == S_OK, "Initialize");
+                IuxSysEnumStringList* names = nullptr;
+                failures.Check(own->SearchForItemNames(&names) == S_OK, "SearchForItemNames");
+                if (names != nullptr) {
+                    failures.Check(e2e::TakeNames(names) == expectedNames, "item names");
+                }
+                failures.Check(ReadText(own, kHostNameTag, failures) == L"kest-1", "host name");
+                IuxSysPropertyBag* changes = Changes(own, failures, [&](IuxSysPropertyBag* bag) {
+                    bag->SetString(kHostNameTag, (L"kest-" + std::to_wstring(t + 2)).c_str());
+                });
+                if (changes != nullptr) {
+                    IuxSysEnumPropertyTag* validated = nullptr;
+                    CvqBStr message = nullptr;
+                    failures.Check(own->ValidatePropertyChanges(kSystemItemName, changes,
+                                                                &validated, &message) == S_OK,
+                                   "ValidatePropertyChanges");
+                    CvqBStrFree(message);
+                    if (validated != nullptr) {
+                        validated->Release();
+                    }
+                    changes->Release();
+                }
+                // Uninitialize drops the shared item handlers that other threads are using.
+                failures.Check(own->Uninitialize() == S_OK, "Uninitialize");
+                failures.Check(own->Release() == 0, "last reference");
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(failures.Failed(), std::set<std::string>());
+}
+
+TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
+    Failures failures;
+    std::set<std::wstring> written = {L"initial"};
+    for (int i = 0; i < kPersists; ++i) {
+        written.insert(L"comment " + std::to_wstring(i));
+    }
+    std::atomic<bool> persisting{true};
+    std::vector<std::thread> readers;
+    for (int r = 0; r < kReaderThreads; ++r) {
+        readers.emplace_back([&, r] {
+            IuxSysExpert3* own = plugin.CreateExpert();
+            int rounds = 0;
+            // At least a few rounds each, however quickly the persists end.
+            while (persisting || rounds < 5) {
+                ++rounds;
+                if (r % 2 == 0) {
+                    e2e::RecordingSink sink(S_OK);
+                    failures.Check(own->SearchForItemsAndProperties(&sink) == S_OK, "search");
+                    failures.Check(sink.names.size() == 2, "items found");
+                }
+                failures.Check(written.count(ReadText(own, kCommentTag, failures)) == 1,
+                               "comment read is one that was written");
+            }
+            own->Release();
+        });
+    }
+    for (int i = 0; i < kPersists; ++i) {
+        IuxSysPropertyBag* changes = Changes(expert, failures, [&](IuxSysPropertyBag* bag) {
+            bag->SetString(kCommentTag, (L"comment " + std::to_wstring(i)).c_str());
+            bag->SetBool(kWebServiceTag, i % 2);
+        });
+        if (changes != nullptr) {
+            int32_t restart = -1;
+            failures.Check(
+                expert->PersistPropertyChanges(kSystemItemName, changes, &restart) == S_OK,
+                "PersistPropertyChanges");
+            changes->Release();
+        }
+    }
+    persisting = false;
+    for (std::thread& thread : readers) {
+        thread.join();
+    }
+    EXPECT_EQ(failures.Failed(), std::set<std::string>());
+    EXPECT_EQ(ReadText(expert, kCommentTag, failures),
+              L"comment " + std::to_wstring(kPersists - 1));
+}
+
+}  // namespace
