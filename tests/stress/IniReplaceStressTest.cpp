@@ -111,7 +111,7 @@ TEST_P(StressIniReplaceTest, LoadsDuringReplacementSeeWholeDocuments) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    SafeReplacement, StressIniReplaceTest,
+    StressReplacement, StressIniReplaceTest,
     ::testing::Values(ReplaceCase{"FixedTemporary", kIniWriteSafeReplacement, 1},
                       ReplaceCase{"UniqueTemporaries",
                                   kIniWriteSafeReplacement | kIniWriteUniqueTemporary, 3}),
