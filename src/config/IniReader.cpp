@@ -303,6 +303,12 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, tim
             break;
         }
         filled += static_cast<size_t>(count);
+        // A regular file that gave exactly its size with room to spare has ended: asking again
+        // only to hear so would cost a system call on every load.
+        if (S_ISREG(status.st_mode) && filled == static_cast<size_t>(status.st_size) &&
+            filled < bytes.size()) {
+            break;
+        }
     }
     std::string_view text(bytes.data(), filled);
     int start = TextStart(text);
