@@ -1,5 +1,6 @@
 // Values and documents that fuzzing found not to read back as they were written; each case is
 // saved and loaded again.
+#include <ostream>
 #include <string>
 
 #include "IniTestSupport.h"
@@ -14,6 +15,11 @@ struct SplitCase {
     int maxLineLength;
     char splitCharacter;
 };
+
+// Test names show the case's name rather than its bytes.
+void PrintTo(const SplitCase& c, std::ostream* out) {
+    *out << c.name;
+}
 
 class IniReadBackTest : public ::testing::TestWithParam<SplitCase> {
   protected:

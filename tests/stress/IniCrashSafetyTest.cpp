@@ -8,6 +8,7 @@
 
 #include <chrono>
 #include <fstream>
+#include <ostream>
 #include <random>
 #include <sstream>
 #include <string>
@@ -69,6 +70,11 @@ struct CrashCase {
     const char* name;
     uint32_t writeFlags;
 };
+
+// Test names show the case's name rather than its bytes.
+void PrintTo(const CrashCase& c, std::ostream* out) {
+    *out << c.name;
+}
 
 class IniCrashSafetyTest : public ::testing::TestWithParam<CrashCase> {};
 

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <ostream>
 #include <set>
 #include <string>
 #include <thread>
@@ -64,6 +65,11 @@ struct ReplaceCase {
     uint32_t writeFlags;
     int writers;  // a fixed temporary name is only safe for one writer at a time
 };
+
+// Test names show the case's name rather than its bytes.
+void PrintTo(const ReplaceCase& c, std::ostream* out) {
+    *out << c.name;
+}
 
 class StressIniReplaceTest : public ::testing::TestWithParam<ReplaceCase> {};
 
