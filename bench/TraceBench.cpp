@@ -72,16 +72,20 @@ void Spdlog_LineToFile(benchmark::State& state) {
 }
 BENCHMARK(Spdlog_LineToFile);
 
+struct FileCloser {
+    void operator()(FILE* file) const { std::fclose(file); }
+};
+
 void Fprintf_LineToFile(benchmark::State& state) {
-    static FILE* const file =
-        std::fopen((kest_bench::ScratchDirectory() + "/fprintf.log").c_str(), "a");
-    if (file == nullptr) {
+    static const std::unique_ptr<FILE, FileCloser> file(
+        std::fopen((kest_bench::ScratchDirectory() + "/fprintf.log").c_str(), "a"));
+    if (!file) {
         state.SkipWithError("cannot open the log file");
         return;
     }
     for (auto _ : state) {
-        std::fprintf(file, "%s\n", kText);
-        std::fflush(file);
+        std::fprintf(file.get(), "%s\n", kText);
+        std::fflush(file.get());
     }
     state.SetItemsProcessed(state.iterations());
 }
