@@ -1,6 +1,7 @@
 #include "support/Guid.h"
 
 #include <sched.h>
+#include <unistd.h>
 
 #include <cctype>
 #include <cstdio>
@@ -8,6 +9,7 @@
 #include <cstring>
 #include <ctime>
 #include <mutex>
+#include <random>
 
 #include "support/AbsTime.h"
 #include "support/HostInfo.h"
@@ -34,6 +36,13 @@ uint64_t WallClockIntervals() {
     const uint64_t seconds = static_cast<uint64_t>(now.seconds) + kGregorianToAbsTimeSeconds;
     const uint64_t fractionIntervals = ((now.fraction >> 32) * kIntervalsPerSecond) >> 32;
     return seconds * kIntervalsPerSecond + fractionIntervals;
+}
+
+// Bits from the system's entropy source. std::rand would start every process from the same
+// seed, so all processes would share one clock sequence (and one node without an adapter).
+uint32_t RandomBits() {
+    std::random_device entropy;
+    return entropy();
 }
 
 int HexValue(char c) {
@@ -76,13 +85,11 @@ class TimeBasedGenerator {
   public:
     TimeBasedGenerator()
         : monotonicToWallClock_(WallClockIntervals() - MonotonicIntervals()),
-          clockSequence_(static_cast<uint16_t>(((static_cast<unsigned>(std::rand()) << 8) +
-                                                (static_cast<unsigned>(std::rand()) & 255)) &
-                                               kClockSequenceMask)) {
+          clockSequence_(RandomClockSequence()) {
         if (!ParseHardwareAddress(osdep::FirstAdapterHardwareAddress(), node_) ||
             IsAllZero(node_)) {
             for (uint8_t& byte : node_) {
-                byte = static_cast<uint8_t>(std::rand());
+                byte = static_cast<uint8_t>(RandomBits());
             }
             node_[0] |= 0x80;
         }
@@ -90,6 +97,11 @@ class TimeBasedGenerator {
 
     Guid Next() {
         std::lock_guard<std::mutex> lock(mutex_);
+        if (process_ != getpid()) {
+            // A forked child draws its own sequence, so it never repeats its parent's identifiers.
+            process_ = getpid();
+            clockSequence_ = RandomClockSequence();
+        }
         uint64_t timestamp = Timestamp();
         while (timestamp == lastTimestamp_) {
             sched_yield();
@@ -115,7 +127,12 @@ class TimeBasedGenerator {
     // clock do not move it.
     uint64_t Timestamp() const { return MonotonicIntervals() + monotonicToWallClock_; }
 
+    static uint16_t RandomClockSequence() {
+        return static_cast<uint16_t>(RandomBits() & kClockSequenceMask);
+    }
+
     std::mutex mutex_;
+    pid_t process_ = getpid();
     const uint64_t monotonicToWallClock_;
     uint16_t clockSequence_;
     uint8_t node_[kNodeBytes] = {};

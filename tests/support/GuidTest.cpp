@@ -1,3 +1,6 @@
+#include <sys/wait.h>
+#include <unistd.h>
+
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -14,6 +17,10 @@ using vq::dsc::Guid;
 using vq::dsc::GuidToString;
 
 namespace {
+
+uint16_t ClockSequenceOf(const Guid& guid) {
+    return static_cast<uint16_t>(((guid.Data4[0] & 0x3F) << 8) | guid.Data4[1]);
+}
 
 uint64_t TimestampOf(const Guid& guid) {
     return (uint64_t(guid.Data3 & 0x0FFF) << 48) | (uint64_t(guid.Data2) << 32) | guid.Data1;
@@ -56,6 +63,32 @@ TEST(Guid, TimeBasedNeverRepeatAndCarryVersionVariantAndNode) {
     } else {
         EXPECT_EQ(address, text);
     }
+}
+
+// Each process, forked ones included, draws its own random clock sequence: one sequence
+// everywhere would let two processes, or a process after the clock went back, repeat
+// identifiers. Three equal sequences of 14 random bits come up once in 2^28 runs.
+TEST(Guid, ProcessesStartDifferentClockSequences) {
+    std::set<uint16_t> sequences = {ClockSequenceOf(Guid::CreateTimeBased())};
+    for (int i = 0; i < 2; ++i) {
+        int channel[2];
+        ASSERT_EQ(0, pipe(channel));
+        const pid_t child = fork();
+        ASSERT_GE(child, 0);
+        if (child == 0) {
+            const uint16_t sequence = ClockSequenceOf(Guid::CreateTimeBased());
+            _exit(write(channel[1], &sequence, sizeof sequence) == sizeof sequence ? 0 : 1);
+        }
+        close(channel[1]);
+        uint16_t sequence = 0;
+        EXPECT_EQ(static_cast<ssize_t>(sizeof sequence),
+                  read(channel[0], &sequence, sizeof sequence));
+        close(channel[0]);
+        int status = 0;
+        waitpid(child, &status, 0);
+        sequences.insert(sequence);
+    }
+    EXPECT_GT(sequences.size(), 1u);
 }
 
 }  // namespace
