@@ -150,6 +150,7 @@ class IuxSysExpert2 : public IuxSysExpert {
 class IuxSysExpert3 : public IuxSysExpert2 {
   public:
     // Slot 17: returns S_FALSE.
+    // NOLINTNEXTLINE(bugprone-virtual-near-miss): a new slot, unrelated to slots 13 and 14
     virtual HRESULT ReservedExpert17() = 0;
 
   protected:

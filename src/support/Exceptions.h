@@ -35,6 +35,8 @@ class MessageException : public Exception {
     std::string message_;
 };
 
+// Name and Base are a class name and its base class, which cannot stand in parentheses.
+// NOLINTBEGIN(bugprone-macro-parentheses)
 #define KEST_FIXED_EXCEPTION(Name, Base)             \
     class Name : public Base {                       \
       public:                                        \
@@ -42,6 +44,7 @@ class MessageException : public Exception {
         const char* what() const noexcept override;  \
         int32_t ErrorCode() const noexcept override; \
     }
+// NOLINTEND(bugprone-macro-parentheses)
 
 KEST_FIXED_EXCEPTION(OutOfRange, Exception);
 KEST_FIXED_EXCEPTION(BoundExceeded, Exception);

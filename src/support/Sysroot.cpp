@@ -96,7 +96,7 @@ std::string HardwareClockTool() {
 }
 
 std::string SharedTemporaryFileDirectory() {
-    const std::string overridden = AbsolutePathFromEnvironment("VQDSCTMPSHAREDFILEDIR");
+    std::string overridden = AbsolutePathFromEnvironment("VQDSCTMPSHAREDFILEDIR");
     if (!overridden.empty()) {
         return overridden;
     }

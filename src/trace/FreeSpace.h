@@ -16,6 +16,6 @@ bool MeasureFreeSpace(const std::string& directory, uint64_t* freeBytes);
 // The measurement the tracer uses: MeasureFreeSpace unless replaced (by tests, which cannot
 // shrink a real file system). Null restores MeasureFreeSpace.
 FreeSpaceMeasure CurrentFreeSpaceMeasure();
-void SetFreeSpaceMeasure(FreeSpaceMeasure measure);
+void SetFreeSpaceMeasure(FreeSpaceMeasure replacement);
 
 }  // namespace kest_trace

@@ -39,7 +39,7 @@ TEST(CountedPtrTest, AdoptingKeepsTheCountSharingAddsOne) {
         EXPECT_EQ(3, thing->Count());
         CountedPtr<CountedThing> moved = std::move(copy);
         EXPECT_EQ(3, thing->Count());
-        EXPECT_FALSE(copy);
+        EXPECT_FALSE(copy);  // NOLINT(bugprone-use-after-move): the moved-from state is tested
         EXPECT_EQ(moved, shared);
         shared = moved;  // assignment of the same object keeps the count
         EXPECT_EQ(3, thing->Count());

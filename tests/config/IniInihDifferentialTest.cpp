@@ -458,7 +458,7 @@ std::vector<std::string> MachineIniFiles() {
     static const char* const kSuffixes[] = {".ini",     ".conf",  ".cfg", ".desktop",
                                             ".service", ".theme", ".inf"};
     constexpr size_t kMaxFiles = 1500;
-    constexpr off_t kMaxBytes = 256 * 1024;
+    constexpr off_t kMaxBytes = off_t{256} * 1024;
     std::vector<std::string> files;
     std::function<void(const std::string&, int)> walk = [&](const std::string& directory,
                                                             int depth) {

@@ -5,7 +5,7 @@
 #include "IniTestSupport.h"
 
 using kest::test::TempSysroot;
-using std::string_literals::operator""s;
+using std::string_literals::operator""s;  // NOLINT(misc-unused-using-decls): used by "..."s
 
 namespace {
 

@@ -17,7 +17,7 @@ namespace items_test {
 // A handler with the base behaviour that counts its destructions.
 class TestHandler : public ItemHandler {
   public:
-    TestHandler(std::wstring name, std::atomic<int>* destroyed = nullptr)
+    TestHandler(const std::wstring& name, std::atomic<int>* destroyed = nullptr)
         : ItemHandler(name, L"Second " + name, kNumericAttribute), destroyed_(destroyed) {}
 
   protected:

@@ -43,6 +43,8 @@ HRESULT SetSample(IuxSysPropertyBag4* bag, uint32_t type, uint32_t tag) {
 
 template <class T>
 HRESULT Compare(HRESULT status, const T& read, const T& sample) {
+    // Bit for bit: a value must come back exactly as stored.
+    // NOLINTNEXTLINE(bugprone-suspicious-memory-comparison)
     return status == S_OK && std::memcmp(&read, &sample, sizeof(T)) != 0 ? E_UNEXPECTED : status;
 }
 

@@ -26,7 +26,7 @@ TEST(AbsTime, UnixTimeConversion) {
 TEST(AbsTimeToString, FractionRoundingAndLayoutInUtc) {
     const char *date = "%Y%m%d", *time = "%H%M%S";
     const DecimalPoint period = DecimalPoint::Period;
-    const int64_t noon = 12 * 3600;
+    const int64_t noon = int64_t{12} * 3600;
     const struct {
         int64_t unixSeconds;
         uint32_t nanoseconds;

@@ -28,6 +28,8 @@ template <class String>
 void ExpectLayoutHolds(const String& text) {
     ThreePointers stored;
     static_assert(sizeof(stored) == sizeof(text), "three pointers");
+    // The binary layout is what the test reads.
+    // NOLINTNEXTLINE(bugprone-undefined-memory-manipulation)
     std::memcpy(&stored, &text, sizeof(stored));
     const size_t unit = sizeof(typename String::value_type);
     ASSERT_EQ(static_cast<const void*>(text.c_str()), stored.begin);
@@ -46,7 +48,7 @@ TEST(StringBase, LayoutHoldsWhileGrowingAndAfterMoves) {
     }
     WideString moved(std::move(text));
     EXPECT_EQ(L"abcdefghijklmn", moved.substr(286).str());
-    ExpectLayoutHolds(text);
+    ExpectLayoutHolds(text);  // NOLINT(bugprone-use-after-move): the moved-from state is tested
     EXPECT_TRUE(text.empty());
 }
 
@@ -164,6 +166,7 @@ TEST(Vector, ThreePointerLayoutGrowthAndOwnElements) {
     for (int i = 0; i < 100; ++i) {
         names.push_back(NarrowString(std::to_string(i)));
         ThreePointers stored;
+        // NOLINTNEXTLINE(bugprone-undefined-memory-manipulation): the binary layout is tested
         std::memcpy(&stored, &names, sizeof(stored));
         ASSERT_EQ(static_cast<const void*>(names.begin()), stored.begin);
         ASSERT_EQ(static_cast<const void*>(names.end()), stored.end);
@@ -176,7 +179,7 @@ TEST(Vector, ThreePointerLayoutGrowthAndOwnElements) {
     EXPECT_STREQ("0", names[names.size() - 1].c_str());
     EXPECT_STREQ("42", names[42].c_str());
     vq::dsc::Vector<NarrowString> moved(std::move(names));
-    EXPECT_TRUE(names.empty());
+    EXPECT_TRUE(names.empty());  // NOLINT(bugprone-use-after-move): the moved-from state is tested
     names = moved;
     moved.clear();
     EXPECT_TRUE(moved.empty());

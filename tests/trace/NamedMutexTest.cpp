@@ -11,7 +11,6 @@
 
 using kest::test::TempSysroot;
 using vq::dsc::NamedMutex;
-using vq::dsc::ScopedNamedLock;
 
 namespace {
 

@@ -258,7 +258,8 @@ TEST(TracerTest, ProcessesTracingToOneLogNeverInterleaveInsideARecord) {
             if (child == 0) {
                 for (int r = 0; r < kRecords; ++r) {
                     std::string text = "child " + std::to_string(c) + " record " +
-                                       std::to_string(r) + " " + std::string(200, 'a' + c);
+                                       std::to_string(r) + " " +
+                                       std::string(200, static_cast<char>('a' + c));
                     TraceIfEnabled(text, kTraceErrors);
                 }
                 _exit(0);

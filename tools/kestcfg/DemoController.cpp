@@ -207,11 +207,11 @@ class TreeWriter {
 }  // namespace
 
 std::string FindTimeZoneTable() {
-    const std::string besideProgram = ProgramDirectory() + "timezone.ini";
+    std::string besideProgram = ProgramDirectory() + "timezone.ini";
     if (Exists(besideProgram)) {
         return besideProgram;
     }
-    const std::string inSources = std::string(KESTCFG_SOURCE_DATA_DIR) + "/timezone.ini";
+    std::string inSources = std::string(KESTCFG_SOURCE_DATA_DIR) + "/timezone.ini";
     if (Exists(inSources)) {
         return inSources;
     }

@@ -72,11 +72,16 @@ class StringBase {
     }
     StringBase(const StringBase& other) { Initialize(other.begin_, other.length()); }
     // Takes the other's characters; the other is left empty (owning a fresh zero character).
+    // Not noexcept: the fresh zero character is allocated.
+    // NOLINTNEXTLINE(performance-noexcept-move-constructor)
     StringBase(StringBase&& other) : StringBase() { swap(other); }
     ~StringBase() { delete[] begin_; }
 
+    // Copy and swap (in assign), so assigning a string to itself keeps it.
+    // NOLINTNEXTLINE(bugprone-unhandled-self-assignment)
     StringBase& operator=(const StringBase& other) { return assign(other.begin_, other.length()); }
-    StringBase& operator=(StringBase&& other) {
+    // Not noexcept: the other string is left owning a freshly allocated zero character.
+    StringBase& operator=(StringBase&& other) {  // NOLINT(performance-noexcept-move-constructor)
         StringBase taken(std::move(other));
         swap(taken);
         return *this;

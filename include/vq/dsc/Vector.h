@@ -36,7 +36,8 @@ class Vector {
         clear();
         std::free(begin_);
     }
-    Vector& operator=(const Vector& other) {
+    // Copy and swap, so assigning a vector to itself keeps it.
+    Vector& operator=(const Vector& other) {  // NOLINT(bugprone-unhandled-self-assignment)
         Vector copy(other);
         swap(copy);
         return *this;
@@ -107,6 +108,7 @@ class Vector {
     // anything throws.
     template <class AppendAt = std::nullptr_t>
     void Relocate(size_type count, AppendAt appendAt) {
+        // NOLINTNEXTLINE(bugprone-sizeof-expression): T itself may be a pointer type
         const size_type bytes = (SafeInteger<size_type>(count) * sizeof(T)).Value();
         T* fresh = static_cast<T*>(std::malloc(bytes));
         if (fresh == nullptr) {
