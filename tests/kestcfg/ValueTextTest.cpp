@@ -1,6 +1,7 @@
 // Parsing command-line values by property type, and showing them to people and scripts.
 #include <gtest/gtest.h>
 
+#include <ctime>
 #include <optional>
 #include <ostream>
 #include <string>
@@ -77,6 +78,22 @@ TEST(TimestampTextTest, CountsFrom1904AndShowsNoTimeAndRoundedMilliseconds) {
     EXPECT_EQ("(no time)",
               ValueForPeople(PropertyValue(uxSysAttrTimestampUTC{0, 0}), NumberStyle::kDecimal));
     EXPECT_EQ("null", ValueAsJson(PropertyValue(uxSysAttrTimestampUTC{0, 0})));
+}
+
+// 2100-01-01 round-trips where time_t has 64 bits; where it has 32 bits (ARMv7 Linux) it is
+// refused both ways rather than wrapped to 1901 or read as 1969.
+TEST(TimestampTextTest, TimesBeyondTimeTAreRefusedNotWrapped) {
+    const int64_t year2100 = 4102444800 + kSecondsFrom1904To1970;
+    const std::optional<uxSysAttrTimestampUTC> parsed =
+        TimestampFromIso8601("2100-01-01T00:00:00Z");
+    if (sizeof(time_t) >= sizeof(int64_t)) {
+        ASSERT_TRUE(parsed.has_value());
+        EXPECT_EQ(year2100, parsed->seconds);
+        EXPECT_EQ("2100-01-01T00:00:00Z", TimestampToIso8601({0, year2100}));
+    } else {
+        EXPECT_FALSE(parsed.has_value());
+        EXPECT_EQ("", TimestampToIso8601({0, year2100}));
+    }
 }
 
 TEST(ValueTextTest, MasksShowInHexadecimalAndJsonKeepsTypes) {

@@ -245,7 +245,9 @@ HRESULT HostPropertyBag::GetTimestampFields(uint32_t tag, int32_t fields[6]) {
     }
     const time_t posixSeconds = static_cast<time_t>(time.seconds - kSecondsFrom1904To1970);
     struct tm local {};
-    if (localtime_r(&posixSeconds, &local) == nullptr) {
+    // A time that time_t cannot hold (past January 2038 where it has 32 bits) has no fields.
+    if (static_cast<int64_t>(posixSeconds) != time.seconds - kSecondsFrom1904To1970 ||
+        localtime_r(&posixSeconds, &local) == nullptr) {
         return status;
     }
     const int32_t values[6] = {local.tm_year + 1900, local.tm_mon + 1, local.tm_mday,

@@ -3,6 +3,7 @@
 #include <time.h>
 
 #include <cctype>
+#include <cerrno>
 #include <cmath>
 #include <cstdio>
 #include <limits>
@@ -67,6 +68,10 @@ std::string TimestampToIso8601(const uxSysAttrTimestampUTC& time) {
         return std::string();
     }
     const time_t posixSeconds = static_cast<time_t>(seconds - kSecondsFrom1904To1970);
+    // Where time_t has 32 bits, a time past January 2038 would otherwise wrap to 1901.
+    if (static_cast<int64_t>(posixSeconds) != seconds - kSecondsFrom1904To1970) {
+        return std::string();
+    }
     struct tm fields {};
     if (gmtime_r(&posixSeconds, &fields) == nullptr) {
         return std::string();
@@ -123,7 +128,12 @@ std::optional<uxSysAttrTimestampUTC> TimestampFromIso8601(const std::string& tex
     fields.tm_year = year - 1900;
     fields.tm_mon = month - 1;
     const struct tm requested = fields;
+    errno = 0;
     const time_t posixSeconds = timegm(&fields);
+    // A date that time_t cannot hold (past January 2038 where it has 32 bits).
+    if (posixSeconds == -1 && errno == EOVERFLOW) {
+        return std::nullopt;
+    }
     // timegm normalises out-of-range fields; a date that changed on the way did not exist.
     if (fields.tm_year != requested.tm_year || fields.tm_mon != requested.tm_mon ||
         fields.tm_mday != requested.tm_mday || fields.tm_hour != requested.tm_hour ||

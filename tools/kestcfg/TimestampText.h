@@ -17,7 +17,8 @@ bool IsNoTime(const uxSysAttrTimestampUTC& time);
 std::string TimestampToIso8601(const uxSysAttrTimestampUTC& time);
 
 // Parses "YYYY-MM-DDTHH:MM:SS" with an optional fraction of up to nine digits and a final "Z"
-// (UTC); a blank may replace the "T". Nothing for any other text or an impossible date.
+// (UTC); a blank may replace the "T". Nothing for any other text, an impossible date or one
+// that the system's time_t cannot hold.
 std::optional<uxSysAttrTimestampUTC> TimestampFromIso8601(const std::string& text);
 
 // The current time of the real-time clock.
