@@ -2,8 +2,8 @@
 # toolchain (crossbuild-essential-armhf); the built programs and tests run under qemu-arm.
 #
 # KEST_ARMHF_SYSROOT (environment, or the default below) is a folder that holds the ARM Boost
-# libraries unpacked from Debian's armhf packages, an ARM build of GoogleTest and a link to the
-# host's architecture-independent Boost headers. scripts/test-armhf prepares it.
+# and inih libraries unpacked from Debian's armhf packages, an ARM build of GoogleTest and a link
+# to the host's architecture-independent Boost headers. scripts/test-armhf prepares it.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR arm)
 set(CMAKE_LIBRARY_ARCHITECTURE arm-linux-gnueabihf)
@@ -29,9 +29,9 @@ set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
 # Boost comes without its package configuration files: let FindBoost search by file names.
 set(Boost_NO_BOOST_CMAKE ON)
 
-# ctest and test discovery run every ARM program through qemu-arm. The variables reach the
-# emulated program's environment too, so a test that starts another built program under the
-# same emulator (through KEST_TEST_EMULATOR, see tests/) finds the ARM loader and libraries.
+# ctest and test discovery run every ARM program through qemu-arm, with the ARM loader and
+# libraries. Tests that start a built program themselves use the same command (see
+# KEST_TEST_EMULATOR in tests/kestcfg).
 set(CMAKE_CROSSCOMPILING_EMULATOR
     /usr/bin/env QEMU_LD_PREFIX=/usr/arm-linux-gnueabihf
     QEMU_SET_ENV=LD_LIBRARY_PATH=${KEST_ARMHF_LIBRARY_DIR} /usr/bin/qemu-arm)
