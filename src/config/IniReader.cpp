@@ -231,10 +231,10 @@ class ScopedDescriptor {
 
 }  // namespace
 
-bool ContinuesSplitValue(std::string_view keyName) {
+bool IsPieceName(std::string_view keyName) {
     uint32_t number = 0;
     size_t baseLength = 0;
-    return LineNumber(keyName, &number, &baseLength) && number != 1;
+    return LineNumber(keyName, &number, &baseLength);
 }
 
 void ParseIni(std::string_view text, uint32_t readFlags, IniDocument& document) {

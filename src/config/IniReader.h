@@ -10,9 +10,9 @@
 
 namespace kest_ini {
 
-// True when a key of this name, following a split value's pieces, is joined to that value: its
-// name ends in " Line" and a number other than 1.
-bool ContinuesSplitValue(std::string_view keyName);
+// True when the reader treats a key of this name as a piece of a split value: its name ends in
+// " Line" and a number that fits 32 bits.
+bool IsPieceName(std::string_view keyName);
 
 // Parses `text` (already past any byte-order mark) into `document`, which must be empty.
 void ParseIni(std::string_view text, uint32_t readFlags, IniDocument& document);

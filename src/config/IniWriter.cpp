@@ -82,14 +82,22 @@ void AppendKeyLine(std::string_view name, std::string_view separator, char quote
     out += '\n';
 }
 
-// Writes the key line, split over numbered " Line" keys when it is too long and `splittable`.
-int AppendKey(const IniKey& key, const WriteOptions& options, bool splittable, std::string& out) {
+// Writes the key line, split over numbered " Line" keys when it is too long. A key whose own name
+// reads as a piece is always written with the suffix " Line0001", which the reader strips again:
+// written plainly it would lose its own suffix or be joined to the key before it.
+int AppendKey(const IniKey& key, const WriteOptions& options, std::string& out) {
     std::string_view separator = (options.flags & kIniWriteSpacedSeparator) != 0 ? " = " : "=";
     int quoteLength = key.quote != 0 ? 2 : 0;
     size_t lineLength = key.name.size() + separator.size() + key.value.size() + quoteLength;
-    if (!splittable || options.maxLineLength <= 0 ||
-        lineLength <= static_cast<size_t>(options.maxLineLength)) {
-        AppendKeyLine(key.name, separator, key.quote, key.value, out);
+    bool fits =
+        options.maxLineLength <= 0 || lineLength <= static_cast<size_t>(options.maxLineLength);
+    if (fits) {
+        if (IsPieceName(key.name)) {
+            out += key.name;
+            AppendKeyLine(" Line0001", separator, key.quote, key.value, out);
+        } else {
+            AppendKeyLine(key.name, separator, key.quote, key.value, out);
+        }
         return 0;
     }
     long long limit = static_cast<long long>(options.maxLineLength) - kSplitOverhead -
@@ -196,10 +204,7 @@ int FormatIni(const IniDocument& document, const WriteOptions& options, std::str
             if (comments) {
                 AppendLines(key.comments, out);
             }
-            // Pieces followed by a key that reads as a further piece would take that key in.
-            bool splittable =
-                k + 1 == section.keys.Size() || !ContinuesSplitValue(section.keys.At(k + 1).name);
-            int result = AppendKey(key, options, splittable, out);
+            int result = AppendKey(key, options, out);
             if (result < 0) {
                 return result;
             }

@@ -2,6 +2,7 @@
 // saved and loaded again.
 #include <ostream>
 #include <string>
+#include <utility>
 
 #include "IniTestSupport.h"
 
@@ -68,27 +69,34 @@ TEST(IniReadBackMarkTest, NamesThatLookLikeAByteOrderMarkReadBack) {
     }
 }
 
-// A value followed by a key whose name reads as a further piece of it (" Line" and a number
-// other than 1) is written on one line, so that key is not joined to it when loading.
+// Keys whose own names read as pieces of a split value (" Line" and a number) come back under
+// their own names, whether they follow a split value or fit on one line, with or without a
+// maximum line length.
 TEST(IniReadBackPiecesTest, KeysNamedLikePiecesStayKeys) {
     TempSysroot dir;
     const std::string longValue(60, 'v');
-    IniTextPtr ini(IniText_Create());
-    IniText_SetRaw(ini.get(), "S", "a", longValue.c_str(), 0);
-    IniText_SetRaw(ini.get(), "S", "b Line2", "other key", 0);
-    IniText_SetRaw(ini.get(), "S", "c", longValue.c_str(), 0);
-    IniText_SetRaw(ini.get(), "S", "d", longValue.c_str(), 0);
-    IniText_SetRaw(ini.get(), "S", "d Line0009", "literal", 0);
-    const std::string saved = SavedText(dir, ini.get(), 0, 40);
-    EXPECT_NE(saved.find("\na=" + longValue + "\n"), std::string::npos) << saved;
-    EXPECT_NE(saved.find("c Line0002="), std::string::npos) << saved;
-    IniTextPtr loaded = LoadFromBytes(dir, saved);
-    EXPECT_EQ(ValueOf(loaded.get(), "S", "a"), longValue);
-    EXPECT_EQ(ValueOf(loaded.get(), "S", "b Line2"), "other key");
-    EXPECT_EQ(ValueOf(loaded.get(), "S", "c"), longValue);
-    EXPECT_EQ(ValueOf(loaded.get(), "S", "d"), longValue);
-    EXPECT_EQ(ValueOf(loaded.get(), "S", "d Line0009"), "literal");
-    EXPECT_EQ(IniText_GetKeyCount(loaded.get(), "S"), 5);
+    const std::pair<const char*, std::string> keys[] = {
+        {"a", longValue},          {"b Line2", "other key"},  {"c", longValue},
+        {"d", longValue},          {"d Line0009", "literal"}, {"e Line0001", "short"},
+        {"e Line0001 Line7", "x"}, {"f Line1", longValue},
+    };
+    for (int maxLineLength : {kIniNoMaxLineLength, 40}) {
+        IniTextPtr ini(IniText_Create());
+        for (const auto& key : keys) {
+            ASSERT_EQ(IniText_SetRaw(ini.get(), "S", key.first, key.second.c_str(), 0), kIniFound);
+        }
+        const std::string saved = SavedText(dir, ini.get(), 0, maxLineLength);
+        EXPECT_NE(saved.find("\ne Line0001 Line0001=short\n"), std::string::npos) << saved;
+        IniTextPtr loaded = LoadFromBytes(dir, saved);
+        ASSERT_EQ(IniText_GetKeyCount(loaded.get(), "S"), 8) << saved;
+        for (int k = 1; k <= 8; ++k) {
+            const char* name = nullptr;
+            const char* value = nullptr;
+            ASSERT_EQ(IniText_GetKeyByIndex(loaded.get(), "S", k, &name, &value), kIniFound);
+            EXPECT_STREQ(name, keys[k - 1].first) << saved;
+            EXPECT_EQ(value, keys[k - 1].second) << saved;
+        }
+    }
 }
 
 // With unique names a joined run that takes the name of another key merges with it, the later
