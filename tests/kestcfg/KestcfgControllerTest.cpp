@@ -2,6 +2,7 @@
 // their output for people and as JSON, and their exit codes.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <regex>
 #include <string>
 #include <vector>
@@ -73,6 +74,11 @@ TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
     for (const std::vector<std::string>& row : rows) {
         EXPECT_TRUE(HasRow(result.out, row[0], row[1], row[2], row[3])) << row[1];
     }
+
+    // The chassis shows its whole catalogue: the heading, the base rows and its own rows, the
+    // host name once.
+    const RunResult chassis = RunKestcfg({"get", kChassis});
+    EXPECT_EQ(33, std::count(chassis.out.begin(), chassis.out.end(), '\n')) << chassis.out;
 
     const RunResult adapter = RunKestcfg({"get", "ETH0"});
     EXPECT_EQ(0, adapter.exitCode) << adapter.err;
@@ -183,6 +189,23 @@ TEST_F(KestcfgControllerTest, SetOfTheClockWritesTheTimeAndRunsTheHardwareClockS
     EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot_.ReadFile("/var/log/hwclock.log"));
 }
 
+TEST_F(KestcfgControllerTest, SetChangesTheTimeZoneInEitherNotation) {
+    for (const char* zone : {"America/Chicago", "America/Los_Angeles"}) {
+        sysroot_.WriteFile(std::string("/usr/share/zoneinfo/") + zone, "TZif");
+    }
+    const RunResult olson = RunKestcfg({"set", kChassis, "time-zone=America/Chicago"});
+    EXPECT_EQ(0, olson.exitCode) << olson.err;
+    EXPECT_NE(std::string::npos, State().find("TimeZone=America/Chicago"));
+    EXPECT_TRUE(HasRow(RunKestcfg({"get", kChassis}).out, "0x0D120000", "legacy-time-zone", "text",
+                       "CST6CDT"));
+
+    const RunResult legacy = RunKestcfg({"set", kChassis, "legacy-time-zone=PST8PDT"});
+    EXPECT_EQ(0, legacy.exitCode) << legacy.err;
+    EXPECT_NE(std::string::npos, State().find("TimeZone=America/Los_Angeles"));
+    EXPECT_TRUE(HasRow(RunKestcfg({"get", kChassis}).out, "0x0D14E000", "time-zone", "text",
+                       "America/Los_Angeles"));
+}
+
 TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndChangeNothing) {
     struct Case {
         std::vector<std::string> arguments;
@@ -200,6 +223,18 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
          "address and gateway must be on the same subnet."},
         {{"set", "eth0", "subnet-mask=255.0.255.0"},
          "eth0 rejected the change with UX_E_SUBNET_MASK_INVALID (0x80040473)\n"},
+        {{"set", kChassis, "comment=" + std::string(65, 'c')},
+         "VQ KEST Chassis rejected the change with UX_E_VALUE_INVALID (0x8004037F): Comment "
+         "length cannot exceed 64 characters."},
+        {{"set", kChassis, "locale=e"},
+         "VQ KEST Chassis rejected the change with UX_E_VALUE_INVALID (0x8004037F): Locale not "
+         "supported."},
+        {{"set", kChassis, "legacy-time-zone=NFT-11:30"},
+         "VQ KEST Chassis rejected the change with UX_E_VALUE_INVALID (0x8004037F): Timezone not "
+         "supported."},
+        {{"set", kChassis, "current-time=1969-12-31T23:59:59Z"},
+         "VQ KEST Chassis rejected the change with UX_E_VALUE_INVALID (0x8004037F): Timestamps "
+         "older than 1970 are not supported."},
         {{"set", kChassis, "serial-number=00000001", "comment=ok"},
          "VQ KEST Chassis does not accept changes to serial-number; nothing was changed"},
     };
