@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "common/TempSysroot.h"
+#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace {
@@ -15,16 +15,10 @@ namespace {
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
-const char kState[] = "/var/lib/vqtargetcfg/state.ini";
 const char kCallLog[] = "/var/lib/vqtargetcfg/calls.log";
 
-class KestcfgAddressTest : public testing::Test {
+class KestcfgAddressTest : public kestcfg_test::DemoControllerTest {
   protected:
-    void SetUp() override {
-        const RunResult created = RunKestcfg({"sim", "init", sysroot_.Root()});
-        ASSERT_EQ(0, created.exitCode) << created.err;
-    }
-
     // The logged library calls that change the controller, without their times.
     std::vector<std::string> ControllerChanges() const {
         std::vector<std::string> calls;
@@ -37,8 +31,6 @@ class KestcfgAddressTest : public testing::Test {
         }
         return calls;
     }
-
-    kest::test::TempSysroot sysroot_;
 };
 
 TEST_F(KestcfgAddressTest, AddressAndMaskAreStoredAndTheInterfaceRestartsBeforeKestcfgEnds) {
@@ -47,7 +39,7 @@ TEST_F(KestcfgAddressTest, AddressAndMaskAreStoredAndTheInterfaceRestartsBeforeK
     ASSERT_EQ(0, result.exitCode) << result.err;
     EXPECT_EQ("eth0: ip-address set to 192.168.10.30\neth0: subnet-mask set to 255.255.0.0\n",
               result.out);
-    const std::string state = sysroot_.ReadFile(kState);
+    const std::string state = State();
     EXPECT_NE(std::string::npos, state.find("IPAddress=192.168.10.30\nSubnetMask=255.255.0.0\n"))
         << state;
     const std::vector<std::string> expected = {
@@ -69,7 +61,7 @@ TEST_F(KestcfgAddressTest, AddressAndMaskAreStoredAndTheInterfaceRestartsBeforeK
 }
 
 TEST_F(KestcfgAddressTest, PairsThatDoNotFitTheGatewayAreRefusedWithTheirMessage) {
-    const std::string before = sysroot_.ReadFile(kState);
+    const std::string before = State();
     const struct {
         const char* address;
         const char* mask;
@@ -93,7 +85,7 @@ TEST_F(KestcfgAddressTest, PairsThatDoNotFitTheGatewayAreRefusedWithTheirMessage
                   result.err.find(std::string("eth0 rejected the change with ") + entry.message))
             << result.err;
     }
-    EXPECT_EQ(before, sysroot_.ReadFile(kState));
+    EXPECT_EQ(before, State());
     EXPECT_TRUE(ControllerChanges().empty());
 }
 

@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "common/TempSysroot.h"
+#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace {
@@ -17,21 +17,7 @@ using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
 const char kChassis[] = "VQ KEST Chassis";
-const char kState[] = "/var/lib/vqtargetcfg/state.ini";
-
-// A fresh demo controller; KEST_SYSROOT names it for the test's lifetime, so kestcfg finds it
-// through the environment unless a test passes --sysroot.
-class KestcfgControllerTest : public testing::Test {
-  protected:
-    void SetUp() override {
-        const RunResult created = RunKestcfg({"sim", "init", sysroot_.Root()});
-        ASSERT_EQ(0, created.exitCode) << created.err;
-    }
-
-    std::string State() const { return sysroot_.ReadFile(kState); }
-
-    kest::test::TempSysroot sysroot_;
-};
+class KestcfgControllerTest : public kestcfg_test::DemoControllerTest {};
 
 // True when `text` has a table row: the tag, the name, the type and the value, blank-separated.
 bool HasRow(const std::string& text, const std::string& tag, const std::string& name,
@@ -116,8 +102,8 @@ TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
         << unknownItem.err;
 
     // A current language the chassis does not know makes its properties unreadable.
-    sysroot_.WriteFile(kState, std::regex_replace(State(), std::regex("LanguageName = English"),
-                                                  "LanguageName = Klingon"));
+    sysroot_.WriteFile(kStatePath, std::regex_replace(State(), std::regex("LanguageName = English"),
+                                                      "LanguageName = Klingon"));
     const RunResult unreadable = RunKestcfg({"--json", "get"});
     EXPECT_EQ(3, unreadable.exitCode);
     const std::string flat = FlattenJsonLines(unreadable.out);
