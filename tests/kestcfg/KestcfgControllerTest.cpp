@@ -12,7 +12,7 @@
 
 namespace {
 
-using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::FlattenJson;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
@@ -34,7 +34,7 @@ TEST_F(KestcfgControllerTest, ItemsListsTheChassisAndItsAdapter) {
 
     const RunResult json = RunKestcfg({"--sysroot", sysroot_.Root(), "--json", "items"});
     EXPECT_EQ(0, json.exitCode) << json.err;
-    EXPECT_EQ("0/item=\"VQ KEST Chassis\"\n1/item=\"eth0\"\n", FlattenJsonLines(json.out));
+    EXPECT_EQ("items/0=\"VQ KEST Chassis\"\nitems/1=\"eth0\"\n", FlattenJson(json.out));
 }
 
 TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
@@ -73,25 +73,25 @@ TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
     EXPECT_EQ(std::string::npos, adapter.out.find("host-name  text  kest-demo"));
 }
 
-TEST_F(KestcfgControllerTest, GetAsJsonHasOneObjectPerItemWithTypedValues) {
+TEST_F(KestcfgControllerTest, GetAsJsonHasOneDocumentWithAnEntryPerItemWithTypedValues) {
     const RunResult result = RunKestcfg({"--json", "get"});
     ASSERT_EQ(0, result.exitCode) << result.err;
-    const std::string flat = FlattenJsonLines(result.out);
+    const std::string flat = FlattenJson(result.out);
     for (const char* expected : {
-             "0/item=\"VQ KEST Chassis\"\n",
-             "0/properties/host-name/tag=\"0x0101F000\"\n",
-             "0/properties/host-name/type=\"text\"\n",
-             "0/properties/host-name/value=\"kest-demo\"\n",
-             "0/properties/web-service/value=false\n",
-             "0/properties/time-zone-offset/value=60\n",
-             "1/item=\"eth0\"\n",
-             "1/properties/polling-interval/value=100\n",
-             "1/properties/supported-adapter-modes/value=11\n",
-             "1/properties/primary-adapter/value=true\n",
+             "items/0/item=\"VQ KEST Chassis\"\n",
+             "items/0/properties/host-name/tag=\"0x0101F000\"\n",
+             "items/0/properties/host-name/type=\"text\"\n",
+             "items/0/properties/host-name/value=\"kest-demo\"\n",
+             "items/0/properties/web-service/value=false\n",
+             "items/0/properties/time-zone-offset/value=60\n",
+             "items/1/item=\"eth0\"\n",
+             "items/1/properties/polling-interval/value=100\n",
+             "items/1/properties/supported-adapter-modes/value=11\n",
+             "items/1/properties/primary-adapter/value=true\n",
          }) {
         EXPECT_NE(std::string::npos, flat.find(expected)) << expected;
     }
-    EXPECT_EQ(std::string::npos, flat.find("\n2/"));
+    EXPECT_EQ(std::string::npos, flat.find("\nitems/2/"));
 }
 
 TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
@@ -106,11 +106,12 @@ TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
                                                       "LanguageName = Klingon"));
     const RunResult unreadable = RunKestcfg({"--json", "get"});
     EXPECT_EQ(3, unreadable.exitCode);
-    const std::string flat = FlattenJsonLines(unreadable.out);
+    const std::string flat = FlattenJson(unreadable.out);
     EXPECT_NE(std::string::npos,
-              flat.find("0/error/status=\"E_FAIL\"\n0/error/code=\"0x80004005\""))
+              flat.find("items/0/error/status=\"E_FAIL\"\nitems/0/error/code=\"0x80004005\""))
         << flat;
-    EXPECT_NE(std::string::npos, flat.find("1/item=\"eth0\"")) << "the adapter is still shown";
+    EXPECT_NE(std::string::npos, flat.find("items/1/item=\"eth0\""))
+        << "the adapter is still shown";
 
     // The chassis judges only the changed properties, so a change can still repair it.
     const RunResult repaired = RunKestcfg({"set", kChassis, "locale=de"});
@@ -132,10 +133,10 @@ TEST_F(KestcfgControllerTest, RefreshReadsTheRequestedPropertiesByNameOrNumber) 
     const RunResult partly = RunKestcfg({"--json", "refresh", "eth0", "gateway", "0x0ABCD000"});
     EXPECT_EQ(0, partly.exitCode) << partly.err;
     EXPECT_EQ(
-        "0/item=\"eth0\"\n0/properties/gateway/tag=\"0x0D10A000\"\n"
-        "0/properties/gateway/type=\"text\"\n0/properties/gateway/value=\"192.168.10.1\"\n"
-        "0/missing/0=\"0x0ABCD000\"\n",
-        FlattenJsonLines(partly.out));
+        "item=\"eth0\"\nproperties/gateway/tag=\"0x0D10A000\"\n"
+        "properties/gateway/type=\"text\"\nproperties/gateway/value=\"192.168.10.1\"\n"
+        "missing/0=\"0x0ABCD000\"\n",
+        FlattenJson(partly.out));
     EXPECT_NE(std::string::npos, partly.err.find("eth0 did not provide 0x0ABCD000"));
 
     EXPECT_EQ(3, RunKestcfg({"refresh", "eth0", "0x0ABCD000"}).exitCode);
@@ -154,9 +155,9 @@ TEST_F(KestcfgControllerTest, SetPersistsAValidatedChangeThatTheNextReadShows) {
         RunKestcfg({"--json", "set", kChassis, "host-name=line-4", "0x0103D000=Bay 4, Line 4"});
     EXPECT_EQ(0, renamed.exitCode) << renamed.err;
     EXPECT_EQ(
-        "0/item=\"VQ KEST Chassis\"\n0/accepted=true\n0/changed/host-name=\"line-4\"\n"
-        "0/changed/comment=\"Bay 4, Line 4\"\n0/restartRequired=true\n",
-        FlattenJsonLines(renamed.out));
+        "item=\"VQ KEST Chassis\"\naccepted=true\nchanged/host-name=\"line-4\"\n"
+        "changed/comment=\"Bay 4, Line 4\"\nrestartRequired=true\n",
+        FlattenJson(renamed.out));
     EXPECT_NE(std::string::npos, State().find("HostName=line-4"));
     EXPECT_NE(std::string::npos, State().find("UserComment=Bay 4, Line 4"));
 
@@ -237,9 +238,47 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
     const RunResult json = RunKestcfg({"--json", "set", "eth0", "polling-interval=0"});
     EXPECT_EQ(1, json.exitCode);
     EXPECT_EQ(
-        "0/item=\"eth0\"\n0/accepted=false\n0/status=\"UX_E_VALUE_INVALID\"\n"
-        "0/code=\"0x8004037F\"\n0/message=\"Polling interval must be between 1 and 10000 ms.\"\n",
-        FlattenJsonLines(json.out));
+        "item=\"eth0\"\naccepted=false\nmessage=\"Polling interval must be between 1 and 10000 "
+        "ms.\"\nerror/exitStatus=1\nerror/message=\"eth0 rejected the change with "
+        "UX_E_VALUE_INVALID (0x8004037F): Polling interval must be between 1 and 10000 ms.\"\n"
+        "error/status=\"UX_E_VALUE_INVALID\"\nerror/code=\"0x8004037F\"\n",
+        FlattenJson(json.out));
+}
+
+TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStandardOutput) {
+    sysroot_.WriteFile("/etc/korvane/share/vqsysdiag.ini",
+                       "[AllComponents]\nSeverity = 255\nTarget = 2\nLowDiskThreshold = 0\n");
+    const std::vector<std::pair<std::vector<std::string>, std::string>> runs = {
+        {{"items"}, "items/1=\"eth0\"\n"},
+        {{"get"}, "items/1/properties/polling-interval/value=100\n"},
+        {{"get", "chassis", "comment"}, "/value=\"Demo controller on a desk\"\n"},
+        {{"refresh", "eth0", "gateway"}, "properties/gateway/value=\"192.168.10.1\"\n"},
+        {{"set", "eth0", "polling-interval=200"}, "changed/polling-interval=200\n"},
+        {{"set", "eth0", "polling-interval=0"}, "error/exitStatus=1\n"},
+        {{"get", "eth7"}, "error/exitStatus=3\n"},
+        {{"get", "eth0", "no-such-name"}, "error/exitStatus=2\n"},
+    };
+    for (const auto& [arguments, expected] : runs) {
+        SCOPED_TRACE(testing::PrintToString(arguments));
+        std::vector<std::string> withJson = arguments;
+        withJson.insert(withJson.begin() + 1, "--json");
+        const RunResult result = RunKestcfg(withJson);
+        EXPECT_NE(std::string::npos, FlattenJson(result.out).find(expected)) << result.out;
+        EXPECT_NE(std::string::npos, result.err.find("CuxNetConfigExpert::Initialize()"))
+            << "traced";
+    }
+}
+
+TEST_F(KestcfgControllerTest, ControlCharactersAreEscapedInTablesAndKeptInJson) {
+    ASSERT_EQ(0, RunKestcfg({"set", "chassis", "comment=red\x1b[31m\x07 \xc2\x9b!"}).exitCode);
+    const RunResult table = RunKestcfg({"get", "chassis", "comment"});
+    EXPECT_TRUE(
+        HasRow(table.out, "0x0103D000", "comment", "text", "red\\\\x1B\\[31m\\\\x07 \\\\u009B!"))
+        << table.out;
+    EXPECT_EQ(std::string::npos, table.out.find('\x1b'));
+    EXPECT_NE(std::string::npos,
+              FlattenJson(RunKestcfg({"get", "chassis", "comment", "--json"}).out)
+                  .find("value=\"red\\u001b[31m\\u0007 \xc2\x9b!\""));
 }
 
 TEST_F(KestcfgControllerTest, SetCommandLineMistakesAreUsageErrorsThatChangeNothing) {

@@ -84,15 +84,14 @@ inline RunResult RunKestcfg(const std::vector<std::string>& arguments) {
     return RunProgram(launcher, command);
 }
 
-// Parses `jsonLines` (one JSON document per line) with python3 and returns every scalar as a
-// line "LINE/KEY/KEY=JSON", for example 0/properties/host-name/value="kest-demo". A document
-// that does not parse fails the test.
-inline std::string FlattenJsonLines(const std::string& jsonLines) {
+// Parses `json` with python3 as exactly one JSON document and returns every scalar as a line
+// "KEY/KEY=JSON", for example items/0/properties/host-name/value="kest-demo". Text that is not
+// one JSON document fails the test.
+inline std::string FlattenJson(const std::string& json) {
     char path[] = "/tmp/kestcfg-json-XXXXXX";
     const int fd = mkstemp(path);
     EXPECT_GE(fd, 0);
-    EXPECT_EQ(static_cast<ssize_t>(jsonLines.size()),
-              write(fd, jsonLines.data(), jsonLines.size()));
+    EXPECT_EQ(static_cast<ssize_t>(json.size()), write(fd, json.data(), json.size()));
     close(fd);
     static const char kFlatten[] =
         "import json, sys\n"
@@ -103,11 +102,10 @@ inline std::string FlattenJsonLines(const std::string& jsonLines) {
         "        for index, item in enumerate(value): walk(path + [str(index)], item)\n"
         "    else:\n"
         "        print('/'.join(path) + '=' + json.dumps(value, ensure_ascii=False))\n"
-        "for number, line in enumerate(open(sys.argv[1], encoding='utf-8')):\n"
-        "    walk([str(number)], json.loads(line))\n";
+        "walk([], json.load(open(sys.argv[1], encoding='utf-8')))\n";
     const RunResult parsed = RunProgram("/usr/bin/python3", {"-c", kFlatten, path});
     unlink(path);
-    EXPECT_EQ(0, parsed.exitCode) << "not JSON lines:\n" << jsonLines << parsed.err;
+    EXPECT_EQ(0, parsed.exitCode) << "not one JSON document:\n" << json << parsed.err;
     return parsed.out;
 }
 

@@ -8,7 +8,7 @@
 
 namespace {
 
-using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::FlattenJson;
 using kestcfg_test::ReadWhole;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunProgram;
@@ -24,13 +24,13 @@ TEST(KestcfgSimTest, InitCreatesTheControllerFilesWithTheShippedTimeZoneTable) {
     const std::string root = sysroot.Root() + "/controller";
     const RunResult result = RunKestcfg({"--json", "sim", "init", root});
     ASSERT_EQ(0, result.exitCode) << result.err;
-    EXPECT_EQ("0/sysroot=\"" + root +
-                  "\"\n0/files/0=\"/etc/korvane/version\"\n"
-                  "0/files/1=\"/etc/korvane/share/vqsysdiag.ini\"\n"
-                  "0/files/2=\"/usr/share/vqsysapi/timezone.ini\"\n0/files/3=\"/sbin/hwclock\"\n"
-                  "0/files/4=\"/usr/local/korvane/bin/fwupdate\"\n0/files/5=\"/dev/rtc0\"\n"
-                  "0/files/6=\"/var/lib/vqtargetcfg/state.ini\"\n",
-              FlattenJsonLines(result.out));
+    EXPECT_EQ("sysroot=\"" + root +
+                  "\"\nfiles/0=\"/etc/korvane/version\"\n"
+                  "files/1=\"/etc/korvane/share/vqsysdiag.ini\"\n"
+                  "files/2=\"/usr/share/vqsysapi/timezone.ini\"\nfiles/3=\"/sbin/hwclock\"\n"
+                  "files/4=\"/usr/local/korvane/bin/fwupdate\"\nfiles/5=\"/dev/rtc0\"\n"
+                  "files/6=\"/var/lib/vqtargetcfg/state.ini\"\n",
+              FlattenJson(result.out));
     EXPECT_EQ("22.5.0\n", ReadWhole(root + "/etc/korvane/version"));
     EXPECT_EQ(ReadWhole(KESTCFG_SOURCE_DATA_DIR "/timezone.ini"),
               ReadWhole(root + "/usr/share/vqsysapi/timezone.ini"));

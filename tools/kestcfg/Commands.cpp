@@ -1,31 +1,37 @@
 #include "Commands.h"
 
-#include <cstdint>
-
 const std::vector<CommandDescription>& AllCommands() {
+    static const char kItemHelp[] = "the item: its name as 'kestcfg items' lists it, or chassis";
     static const std::vector<CommandDescription> commands = {
-        {"info", "info", "show the expert's identity", 0, 0, ExpertUse::kIdentity, &RunInfo},
-        {"items", "items", "list the configurable items", 0, 0, ExpertUse::kItems, &RunItems},
-        {"get", "get [ITEM]", "show all properties of every item, or of ITEM", 0, 1,
-         ExpertUse::kItems, &RunGet},
-        {"refresh", "refresh ITEM TAG...", "read the named properties of ITEM afresh", 2, SIZE_MAX,
-         ExpertUse::kItems, &RunRefresh},
-        {"set", "set ITEM NAME=VALUE...", "validate and persist changed properties of ITEM", 2,
-         SIZE_MAX, ExpertUse::kItems, &RunSet},
-        {"firmware", "firmware ITEM IMAGE",
-         "install the firmware image file IMAGE on ITEM, showing the update's progress", 2, 2,
-         ExpertUse::kItems, &RunFirmware},
-        {"sim", "sim init DIR", "create a demo controller under DIR (use DIR as the sysroot)", 2, 2,
-         ExpertUse::kNone, &RunSim},
+        {"info", "show the expert's identity", {}, ExpertUse::kIdentity, &RunInfo},
+        {"items", "list the configurable items", {}, ExpertUse::kItems, &RunItems},
+        {"get",
+         "show the properties of every item, or of ITEM, or only the NAMEd ones",
+         {{"ITEM", kItemHelp, false, false},
+          {"NAME", "a property name or tag number", false, true}},
+         ExpertUse::kItems,
+         &RunGet},
+        {"refresh",
+         "read the named properties of ITEM afresh",
+         {{"ITEM", kItemHelp, true, false}, {"TAG", "a property name or tag number", true, true}},
+         ExpertUse::kItems,
+         &RunRefresh},
+        {"set",
+         "validate and persist changed properties of ITEM, and report what was stored",
+         {{"ITEM", kItemHelp, true, false},
+          {"NAME=VALUE", "a property and its new value", true, true}},
+         ExpertUse::kItems,
+         &RunSet},
+        {"firmware",
+         "install the firmware image file IMAGE on ITEM, showing the update's progress",
+         {{"ITEM", kItemHelp, true, false}, {"IMAGE", "the firmware image file", true, false}},
+         ExpertUse::kItems,
+         &RunFirmware},
+        {"sim init",
+         "create a demo controller under DIR (use DIR as the sysroot)",
+         {{"DIR", "a new directory, or an empty one of your own", true, false}},
+         ExpertUse::kNone,
+         &RunSim},
     };
     return commands;
-}
-
-const CommandDescription* FindCommand(const std::string& name) {
-    for (const CommandDescription& command : AllCommands()) {
-        if (command.name == name) {
-            return &command;
-        }
-    }
-    return nullptr;
 }

@@ -1,12 +1,12 @@
 // kestcfg's commands: each one drives the expert through its host interfaces, or prepares files,
-// and prints the result as text for people or as JSON for scripts.
+// and prints the result as text for people or into one JSON document for scripts.
 #pragma once
 
-#include <cstddef>
 #include <ostream>
 #include <string>
 #include <vector>
 
+#include "JsonOutput.h"
 #include "uxsys/Expert.h"
 
 // What a command needs of the plug-in.
@@ -16,20 +16,37 @@ enum class ExpertUse {
     kItems,     // an expert between Initialize and Uninitialize
 };
 
+// The options that apply to every command, and those of single commands.
+struct CommandOptions {
+    std::string sysroot;  // empty: KEST_SYSROOT is left as it is
+    std::string plugin;   // empty: the plug-in next to the program
+    bool json = false;
+    bool noWait = false;  // fail at once when another kestcfg holds the controller
+    bool check = false;   // apply: validate and show the difference only
+    bool diff = false;    // apply: show each difference with its old and new value
+};
+
 struct CommandContext {
     IuxSysExpert3* expert;  // null for commands that do not use the plug-in
     const std::vector<std::string>& arguments;
-    bool json;
-    std::ostream& out;
+    const CommandOptions& options;
+    Json& document;     // the --json result; written once the plug-in is unloaded
+    std::ostream& out;  // text for people; unused with --json
     std::ostream& err;  // warnings and notes
 };
 
+// A positional argument of a command, as its help shows it.
+struct ArgumentDescription {
+    const char* name;
+    const char* help;
+    bool required;
+    bool repeated;  // takes every remaining argument
+};
+
 struct CommandDescription {
-    std::string name;
-    std::string synopsis;  // the command with its arguments, as the usage text shows it
+    std::string name;  // "sim init" for a command of a command group
     std::string summary;
-    size_t minArguments;
-    size_t maxArguments;  // SIZE_MAX: no limit
+    std::vector<ArgumentDescription> arguments;
     ExpertUse expertUse;
     // Runs the command; throws CommandFailure to end with a message and an exit code.
     void (*run)(CommandContext& context);
@@ -37,9 +54,6 @@ struct CommandDescription {
 
 // Every command, in the order the usage text lists them.
 const std::vector<CommandDescription>& AllCommands();
-
-// The command called `name`, or null.
-const CommandDescription* FindCommand(const std::string& name);
 
 // The commands' bodies.
 void RunInfo(CommandContext& context);

@@ -124,7 +124,7 @@ void RunFirmware(CommandContext& context) {
         throw Failure("the plug-in could not start the update (" + StatusWithName(started) + ")");
     }
 
-    FollowUpdate(firmware.Get(), item, context.json, context.err);
+    FollowUpdate(firmware.Get(), item, context.options.json, context.err);
     // The tool may still run after a failure read from its status file; Uninitialize waits for
     // it, and its ending decides the final state.
     context.expert->Uninitialize();
@@ -132,14 +132,13 @@ void RunFirmware(CommandContext& context) {
     firmware->GetFirmwareUpdateStatus(item.c_str(), &final.state, &final.percent);
 
     const std::string id = TakeHostString(updateId.Release());
-    if (context.json) {
-        context.out << "{\"item\":" << JsonQuoted(ItemText(item))
-                    << ",\"update\":" << JsonQuoted(id)
-                    << ",\"state\":" << JsonQuoted(StateName(final.state))
-                    << ",\"percent\":" << final.percent << "}\n";
-    } else {
-        context.out << "firmware update " << id << " of " << ItemText(item) << ": "
-                    << StateName(final.state) << "\n";
+    context.document = {{"item", ItemText(item)},
+                        {"update", id},
+                        {"state", StateName(final.state)},
+                        {"percent", final.percent}};
+    if (!context.options.json) {
+        context.out << "firmware update " << PrintableText(id) << " of "
+                    << PrintableText(ItemText(item)) << ": " << StateName(final.state) << "\n";
     }
     if (final.state != UX_FIRMWARE_STATE_INSTALLED) {
         throw CommandFailure(kExitFailure, "");

@@ -1,5 +1,7 @@
 #include "ItemAccess.h"
 
+#include <strings.h>
+
 #include "ExitCodes.h"
 #include "HostText.h"
 #include "StatusNames.h"
@@ -7,6 +9,9 @@
 #include "uxsys/StatusCodes.h"
 
 std::wstring ItemArgument(const std::string& text) {
+    if (strcasecmp(text.c_str(), kChassisAlias) == 0) {
+        return kChassisItem;
+    }
     std::optional<std::wstring> item = WideFromUtf8(text);
     if (!item) {
         throw UsageError("the item name is not valid UTF-8 text");

@@ -45,21 +45,17 @@ void WritePropertyTable(std::ostream& out, const std::vector<PropertyEntry>& ent
     table.Write(out, indent);
 }
 
-std::string PropertiesAsJson(const std::vector<PropertyEntry>& entries) {
-    std::string json = "{";
+Json PropertiesAsJson(const std::vector<PropertyEntry>& entries) {
+    Json json = Json::object();
     for (const PropertyEntry& entry : entries) {
-        if (json.size() > 1) {
-            json += ",";
-        }
-        json +=
-            JsonQuoted(TagDisplayName(entry.tag)) + ":{\"tag\":" + JsonQuoted(TagText(entry.tag));
+        Json property = {{"tag", TagText(entry.tag)}};
         if (entry.status < 0) {
-            json += ",\"error\":" + JsonQuoted(StatusWithName(entry.status));
+            property["error"] = StatusWithName(entry.status);
         } else {
-            json += ",\"type\":" + JsonQuoted(TypeCodeName(TypeCodeOf(entry.value))) +
-                    ",\"value\":" + ValueAsJson(entry.value);
+            property["type"] = TypeCodeName(TypeCodeOf(entry.value));
+            property["value"] = ValueAsJson(entry.value);
         }
-        json += "}";
+        json[TagDisplayName(entry.tag)] = std::move(property);
     }
-    return json + "}";
+    return json;
 }

@@ -96,13 +96,9 @@ ExitCode ExitCodeFor(HRESULT status) {
 // Reports a change the plug-in turned down and ends the command.
 [[noreturn]] void Refuse(CommandContext& context, const std::string& item, const char* step,
                          HRESULT status, const std::string& message) {
-    if (context.json) {
-        const std::string name = StatusName(status);
-        context.out << "{\"item\":" << JsonQuoted(item) << ",\"accepted\":false,\"status\":"
-                    << (name.empty() ? std::string("null") : JsonQuoted(name))
-                    << ",\"code\":" << JsonQuoted(StatusText(status))
-                    << ",\"message\":" << (message.empty() ? "null" : JsonQuoted(message)) << "}\n";
-    }
+    context.document = {{"item", item},
+                        {"accepted", false},
+                        {"message", message.empty() ? Json(nullptr) : Json(message)}};
     const bool rejected = IsValueRejection(status);
     std::string text = rejected ? item + " rejected the change with " + StatusWithName(status)
                                 : std::string(step) + " the change of " + item + " failed with " +
@@ -110,7 +106,7 @@ ExitCode ExitCodeFor(HRESULT status) {
     if (!message.empty()) {
         text += ": " + message;
     }
-    throw CommandFailure(ExitCodeFor(status), text);
+    throw CommandFailure(ExitCodeFor(status), text, status);
 }
 
 }  // namespace
@@ -158,14 +154,7 @@ void RunSet(CommandContext& context) {
         for (const std::string& word : refused) {
             list += (list.empty() ? "" : ", ") + word;
         }
-        if (context.json) {
-            context.out << "{\"item\":" << JsonQuoted(itemText)
-                        << ",\"accepted\":false,\"notAccepted\":[";
-            for (size_t i = 0; i < refused.size(); ++i) {
-                context.out << (i == 0 ? "" : ",") << JsonQuoted(refused[i]);
-            }
-            context.out << "]}\n";
-        }
+        context.document = {{"item", itemText}, {"accepted", false}, {"notAccepted", refused}};
         throw CommandFailure(kExitRejectedValue, itemText + " does not accept changes to " + list +
                                                      "; nothing was changed");
     }
@@ -177,25 +166,28 @@ void RunSet(CommandContext& context) {
         Refuse(context, itemText, "persisting", persisted, std::string());
     }
 
-    if (context.json) {
-        context.out << "{\"item\":" << JsonQuoted(itemText) << ",\"accepted\":true,\"changed\":{";
-        for (size_t i = 0; i < assignments.size(); ++i) {
-            context.out << (i == 0 ? "" : ",") << JsonQuoted(TagDisplayName(assignments[i].tag))
-                        << ":" << ValueAsJson(values[i]);
-        }
-        context.out << "},\"restartRequired\":" << (restartRequired != 0 ? "true" : "false")
-                    << "}\n";
+    Json changed = Json::object();
+    for (size_t i = 0; i < assignments.size(); ++i) {
+        changed[TagDisplayName(assignments[i].tag)] = ValueAsJson(values[i]);
+    }
+    context.document = {{"item", itemText},
+                        {"accepted", true},
+                        {"changed", std::move(changed)},
+                        {"restartRequired", restartRequired != 0}};
+    if (context.options.json) {
         return;
     }
     for (size_t i = 0; i < assignments.size(); ++i) {
         const PropertyDescription* description = FindProperty(assignments[i].tag);
-        context.out << itemText << ": " << TagDisplayName(assignments[i].tag) << " set to "
-                    << ValueForPeople(values[i], description != nullptr ? description->style
-                                                                        : NumberStyle::kDecimal)
+        context.out << PrintableText(itemText) << ": " << TagDisplayName(assignments[i].tag)
+                    << " set to "
+                    << PrintableText(ValueForPeople(values[i], description != nullptr
+                                                                   ? description->style
+                                                                   : NumberStyle::kDecimal))
                     << "\n";
     }
     if (!message.empty()) {
-        context.out << itemText << ": " << message << "\n";
+        context.out << PrintableText(itemText) << ": " << PrintableText(message) << "\n";
     }
     if (restartRequired != 0) {
         context.out << "The change takes full effect after the controller restarts.\n";
