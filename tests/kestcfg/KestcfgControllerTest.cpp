@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <regex>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -53,8 +54,9 @@ TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
         {"0x01003000", "fixed-01003", "unsigned", "0x1092"},
         {"0x0D107000", "ip-address", "text", "192\\.168\\.10\\.20"},
         {"0x0D126000", "primary-adapter", "boolean", "true"},
-        {"0x0D102000", "adapter-mode", "unsigned", "0x02"},
-        {"0x0D103000", "supported-adapter-modes", "unsigned", "0x0B"},
+        {"0x0D102000", "adapter-mode", "unsigned", "0x02 tcpip"},
+        {"0x0D103000", "supported-adapter-modes", "unsigned", "0x0B disabled,tcpip,ethercat"},
+        {"0x0D10F000", "preferred-media-mode", "unsigned", "0x01 auto"},
         {"0x0D11B000", "polling-interval", "unsigned", "100"},
     };
     for (const std::vector<std::string>& row : rows) {
@@ -243,6 +245,79 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
         "UX_E_VALUE_INVALID (0x8004037F): Polling interval must be between 1 and 10000 ms.\"\n"
         "error/status=\"UX_E_VALUE_INVALID\"\nerror/code=\"0x8004037F\"\n",
         FlattenJson(json.out));
+}
+
+// The names of the properties a JSON document lists under items/N/properties, one per line, as
+// "ITEM NAME", where N is the item's place; "NAME" is a member name (get) or a "name" (describe).
+std::string PropertyNames(const std::string& flat) {
+    std::string names;
+    std::smatch match;
+    static const std::regex kGet("items/([0-9])/properties/([a-z0-9-]+)/tag=");
+    static const std::regex kDescribe("items/([0-9])/properties/[0-9]+/name=\"([a-z0-9-]+)\"");
+    for (const std::regex* pattern : {&kGet, &kDescribe}) {
+        for (auto it = std::sregex_iterator(flat.begin(), flat.end(), *pattern);
+             it != std::sregex_iterator(); ++it) {
+            names += (*it)[1].str() + " " + (*it)[2].str() + "\n";
+        }
+    }
+    return names;
+}
+
+TEST_F(KestcfgControllerTest, DescribeCoversEveryPropertyThatGetShows) {
+    const RunResult described = RunKestcfg({"--json", "describe"});
+    ASSERT_EQ(0, described.exitCode) << described.err;
+    const std::string description = FlattenJson(described.out);
+    const std::string shown = PropertyNames(FlattenJson(RunKestcfg({"--json", "get"}).out));
+    std::istringstream lines(shown);
+    size_t count = 0;
+    for (std::string line; std::getline(lines, line); ++count) {
+        EXPECT_NE(std::string::npos, PropertyNames(description).find(line + "\n")) << line;
+    }
+    EXPECT_GT(count, 50u);
+    for (const char* fact : {
+             "items/0/properties/3/name=\"host-name\"\nitems/0/properties/3/tag=\"0x0101F000\"\n"
+             "items/0/properties/3/type=\"text\"\nitems/0/properties/3/changeable=true\n"
+             "items/0/properties/3/restartRequired=true\n",
+             "/name=\"current-time\"\n",
+             "/values/0=\"one of en,de,fr,zh,kr,ja\"",
+             "/values/0=\"0x01 disabled\"\n",
+             "/values/2=\"0x08 ethercat\"\n",
+         }) {
+        EXPECT_NE(std::string::npos, description.find(fact)) << fact << description;
+    }
+    const RunResult people = RunKestcfg({"describe", "chassis"});
+    EXPECT_EQ(0u, people.out.find("VQ KEST Chassis\n  NAME ")) << people.out;
+    EXPECT_NE(std::string::npos, people.out.find("web-service ")) << people.out;
+    EXPECT_EQ(2, RunKestcfg({"describe", "eth7"}).exitCode);
+}
+
+TEST_F(KestcfgControllerTest, ModesAreShownAndTakenByNameOrNumber) {
+    // Polling needs an interval in the same change.
+    for (const auto& [typed, stored] : std::vector<std::pair<std::string, std::string>>{
+             {"polling-mode=off", "0x01 off"},
+             {"polling-mode=2", "0x02 polling"},
+             {"polling-mode=0x01", "0x01 off"},
+             {"polling-mode=POLLING", "0x02 polling"}}) {
+        SCOPED_TRACE(typed);
+        const bool polling = stored == "0x02 polling";
+        std::vector<std::string> arguments = {"set", "eth0", typed};
+        if (polling) {
+            arguments.push_back("polling-interval=40");
+        }
+        const RunResult set = RunKestcfg(arguments);
+        EXPECT_EQ(0, set.exitCode) << set.err;
+        EXPECT_EQ(0u, set.out.find("eth0: polling-mode set to " + stored + "\n")) << set.out;
+        EXPECT_TRUE(HasRow(RunKestcfg({"get", "eth0", "polling-mode"}).out, "0x0D11A000",
+                           "polling-mode", "unsigned", stored));
+    }
+    EXPECT_TRUE(HasRow(RunKestcfg({"get", "eth0"}).out, "0x0D103000", "supported-adapter-modes",
+                       "unsigned", "0x0B disabled,tcpip,ethercat"));
+    EXPECT_NE(std::string::npos,
+              FlattenJson(RunKestcfg({"--json", "get", "eth0", "adapter-mode"}).out)
+                  .find("adapter-mode/value=2\n"));
+    const RunResult unknown = RunKestcfg({"set", "eth0", "polling-mode=sometimes"});
+    EXPECT_EQ(2, unknown.exitCode);
+    EXPECT_NE(std::string::npos, unknown.err.find("a mode name (off, polling) or number"));
 }
 
 TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStandardOutput) {

@@ -5,6 +5,11 @@ const std::vector<CommandDescription>& AllCommands() {
     static const std::vector<CommandDescription> commands = {
         {"info", "show the expert's identity", {}, ExpertUse::kIdentity, &RunInfo},
         {"items", "list the configurable items", {}, ExpertUse::kItems, &RunItems},
+        {"describe",
+         "explain every property of each item, or of ITEM: type, changeable, values, meaning",
+         {{"ITEM", kItemHelp, false, false}},
+         ExpertUse::kItems,
+         &RunDescribe},
         {"get",
          "show the properties of every item, or of ITEM, or only the NAMEd ones",
          {{"ITEM", kItemHelp, false, false},

@@ -58,6 +58,7 @@ const std::vector<CommandDescription>& AllCommands();
 // The commands' bodies.
 void RunInfo(CommandContext& context);
 void RunItems(CommandContext& context);
+void RunDescribe(CommandContext& context);
 void RunGet(CommandContext& context);
 void RunRefresh(CommandContext& context);
 void RunSet(CommandContext& context);

@@ -5,17 +5,31 @@
 #include <cstdint>
 #include <optional>
 #include <string>
+#include <vector>
 
 // How an unsigned value is shown: most as decimal numbers, masks and bit-valued modes in
 // hexadecimal (they are compared bit by bit).
 enum class NumberStyle { kDecimal, kHexadecimal };
+
+// Which items report a property.
+enum class ItemKind { kAny, kChassis, kAdapter };
+
+// Whether a property can be changed, and when a change takes effect.
+enum class Change { kNo, kYes, kAfterRestart };
 
 struct PropertyDescription {
     uint32_t tag;
     const char* name;  // lower case words joined by "-"
     uint32_t type;     // a bag type code, UX_PROPERTY_TYPE_*
     NumberStyle style;
+    ItemKind kind;
+    Change change;
+    const char* values;   // the values a change may take, for people; empty when unchangeable
+    const char* meaning;  // one line
 };
+
+// Every property kestcfg knows, in the order the items report them.
+const std::vector<const PropertyDescription*>& AllProperties();
 
 // The description of `tag`, or null for a tag kestcfg does not know.
 const PropertyDescription* FindProperty(uint32_t tag);

@@ -3,19 +3,11 @@
 #include "BagValues.h"
 #include "HostText.h"
 #include "PropertyCatalogue.h"
+#include "PropertyText.h"
 #include "StatusNames.h"
 #include "TextTable.h"
 #include "ValueText.h"
 #include "uxsys/StatusCodes.h"
-
-namespace {
-
-NumberStyle StyleOf(uint32_t tag) {
-    const PropertyDescription* description = FindProperty(tag);
-    return description != nullptr ? description->style : NumberStyle::kDecimal;
-}
-
-}  // namespace
 
 std::vector<PropertyEntry> ReadProperties(IuxSysPropertyBag2* bag,
                                           const std::vector<uint32_t>& tags) {
@@ -39,7 +31,7 @@ void WritePropertyTable(std::ostream& out, const std::vector<PropertyEntry>& ent
         } else {
             table.AddRow({TagText(entry.tag), TagDisplayName(entry.tag),
                           TypeCodeName(TypeCodeOf(entry.value)),
-                          ValueForPeople(entry.value, StyleOf(entry.tag))});
+                          PropertyValueText(entry.tag, entry.value)});
         }
     }
     table.Write(out, indent);

@@ -9,6 +9,7 @@
 #include "HostText.h"
 #include "ItemAccess.h"
 #include "PropertyCatalogue.h"
+#include "PropertyText.h"
 #include "StatusNames.h"
 #include "ValueText.h"
 #include "uxsys/HostString.h"
@@ -121,10 +122,11 @@ void RunSet(CommandContext& context) {
     std::vector<PropertyValue> values;
     for (const Assignment& assignment : assignments) {
         const uint32_t type = ValueType(changes.Get(), assignment);
-        std::optional<PropertyValue> value = ParseValue(assignment.text, type);
+        std::optional<PropertyValue> value =
+            ParsePropertyValue(assignment.tag, assignment.text, type);
         if (!value) {
             throw UsageError("bad value for " + assignment.word + ": expected " +
-                             AcceptedForm(type));
+                             AcceptedPropertyForm(assignment.tag, type));
         }
         const HRESULT written = WriteBagValue(changes.Get(), assignment.tag, *value);
         if (written < 0) {
@@ -178,12 +180,8 @@ void RunSet(CommandContext& context) {
         return;
     }
     for (size_t i = 0; i < assignments.size(); ++i) {
-        const PropertyDescription* description = FindProperty(assignments[i].tag);
         context.out << PrintableText(itemText) << ": " << TagDisplayName(assignments[i].tag)
-                    << " set to "
-                    << PrintableText(ValueForPeople(values[i], description != nullptr
-                                                                   ? description->style
-                                                                   : NumberStyle::kDecimal))
+                    << " set to " << PrintableText(PropertyValueText(assignments[i].tag, values[i]))
                     << "\n";
     }
     if (!message.empty()) {
