@@ -157,8 +157,10 @@ TEST_F(KestcfgControllerTest, SetPersistsAValidatedChangeThatTheNextReadShows) {
         RunKestcfg({"--json", "set", kChassis, "host-name=line-4", "0x0103D000=Bay 4, Line 4"});
     EXPECT_EQ(0, renamed.exitCode) << renamed.err;
     EXPECT_EQ(
-        "item=\"VQ KEST Chassis\"\naccepted=true\nchanged/host-name=\"line-4\"\n"
-        "changed/comment=\"Bay 4, Line 4\"\nrestartRequired=true\n",
+        "item=\"VQ KEST Chassis\"\naccepted=true\nchanges/host-name/requested=\"line-4\"\n"
+        "changes/host-name/stored=\"line-4\"\nchanges/host-name/result=\"stored\"\n"
+        "changes/comment/requested=\"Bay 4, Line 4\"\nchanges/comment/stored=\"Bay 4, Line 4\"\n"
+        "changes/comment/result=\"stored\"\nrestartRequired=true\n",
         FlattenJson(renamed.out));
     EXPECT_NE(std::string::npos, State().find("HostName=line-4"));
     EXPECT_NE(std::string::npos, State().find("UserComment=Bay 4, Line 4"));
@@ -176,6 +178,40 @@ TEST_F(KestcfgControllerTest, SetOfTheClockWritesTheTimeAndRunsTheHardwareClockS
     EXPECT_EQ(0, result.exitCode) << result.err;
     EXPECT_EQ("1893553445 0\n", sysroot_.ReadFile("/run/kest/system-clock"));
     EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot_.ReadFile("/var/log/hwclock.log"));
+}
+
+TEST_F(KestcfgControllerTest, SetStoresTextAsTypedWhateverTheEnvironmentsLocale) {
+    for (const char* locale : {"LANG=C", "LC_ALL=C.UTF-8", "LC_CTYPE=en_US.ISO-8859-1"}) {
+        SCOPED_TRACE(locale);
+        const std::string root = "KEST_SYSROOT=" + sysroot_.Root();
+        char* environment[] = {const_cast<char*>(root.c_str()), const_cast<char*>(locale), nullptr};
+        const RunResult set = RunKestcfg({"set", "chassis", "comment=café 北京"}, environment);
+        EXPECT_EQ(0, set.exitCode) << set.err;
+        EXPECT_EQ("VQ KEST Chassis: comment set to café 北京\n", set.out);
+        EXPECT_NE(std::string::npos, State().find("UserComment=café 北京\n"));
+        sysroot_.WriteFile(kStatePath, std::regex_replace(State(), std::regex("UserComment=.*\n"),
+                                                          "UserComment=old\n"));
+    }
+}
+
+TEST_F(KestcfgControllerTest, APersistFailingPartWayReportsWhatWasStoredWithStatus5) {
+    sysroot_.WriteScript("/sbin/hwclock", "exit 1\n");
+    const RunResult people = RunKestcfg({"set", "chassis", "comment=kept", "current-time=now"});
+    EXPECT_EQ(5, people.exitCode);
+    EXPECT_EQ("VQ KEST Chassis: comment set to kept\n", people.out);
+    EXPECT_NE(std::string::npos, people.err.find("kestcfg: VQ KEST Chassis: current-time was not "
+                                                 "stored"))
+        << people.err;
+    EXPECT_NE(std::string::npos, people.err.find("failed part-way with E_FAIL")) << people.err;
+    EXPECT_NE(std::string::npos, State().find("UserComment=kept\n"));
+
+    const std::string flat = FlattenJson(
+        RunKestcfg({"--json", "set", "chassis", "comment=again", "current-time=now"}).out);
+    for (const char* expected :
+         {"changes/comment/result=\"stored\"\n", "changes/current-time/result=\"not stored\"\n",
+          "error/exitStatus=5\n", "error/status=\"E_FAIL\"\n"}) {
+        EXPECT_NE(std::string::npos, flat.find(expected)) << expected << flat;
+    }
 }
 
 TEST_F(KestcfgControllerTest, SetChangesTheTimeZoneInEitherNotation) {
@@ -328,7 +364,7 @@ TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStan
         {{"get"}, "items/1/properties/polling-interval/value=100\n"},
         {{"get", "chassis", "comment"}, "/value=\"Demo controller on a desk\"\n"},
         {{"refresh", "eth0", "gateway"}, "properties/gateway/value=\"192.168.10.1\"\n"},
-        {{"set", "eth0", "polling-interval=200"}, "changed/polling-interval=200\n"},
+        {{"set", "eth0", "polling-interval=200"}, "polling-interval/result=\"stored\"\n"},
         {{"set", "eth0", "polling-interval=0"}, "error/exitStatus=1\n"},
         {{"get", "eth7"}, "error/exitStatus=3\n"},
         {{"get", "eth0", "no-such-name"}, "error/exitStatus=2\n"},

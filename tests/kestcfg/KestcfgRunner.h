@@ -70,18 +70,19 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
     return result;
 }
 
-// Runs the built kestcfg; when the tests run under an emulator (a cross build), through the
-// same emulator command.
-inline RunResult RunKestcfg(const std::vector<std::string>& arguments) {
+// Runs the built kestcfg with `environment` (the test's own by default); when the tests run
+// under an emulator (a cross build), through the same emulator command.
+inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
+                            char* const* environment = environ) {
     std::vector<std::string> command = {KEST_TEST_EMULATOR};
     if (command.empty()) {
-        return RunProgram(KESTCFG_PATH, arguments);
+        return RunProgram(KESTCFG_PATH, arguments, environment);
     }
     const std::string launcher = command.front();
     command.erase(command.begin());
     command.push_back(KESTCFG_PATH);
     command.insert(command.end(), arguments.begin(), arguments.end());
-    return RunProgram(launcher, command);
+    return RunProgram(launcher, command, environment);
 }
 
 // Parses `json` with python3 as exactly one JSON document and returns every scalar as a line

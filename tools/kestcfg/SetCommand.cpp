@@ -1,19 +1,14 @@
 // kestcfg set ITEM NAME=VALUE...: builds a bag of changes as a host does (the item's current
-// properties, with the new values marked modified), has the plug-in validate it, and persists it.
-#include <algorithm>
-
-#include "BagValues.h"
+// properties, with the new values marked modified), has the plug-in validate and persist it, and
+// reads the item back to report what the controller stored.
 #include "Commands.h"
 #include "ExitCodes.h"
-#include "HostPropertyBag.h"
 #include "HostText.h"
 #include "ItemAccess.h"
+#include "ItemChange.h"
 #include "PropertyCatalogue.h"
 #include "PropertyText.h"
 #include "StatusNames.h"
-#include "ValueText.h"
-#include "uxsys/HostString.h"
-#include "uxsys/StatusCodes.h"
 
 namespace {
 
@@ -36,7 +31,7 @@ std::vector<Assignment> ParseAssignments(const std::vector<std::string>& argumen
         const std::optional<uint32_t> tag = TagFromWord(word);
         if (!tag) {
             throw UsageError("unknown property " + word +
-                             "; give a name that kestcfg get shows or a tag number");
+                             "; give a name that kestcfg describe shows or a tag number");
         }
         for (const Assignment& earlier : assignments) {
             if (earlier.tag == *tag) {
@@ -48,146 +43,58 @@ std::vector<Assignment> ParseAssignments(const std::vector<std::string>& argumen
     return assignments;
 }
 
-// Fills `changes` with the item's current properties, none marked modified, so that the plug-in
-// sees the whole setting it validates. When they cannot be read the bag holds only the changes,
-// which suffices for items that look at modified properties only.
-void CopyCurrentProperties(CommandContext& context, const std::wstring& item,
-                           IuxSysPropertyBag4* changes) {
-    InterfaceRef<IuxSysPropertyBag2> current;
-    const HRESULT status = CurrentProperties(context.expert, item, &current);
-    if (status == UX_E_ITEM_NOT_FOUND) {
-        throw Failure("there is no item " + ItemText(item) + " (" + StatusWithName(status) + ")");
-    }
-    if (status < 0) {
-        context.err << "kestcfg: warning: cannot read the current properties of " << ItemText(item)
-                    << " (" << StatusWithName(status) << "); sending only the changes\n";
-        return;
-    }
-    for (const uint32_t tag : AllTags(current.Get())) {
-        PropertyValue value;
-        if (ReadBagValue(current.Get(), tag, &value) >= 0) {
-            const HRESULT written = WriteBagValue(changes, tag, value);
-            if (written < 0) {
-                throw Failure("copying a property into the change bag failed with " +
-                              StatusWithName(written));
-            }
-        }
-    }
-    changes->ClearAllModified();
-}
-
-// The type a new value of `tag` takes: the type the item already holds, else the catalogue's.
-uint32_t ValueType(IuxSysPropertyBag4* changes, const Assignment& assignment) {
-    uint32_t type = 0;
-    if (changes->GetTagType(assignment.tag, &type) >= 0 && IsKnownTypeCode(type)) {
-        return type;
-    }
-    if (const PropertyDescription* description = FindProperty(assignment.tag)) {
-        return description->type;
-    }
-    throw UsageError("the type of property " + assignment.word +
-                     " is unknown: the item does not report it");
-}
-
-// The exit code for a status with which the plug-in turned the change down.
-ExitCode ExitCodeFor(HRESULT status) {
-    return IsValueRejection(status) ? kExitRejectedValue : kExitFailure;
-}
-
-// Reports a change the plug-in turned down and ends the command.
-[[noreturn]] void Refuse(CommandContext& context, const std::string& item, const char* step,
-                         HRESULT status, const std::string& message) {
-    context.document = {{"item", item},
-                        {"accepted", false},
-                        {"message", message.empty() ? Json(nullptr) : Json(message)}};
-    const bool rejected = IsValueRejection(status);
-    std::string text = rejected ? item + " rejected the change with " + StatusWithName(status)
-                                : std::string(step) + " the change of " + item + " failed with " +
-                                      StatusWithName(status);
-    if (!message.empty()) {
-        text += ": " + message;
-    }
-    throw CommandFailure(ExitCodeFor(status), text, status);
-}
-
 }  // namespace
 
 void RunSet(CommandContext& context) {
-    const std::wstring item = ItemArgument(context.arguments[0]);
-    const std::string itemText = ItemText(item);
     const std::vector<Assignment> assignments = ParseAssignments(context.arguments);
-
-    const InterfaceRef<IuxSysPropertyBag4> changes = HostPropertyBag::Create();
-    CopyCurrentProperties(context, item, changes.Get());
-    std::vector<PropertyValue> values;
+    ItemChange change(context.expert, ItemArgument(context.arguments[0]), context.err);
+    const std::string item = ItemText(change.Item());
     for (const Assignment& assignment : assignments) {
-        const uint32_t type = ValueType(changes.Get(), assignment);
-        std::optional<PropertyValue> value =
+        const uint32_t type = change.TypeOf(assignment.tag);
+        if (type == 0) {
+            throw UsageError("the type of property " + assignment.word +
+                             " is unknown: the item does not report it");
+        }
+        const std::optional<PropertyValue> value =
             ParsePropertyValue(assignment.tag, assignment.text, type);
         if (!value) {
             throw UsageError("bad value for " + assignment.word + ": expected " +
                              AcceptedPropertyForm(assignment.tag, type));
         }
-        const HRESULT written = WriteBagValue(changes.Get(), assignment.tag, *value);
-        if (written < 0) {
-            throw Failure("storing " + assignment.word + " in the change bag failed with " +
-                          StatusWithName(written));
-        }
-        values.push_back(std::move(*value));
+        change.Request(assignment.tag, *value);
     }
 
-    InterfaceRef<IuxSysEnumPropertyTag> validated;
-    CvqBStr rawMessage = nullptr;
-    const HRESULT validation = context.expert->ValidatePropertyChanges(
-        item.c_str(), changes.Get(), validated.Receive(), &rawMessage);
-    const std::string message = TakeHostString(rawMessage);
-    if (validation < 0) {
-        Refuse(context, itemText, "validating", validation, message);
-    }
-    const std::vector<uint32_t> accepted = RemainingTags(validated.Get());
-    std::vector<std::string> refused;
-    for (const Assignment& assignment : assignments) {
-        if (std::find(accepted.begin(), accepted.end(), assignment.tag) == accepted.end()) {
-            refused.push_back(assignment.word);
-        }
-    }
-    if (!refused.empty()) {
-        std::string list;
-        for (const std::string& word : refused) {
-            list += (list.empty() ? "" : ", ") + word;
-        }
-        context.document = {{"item", itemText}, {"accepted", false}, {"notAccepted", refused}};
-        throw CommandFailure(kExitRejectedValue, itemText + " does not accept changes to " + list +
-                                                     "; nothing was changed");
-    }
+    const Validation validation = change.Validate();
+    CheckValidation(context.document, change, validation);
+    bool restartRequired = false;
+    const HRESULT persisted = change.Persist(&restartRequired);
+    const std::vector<ChangeOutcome> outcomes = change.ReadBack(persisted >= 0);
 
-    int32_t restartRequired = 0;
-    const HRESULT persisted =
-        context.expert->PersistPropertyChanges(item.c_str(), changes.Get(), &restartRequired);
+    context.document["item"] = item;
+    context.document["accepted"] = true;
+    Json& changes = context.document["changes"] = Json::object();
+    const size_t notAsAsked = ReportOutcomes(
+        item, outcomes, context.options.json ? nullptr : &context.out, context.err, changes);
+    context.document["restartRequired"] = restartRequired;
     if (persisted < 0) {
-        Refuse(context, itemText, "persisting", persisted, std::string());
+        if (notAsAsked == outcomes.size()) {
+            RefuseChange(context.document, item, "persisting", persisted, std::string());
+        }
+        throw CommandFailure(kExitPartlyDone,
+                             "persisting the change of " + item + " failed part-way with " +
+                                 StatusWithName(persisted) + ": not every change was stored",
+                             persisted);
     }
-
-    Json changed = Json::object();
-    for (size_t i = 0; i < assignments.size(); ++i) {
-        changed[TagDisplayName(assignments[i].tag)] = ValueAsJson(values[i]);
+    if (notAsAsked != 0) {
+        throw CommandFailure(kExitPartlyDone, "the controller did not store every change as asked");
     }
-    context.document = {{"item", itemText},
-                        {"accepted", true},
-                        {"changed", std::move(changed)},
-                        {"restartRequired", restartRequired != 0}};
     if (context.options.json) {
         return;
     }
-    for (size_t i = 0; i < assignments.size(); ++i) {
-        context.out << PrintableText(itemText) << ": " << TagDisplayName(assignments[i].tag)
-                    << " set to " << PrintableText(PropertyValueText(assignments[i].tag, values[i]))
-                    << "\n";
+    if (!validation.message.empty()) {
+        context.out << PrintableText(item) << ": " << PrintableText(validation.message) << "\n";
     }
-    if (!message.empty()) {
-        context.out << PrintableText(itemText) << ": " << PrintableText(message) << "\n";
-    }
-    if (restartRequired != 0) {
+    if (restartRequired) {
         context.out << "The change takes full effect after the controller restarts.\n";
     }
 }
