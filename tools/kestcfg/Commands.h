@@ -62,5 +62,7 @@ void RunDescribe(CommandContext& context);
 void RunGet(CommandContext& context);
 void RunRefresh(CommandContext& context);
 void RunSet(CommandContext& context);
+void RunExport(CommandContext& context);
+void RunApply(CommandContext& context);
 void RunFirmware(CommandContext& context);
 void RunSim(CommandContext& context);

@@ -78,9 +78,7 @@ std::vector<DescribedProperty> DescribeItem(const std::wstring& item, IuxSysProp
         if (found != reported.end()) {
             reported.erase(found);
         }
-        // Only the chassis takes a new host name; an adapter's is its item name.
-        const Change change =
-            description->kind == ItemKind::kAny && !chassis ? Change::kNo : description->change;
+        const Change change = ChangeOn(*description, chassis);
         DescribedProperty property{
             description->tag,    description->name, TypeCodeName(description->type), change, {},
             description->meaning};

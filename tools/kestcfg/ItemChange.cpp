@@ -18,10 +18,6 @@ namespace {
 
 constexpr uint32_t kClockTag = 0x0D11F000;
 
-bool SameValue(const PropertyValue& a, const PropertyValue& b) {
-    return ValueAsJson(a) == ValueAsJson(b) && a.index() == b.index();
-}
-
 std::optional<PropertyValue> Lookup(const std::vector<std::pair<uint32_t, PropertyValue>>& values,
                                     uint32_t tag) {
     for (const auto& [known, value] : values) {

@@ -170,6 +170,18 @@ const std::vector<const PropertyDescription*>& AllProperties() {
     return all;
 }
 
+Change ChangeOn(const PropertyDescription& description, bool chassis) {
+    const bool ofThisKind = description.kind == ItemKind::kAny
+                                ? chassis  // only the chassis takes a new host name
+                                : (description.kind == ItemKind::kChassis) == chassis;
+    return ofThisKind ? description.change : Change::kNo;
+}
+
+bool IsSetting(const PropertyDescription& description, bool chassis) {
+    return ChangeOn(description, chassis) != Change::kNo &&
+           description.type != UX_PROPERTY_TYPE_TIMESTAMP;
+}
+
 const PropertyDescription* FindProperty(uint32_t tag) {
     for (const PropertyDescription& description : kCatalogue) {
         if (description.tag == tag) {

@@ -31,6 +31,13 @@ struct PropertyDescription {
 // Every property kestcfg knows, in the order the items report them.
 const std::vector<const PropertyDescription*>& AllProperties();
 
+// Whether the property can be changed on the chassis item (`chassis`) or on an adapter item.
+Change ChangeOn(const PropertyDescription& description, bool chassis);
+
+// True for the properties export writes and apply reads: those that can be changed on such an
+// item, except the clock, which is not a setting.
+bool IsSetting(const PropertyDescription& description, bool chassis);
+
 // The description of `tag`, or null for a tag kestcfg does not know.
 const PropertyDescription* FindProperty(uint32_t tag);
 

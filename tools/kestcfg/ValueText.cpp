@@ -195,6 +195,10 @@ Json ValueAsJson(const PropertyValue& value) {
     }
 }
 
+bool SameValue(const PropertyValue& a, const PropertyValue& b) {
+    return a.index() == b.index() && ValueAsJson(a) == ValueAsJson(b);
+}
+
 std::optional<PropertyValue> ParseValue(const std::string& text, uint32_t type) {
     switch (type) {
         case UX_PROPERTY_TYPE_BOOL:

@@ -16,6 +16,9 @@ std::string ValueForPeople(const PropertyValue& value, NumberStyle style);
 // null for "no time".
 Json ValueAsJson(const PropertyValue& value);
 
+// True when both values are of the same kind and equal.
+bool SameValue(const PropertyValue& a, const PropertyValue& b);
+
 // Parses command-line text as a value of bag type `type`. Booleans: true/false, yes/no, on/off,
 // 1/0. Integers: decimal, or hexadecimal with "0x"; out of range fails. Timestamps: ISO 8601 UTC
 // or "now". Text: any valid UTF-8. Nothing when the text does not fit the type.
