@@ -12,6 +12,7 @@
 // What a command needs of the plug-in.
 enum class ExpertUse {
     kNone,      // the plug-in is not loaded
+    kSysroot,   // the plug-in is not loaded; the controller's files are read under the sysroot
     kIdentity,  // a fresh expert; Initialize is not called
     kItems,     // an expert between Initialize and Uninitialize
 };
@@ -65,4 +66,5 @@ void RunSet(CommandContext& context);
 void RunExport(CommandContext& context);
 void RunApply(CommandContext& context);
 void RunFirmware(CommandContext& context);
+void RunFirmwareStatus(CommandContext& context);
 void RunSim(CommandContext& context);

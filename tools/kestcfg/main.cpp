@@ -65,17 +65,19 @@ std::string PluginVersion(IuxSysExpert3* expert) {
 
 // Runs the command the line names; the plug-in is unloaded when this returns.
 void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) {
-    const bool usesPlugin = line.version || line.command->expertUse != ExpertUse::kNone;
-    if (!usesPlugin) {
+    const ExpertUse use = line.version ? ExpertUse::kIdentity : line.command->expertUse;
+    if (use != ExpertUse::kNone) {
+        if (!line.options.sysroot.empty()) {
+            UseSysroot(line.options.sysroot, "--sysroot");
+        } else if (const char* fromEnvironment = getenv("KEST_SYSROOT");
+                   fromEnvironment != nullptr && *fromEnvironment != '\0') {
+            UseSysroot(fromEnvironment, "KEST_SYSROOT");
+        }
+    }
+    if (use == ExpertUse::kNone || use == ExpertUse::kSysroot) {
         CommandContext context{nullptr, line.arguments, line.options, document, out, std::cerr};
         line.command->run(context);
         return;
-    }
-    if (!line.options.sysroot.empty()) {
-        UseSysroot(line.options.sysroot, "--sysroot");
-    } else if (const char* fromEnvironment = getenv("KEST_SYSROOT");
-               fromEnvironment != nullptr && *fromEnvironment != '\0') {
-        UseSysroot(fromEnvironment, "KEST_SYSROOT");
     }
     const std::string pluginPath =
         line.options.plugin.empty() ? DefaultPluginPath() : PluginPathArgument(line.options.plugin);
