@@ -1,5 +1,7 @@
 #include "FirmwareFiles.h"
 
+#include "ControllerPath.h"
+
 #include <stdlib.h>
 #include <sys/stat.h>
 #include <sys/sysmacros.h>
@@ -29,11 +31,6 @@ bool IsLocked(const struct stat& status) {
 }
 
 }  // namespace
-
-std::string ControllerPath(const std::string& systemPath) {
-    const char* root = getenv("KEST_SYSROOT");
-    return (root != nullptr ? std::string(root) : std::string()) + systemPath;
-}
 
 std::optional<char> StatusFileCode() {
     std::ifstream file(ControllerPath(kStatusFile));

@@ -6,9 +6,6 @@
 #include <optional>
 #include <string>
 
-// `systemPath` under the sysroot KEST_SYSROOT names (the path itself without one).
-std::string ControllerPath(const std::string& systemPath);
-
 // The first non-blank character of the tool's status file; nothing when there is none.
 std::optional<char> StatusFileCode();
 

@@ -2,6 +2,7 @@
 
 #include <strings.h>
 
+#include "ControllerPath.h"
 #include "ExitCodes.h"
 #include "HostText.h"
 #include "StatusNames.h"
@@ -39,9 +40,14 @@ std::vector<std::wstring> ItemNames(IuxSysExpert3* expert) {
         result.emplace_back(name.Get() != nullptr ? name.Get() : L"", CvqBStrLength(name.Get()));
     }
     if (result.empty()) {
+        std::string missing;
+        for (const std::string& file : MissingControllerFiles()) {
+            missing += (missing.empty() ? "; missing: " : ", ") + file;
+        }
         throw Failure(
             "the plug-in reports no items: the chassis could not be read (is "
-            "KEST_SYSROOT or --sysroot a controller made by 'kestcfg sim init'?)");
+            "KEST_SYSROOT or --sysroot a controller made by 'kestcfg sim init'?)" +
+            missing);
     }
     return result;
 }
