@@ -70,19 +70,25 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
     return result;
 }
 
-// Runs the built kestcfg with `environment` (the test's own by default); when the tests run
-// under an emulator (a cross build), through the same emulator command.
-inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
-                            char* const* environment = environ) {
+// Runs the kestcfg at `program` with `environment` (the test's own by default); when the tests
+// run under an emulator (a cross build), through the same emulator command.
+inline RunResult RunKestcfgAt(const std::string& program, const std::vector<std::string>& arguments,
+                              char* const* environment = environ) {
     std::vector<std::string> command = {KEST_TEST_EMULATOR};
     if (command.empty()) {
-        return RunProgram(KESTCFG_PATH, arguments, environment);
+        return RunProgram(program, arguments, environment);
     }
     const std::string launcher = command.front();
     command.erase(command.begin());
-    command.push_back(KESTCFG_PATH);
+    command.push_back(program);
     command.insert(command.end(), arguments.begin(), arguments.end());
     return RunProgram(launcher, command, environment);
+}
+
+// Runs the built kestcfg.
+inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
+                            char* const* environment = environ) {
+    return RunKestcfgAt(KESTCFG_PATH, arguments, environment);
 }
 
 // Parses `json` with python3 as exactly one JSON document and returns every scalar as a line

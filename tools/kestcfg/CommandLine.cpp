@@ -63,6 +63,9 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
                  "write the result as one JSON document on standard output");
     app.add_flag("--no-wait", line.options.noWait,
                  "fail at once (status 4) when another kestcfg is changing the controller");
+    app.add_flag("--simulator", line.options.simulator,
+                 "use the installed simulated controller library (chosen by itself for a "
+                 "sysroot made by sim init)");
     app.add_flag("--version", line.version, "show the versions of kestcfg and of its plug-in");
 
     struct Parsed {

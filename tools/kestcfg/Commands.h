@@ -22,9 +22,10 @@ struct CommandOptions {
     std::string sysroot;  // empty: KEST_SYSROOT is left as it is
     std::string plugin;   // empty: the plug-in next to the program
     bool json = false;
-    bool noWait = false;  // fail at once when another kestcfg holds the controller
-    bool check = false;   // apply: validate and show the difference only
-    bool diff = false;    // apply: show each difference with its old and new value
+    bool simulator = false;  // load the installed simulated controller library
+    bool noWait = false;     // fail at once when another kestcfg holds the controller
+    bool check = false;      // apply: validate and show the difference only
+    bool diff = false;       // apply: show each difference with its old and new value
 };
 
 struct CommandContext {

@@ -211,12 +211,16 @@ std::string FindTimeZoneTable() {
     if (Exists(besideProgram)) {
         return besideProgram;
     }
+    std::string installed = ProgramDirectory() + KESTCFG_DATA_DIR_FROM_PROGRAM "/timezone.ini";
+    if (Exists(installed)) {
+        return installed;
+    }
     std::string inSources = std::string(KESTCFG_SOURCE_DATA_DIR) + "/timezone.ini";
     if (Exists(inSources)) {
         return inSources;
     }
     throw Failure("cannot find the time-zone table timezone.ini: looked for " + besideProgram +
-                  " and " + inSources);
+                  ", " + installed + " and " + inSources);
 }
 
 std::vector<std::string> CreateDemoController(const std::string& root,

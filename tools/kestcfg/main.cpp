@@ -81,16 +81,22 @@ void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) 
     }
     const std::string pluginPath =
         line.options.plugin.empty() ? DefaultPluginPath() : PluginPathArgument(line.options.plugin);
+    if (line.version) {
+        // The tool's version even when the plug-in cannot be loaded.
+        document["kestcfg"] = KESTCFG_VERSION;
+        if (!line.options.json) {
+            out << "kestcfg " << KESTCFG_VERSION << std::endl;
+        }
+    }
+    const SimulatorLibrary simulator(line.options.simulator);
     const Plugin plugin(pluginPath);
     const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
     if (line.version) {
         const std::string version = PluginVersion(expert.Get());
-        if (line.options.json) {
-            document = {
-                {"kestcfg", KESTCFG_VERSION}, {"plugin", version}, {"pluginPath", pluginPath}};
-        } else {
-            out << "kestcfg " << KESTCFG_VERSION << "\n"
-                << "plug-in " << version << " (" << pluginPath << ")\n";
+        document["plugin"] = version;
+        document["pluginPath"] = pluginPath;
+        if (!line.options.json) {
+            out << "plug-in " << version << " (" << pluginPath << ")\n";
         }
         return;
     }
