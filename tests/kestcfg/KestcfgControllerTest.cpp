@@ -361,6 +361,8 @@ TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStan
                        "[AllComponents]\nSeverity = 255\nTarget = 2\nLowDiskThreshold = 0\n");
     const std::vector<std::pair<std::vector<std::string>, std::string>> runs = {
         {{"items"}, "items/1=\"eth0\"\n"},
+        {{"describe", "eth0"}, "items/0/properties/0/name=\"fixed-0101c\"\n"},
+        {{"export"}, "items/eth0/polling-interval=100\n"},
         {{"get"}, "items/1/properties/polling-interval/value=100\n"},
         {{"get", "chassis", "comment"}, "/value=\"Demo controller on a desk\"\n"},
         {{"refresh", "eth0", "gateway"}, "properties/gateway/value=\"192.168.10.1\"\n"},

@@ -42,6 +42,18 @@ TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorK
                   ReadWhole(prefix.PathOf("/share/man/man1/kestcfg.1")).find(".SH DESCRIPTION"));
     }
 
+    // The completion offers commands, property names and named values.
+    const RunResult completed = RunProgram(
+        "/bin/bash",
+        {"-c",
+         "source \"$0\"; complete() { COMP_WORDS=(\"$@\"); COMP_CWORD=$(($# - 1)); _kestcfg; "
+         "echo \"${COMPREPLY[*]}\"; }; complete kestcfg fi; complete kestcfg set eth0 poll; "
+         "complete kestcfg set eth0 adapter-mode=t",
+         prefix.PathOf("/share/bash-completion/completions/kestcfg")});
+    EXPECT_EQ("firmware firmware-status\npolling-mode= polling-interval=\nadapter-mode=tcpip\n",
+              completed.out)
+        << completed.err;
+
     const std::string kestcfg = prefix.PathOf("/bin/kestcfg");
     const std::string controller = prefix.Root() + "/controller";
     ASSERT_EQ(0, RunKestcfgAt(kestcfg, {"sim", "init", controller}).exitCode);

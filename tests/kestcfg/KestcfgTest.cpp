@@ -118,6 +118,10 @@ TEST(KestcfgTest, EveryCommandHasItsOwnHelp) {
     const std::vector<std::pair<std::vector<std::string>, std::string>> commands = {
         {{"info"}, "info"},
         {{"items"}, "items"},
+        {{"describe"}, "describe [OPTIONS] [ITEM]"},
+        {{"export"}, "export [OPTIONS] [ITEM...]"},
+        {{"apply"}, "apply [OPTIONS] FILE"},
+        {{"firmware-status"}, "firmware-status"},
         {{"get"}, "get [OPTIONS] [ITEM] [NAME...]"},
         {{"refresh"}, "refresh [OPTIONS] ITEM TAG..."},
         {{"set"}, "set [OPTIONS] ITEM NAME=VALUE..."},
