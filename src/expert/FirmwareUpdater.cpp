@@ -99,7 +99,7 @@ HRESULT FirmwareUpdater::Prepare(uint32_t imageSize, CvqBStr* updateId) noexcept
         return S_OK;
     } catch (...) {
         const HRESULT status = StatusOfCurrentException();
-        TraceIfEnabled("Cannot take the firmware update lock", kTraceErrors);
+        TraceIfEnabled("Cannot prepare the firmware update", kTraceErrors);
         ReleaseUpdateLock();
         busy_.store(0);
         return FAILED(status) ? status : E_FAIL;
@@ -195,7 +195,15 @@ void FirmwareUpdater::RunFirmwareUpdateTool(const std::string& stagingPath) noex
     bool installed = false;
     if (state_.load() == FirmwareUpdateState::kRunning) {
         try {
-            installed = RunFirmwareTool(kest::paths::FirmwareUpdateTool(), stagingPath);
+            // Held until the tool runs: then the tool's process alone keeps the update lock, so
+            // that it lasts exactly as long as the tool, even when this process dies.
+            std::unique_lock<std::mutex> handingOver(lockMutex_);
+            installed = RunFirmwareTool(kest::paths::FirmwareUpdateTool(), stagingPath,
+                                        updateLock_.Descriptor(), [&](pid_t tool) {
+                                            updateLock_.RecordHolder(tool);
+                                            updateLock_.Release();
+                                            handingOver.unlock();
+                                        });
         } catch (...) {
             installed = false;
         }
