@@ -13,6 +13,7 @@
 #include "Commands.h"
 #include "ExitCodes.h"
 #include "HostText.h"
+#include "Interruption.h"
 #include "ItemAccess.h"
 #include "ItemChange.h"
 #include "PropertyCatalogue.h"
@@ -232,6 +233,9 @@ void RunApply(CommandContext& context) {
         return;
     }
 
+    // From here the controller changes: an interruption waits until the plug-in has finished,
+    // so that an interface it takes down comes up again.
+    DeferInterruptions();
     Json& applied = context.document["applied"] = Json::object();
     bool restartRequired = false;
     size_t stored = 0;

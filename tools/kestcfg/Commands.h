@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "ControllerTurn.h"
 #include "JsonOutput.h"
 #include "uxsys/Expert.h"
 
@@ -35,6 +36,8 @@ struct CommandContext {
     Json& document;     // the --json result; written once the plug-in is unloaded
     std::ostream& out;  // text for people; unused with --json
     std::ostream& err;  // warnings and notes
+    // This kestcfg's turn at changing the controller; null for commands that do not take one.
+    ControllerTurn* turn = nullptr;
 };
 
 // A positional argument of a command, as its help shows it.
@@ -52,6 +55,8 @@ struct CommandDescription {
     ExpertUse expertUse;
     // Runs the command; throws CommandFailure to end with a message and an exit code.
     void (*run)(CommandContext& context);
+    // Whether the command changes the controller and therefore waits for its turn.
+    bool takesTurn = false;
 };
 
 // Every command, in the order the usage text lists them.

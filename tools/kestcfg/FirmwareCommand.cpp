@@ -1,9 +1,13 @@
 // kestcfg firmware ITEM IMAGE: installs a firmware image as a host does. It announces the image,
 // hands it over, follows the update with a progress bar until the plug-in reports it installed
 // or failed, and then waits for the update tool to end before it reports the final state.
+#include <fcntl.h>
+#include <stdlib.h>
+#include <sys/file.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <optional>
 #include <string>
 
@@ -13,6 +17,7 @@
 #include "HostFirmwareImage.h"
 #include "HostText.h"
 #include "InterfaceRef.h"
+#include "Interruption.h"
 #include "ItemAccess.h"
 #include "StatusNames.h"
 #include "uxsys/HostString.h"
@@ -137,19 +142,32 @@ void RunFirmware(CommandContext& context) {
     const HRESULT prepared =
         firmware->PrepareFirmwareUpdate(item.c_str(), 0, image.GetImageSize(), updateId.Receive());
     if (prepared < 0) {
-        throw CommandFailure(
-            kExitBusy,
-            "the plug-in refused to prepare the update (" + StatusWithName(prepared) +
-                "): an update is under way (see kestcfg firmware-status), or there is not "
-                "enough free space for twice the image",
-            prepared);
+        if (const UpdateLock lock = ReadUpdateLock(); lock.held) {
+            throw CommandFailure(
+                kExitBusy,
+                "another firmware update of the controller is under way" +
+                    (lock.pid ? " (process " + std::to_string(*lock.pid) + ")" : std::string()),
+                prepared);
+        }
+        throw CommandFailure(kExitFailure,
+                             "the plug-in refused to prepare the update (" +
+                                 StatusWithName(prepared) +
+                                 "): not enough free space for twice the image, or an update is "
+                                 "under way (see kestcfg firmware-status)",
+                             prepared);
     }
+    // From here the update belongs to the tool; kestcfg only follows it.
+    GuardFirmwareUpdate();
     const HRESULT started =
         firmware->StartFirmwareUpdate(item.c_str(), updateId.Get(), 0, nullptr, &image);
     if (started < 0) {
         throw CommandFailure(
             kExitFailure,
             "the plug-in could not start the update (" + StatusWithName(started) + ")", started);
+    }
+    // The plug-in's update lock now keeps other updates out; other kestcfg commands may go on.
+    if (context.turn != nullptr) {
+        context.turn->End();
     }
 
     const std::optional<HRESULT> reported =

@@ -4,6 +4,7 @@
 #include "Commands.h"
 #include "ExitCodes.h"
 #include "HostText.h"
+#include "Interruption.h"
 #include "ItemAccess.h"
 #include "ItemChange.h"
 #include "PropertyCatalogue.h"
@@ -66,6 +67,9 @@ void RunSet(CommandContext& context) {
 
     const Validation validation = change.Validate();
     CheckValidation(context.document, change, validation);
+    // From here the controller changes: an interruption waits until the plug-in has finished,
+    // so that an interface it takes down comes up again.
+    DeferInterruptions();
     bool restartRequired = false;
     const HRESULT persisted = change.Persist(&restartRequired);
     const std::vector<ChangeOutcome> outcomes = change.ReadBack(persisted >= 0);

@@ -8,6 +8,7 @@
 #include <exception>
 #include <iostream>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "CommandLine.h"
@@ -16,6 +17,7 @@
 #include "ExitCodes.h"
 #include "ExpertSession.h"
 #include "HostText.h"
+#include "Interruption.h"
 #include "PluginLoader.h"
 #include "StatusNames.h"
 #include "TextLocale.h"
@@ -88,9 +90,17 @@ void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) 
             out << "kestcfg " << KESTCFG_VERSION << std::endl;
         }
     }
+    std::optional<ControllerTurn> turn;
+    if (line.command != nullptr && line.command->takesTurn) {
+        turn.emplace(line.options.noWait, std::cerr);
+    }
     const SimulatorLibrary simulator(line.options.simulator);
     const Plugin plugin(pluginPath);
     const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
+    // Ends the handling of interruptions a command began once Uninitialize has returned.
+    struct InterruptionHandlingEnd {
+        ~InterruptionHandlingEnd() { EndInterruptionHandling(); }
+    } interruptionHandlingEnd;
     if (line.version) {
         const std::string version = PluginVersion(expert.Get());
         document["plugin"] = version;
@@ -101,6 +111,7 @@ void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) 
         return;
     }
     CommandContext context{expert.Get(), line.arguments, line.options, document, out, std::cerr};
+    context.turn = turn ? &*turn : nullptr;
     std::unique_ptr<ExpertSession> session;
     if (line.command->expertUse == ExpertUse::kItems) {
         session = std::make_unique<ExpertSession>(expert.Get());
@@ -121,6 +132,12 @@ void RecordFailure(Json& document, int code, const std::string& message,
         error["code"] = StatusText(*status);
     }
     document["error"] = std::move(error);
+}
+
+// The exit code of a run that ended with `code`, unless a signal interrupted it.
+int ExitCodeUnlessInterrupted(int code) {
+    const int signalNumber = RecordedInterruption();
+    return signalNumber != 0 ? ExitCodeAfterSignal(signalNumber) : code;
 }
 
 }  // namespace
@@ -164,6 +181,7 @@ int main(int argc, char** argv) {
         std::cerr << "kestcfg: " << PrintableText(failure.what()) << "\n";
         RecordFailure(document, code, failure.what(), std::nullopt);
     }
+    code = ExitCodeUnlessInterrupted(code);
     if (json) {
         output.Write(JsonText(document) + "\n");
     }
