@@ -11,6 +11,7 @@
 #include <sstream>
 
 #include "Commands.h"
+#include "ConfirmableChange.h"
 #include "ExitCodes.h"
 #include "HostText.h"
 #include "Interruption.h"
@@ -18,6 +19,7 @@
 #include "ItemChange.h"
 #include "PropertyCatalogue.h"
 #include "PropertyText.h"
+#include "SettingsDocument.h"
 #include "StatusNames.h"
 #include "ValueText.h"
 
@@ -214,7 +216,10 @@ void ShowDifferences(CommandContext& context, const std::vector<ItemPlan>& plans
 
 void RunApply(CommandContext& context) {
     const std::string& path = context.arguments[0];
-    const Json desired = ReadSettingsFile(path);
+    ApplySettings(context, ReadSettingsFile(path), path);
+}
+
+void ApplySettings(CommandContext& context, const Json& desired, const std::string& path) {
     const std::vector<ItemPlan> plans = PlanChanges(context, desired, path);
     context.document["check"] = context.options.check;
     ShowDifferences(context, plans, context.options.check || context.options.diff);
@@ -233,6 +238,14 @@ void RunApply(CommandContext& context) {
         return;
     }
 
+    std::vector<ItemRequest> requests;
+    for (const ItemPlan& plan : plans) {
+        ItemRequest& request = requests.emplace_back(ItemRequest{plan.change->Item(), {}});
+        for (const Difference& difference : plan.differences) {
+            request.values.emplace_back(difference.tag, difference.to);
+        }
+    }
+    const ConfirmWatch watch = PrepareConfirmableChange(context, requests);
     // From here the controller changes: an interruption waits until the plug-in has finished,
     // so that an interface it takes down comes up again.
     DeferInterruptions();

@@ -4,6 +4,7 @@
 #include <deque>
 #include <map>
 
+#include "ConfirmOptions.h"
 #include "ExitCodes.h"
 
 namespace {
@@ -115,6 +116,7 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
             sub->add_flag("--diff", line.options.diff,
                           "show each difference with the current and the new value");
         }
+        AddConfirmOptions(command.name, *sub, line.options);
         commands.push_back(std::move(parsed));
     }
 

@@ -2,6 +2,7 @@
 // and prints the result as text for people or into one JSON document for scripts.
 #pragma once
 
+#include <optional>
 #include <ostream>
 #include <string>
 #include <vector>
@@ -27,6 +28,8 @@ struct CommandOptions {
     bool noWait = false;     // fail at once when another kestcfg holds the controller
     bool check = false;      // apply: validate and show the difference only
     bool diff = false;       // apply: show each difference with its old and new value
+    std::optional<long long> confirmWithin;  // set, apply: seconds until an unconfirmed rollback
+    std::string watch;  // rollback: the pending change whose deadline this process awaits
 };
 
 struct CommandContext {
@@ -74,3 +77,6 @@ void RunApply(CommandContext& context);
 void RunFirmware(CommandContext& context);
 void RunFirmwareStatus(CommandContext& context);
 void RunSim(CommandContext& context);
+void RunConfirm(CommandContext& context);
+void RunPending(CommandContext& context);
+void RunRollback(CommandContext& context);

@@ -5,22 +5,16 @@
 #include "ExitCodes.h"
 #include "ItemAccess.h"
 #include "PropertyCatalogue.h"
+#include "SettingsDocument.h"
 #include "StatusNames.h"
 #include "ValueText.h"
 #include "uxsys/StatusCodes.h"
 
-void RunExport(CommandContext& context) {
-    std::vector<std::wstring> items;
-    for (const std::string& argument : context.arguments) {
-        items.push_back(ItemArgument(argument));
-    }
-    if (items.empty()) {
-        items = ItemNames(context.expert);
-    }
+Json ExportSettings(IuxSysExpert3* expert, const std::vector<std::wstring>& items) {
     Json settings = Json::object();
     for (const std::wstring& item : items) {
         InterfaceRef<IuxSysPropertyBag2> bag;
-        const HRESULT status = CurrentProperties(context.expert, item, &bag);
+        const HRESULT status = CurrentProperties(expert, item, &bag);
         if (status < 0) {
             throw CommandFailure(
                 status == UX_E_ITEM_NOT_FOUND ? kExitUsageError : kExitFailure,
@@ -37,7 +31,18 @@ void RunExport(CommandContext& context) {
         }
         settings[ItemText(item)] = std::move(values);
     }
-    context.document = {{"items", std::move(settings)}};
+    return {{"items", std::move(settings)}};
+}
+
+void RunExport(CommandContext& context) {
+    std::vector<std::wstring> items;
+    for (const std::string& argument : context.arguments) {
+        items.push_back(ItemArgument(argument));
+    }
+    if (items.empty()) {
+        items = ItemNames(context.expert);
+    }
+    context.document = ExportSettings(context.expert, items);
     if (!context.options.json) {
         context.out << JsonText(context.document, 2) << "\n";
     }

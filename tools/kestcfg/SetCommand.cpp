@@ -2,6 +2,7 @@
 // properties, with the new values marked modified), has the plug-in validate and persist it, and
 // reads the item back to report what the controller stored.
 #include "Commands.h"
+#include "ConfirmableChange.h"
 #include "ExitCodes.h"
 #include "HostText.h"
 #include "Interruption.h"
@@ -50,6 +51,7 @@ void RunSet(CommandContext& context) {
     const std::vector<Assignment> assignments = ParseAssignments(context.arguments);
     ItemChange change(context.expert, ItemArgument(context.arguments[0]), context.err);
     const std::string item = ItemText(change.Item());
+    ItemRequest request{change.Item(), {}};
     for (const Assignment& assignment : assignments) {
         const uint32_t type = change.TypeOf(assignment.tag);
         if (type == 0) {
@@ -63,10 +65,12 @@ void RunSet(CommandContext& context) {
                              AcceptedPropertyForm(assignment.tag, type));
         }
         change.Request(assignment.tag, *value);
+        request.values.emplace_back(assignment.tag, *value);
     }
 
     const Validation validation = change.Validate();
     CheckValidation(context.document, change, validation);
+    const ConfirmWatch watch = PrepareConfirmableChange(context, {request});
     // From here the controller changes: an interruption waits until the plug-in has finished,
     // so that an interface it takes down comes up again.
     DeferInterruptions();

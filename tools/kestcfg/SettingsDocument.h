@@ -1,0 +1,14 @@
+// The settings document that export writes and apply reads, for the commands that use both.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Commands.h"
+
+// The changeable settings of `items` as {"items": {ITEM: {NAME: VALUE...}...}}.
+Json ExportSettings(IuxSysExpert3* expert, const std::vector<std::wstring>& items);
+
+// Makes the controller's settings match `desired` as apply does; `source` names the document
+// in messages. Throws CommandFailure as apply ends.
+void ApplySettings(CommandContext& context, const Json& desired, const std::string& source);
