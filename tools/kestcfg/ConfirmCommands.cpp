@@ -41,6 +41,12 @@ struct OpenRecordFile {
     }
 };
 
+int64_t MonotonicSeconds() {
+    timespec now{};
+    clock_gettime(CLOCK_MONOTONIC, &now);
+    return static_cast<int64_t>(now.tv_sec);
+}
+
 // Adds `text` to the log the plug-in's tracer writes.
 void LogLine(const std::string& text) {
     try {
@@ -120,8 +126,11 @@ void Watch(const CommandContext& context, const std::string& id) {
         ReadRecordFrom(file.descriptor, path).value("id", "") != id) {
         return;
     }
+    // The wait is measured on the monotonic clock, so that setting the controller's clock
+    // meanwhile neither hastens nor delays the rollback.
     const int64_t deadline = ReadRecordFrom(file.descriptor, path)["deadlineSeconds"];
-    while (time(nullptr) < deadline) {
+    const int64_t end = MonotonicSeconds() + (deadline - static_cast<int64_t>(time(nullptr)));
+    while (MonotonicSeconds() < end) {
         if (!StillAt(file.descriptor, path)) {
             return;  // confirmed
         }
@@ -186,6 +195,17 @@ void RunPending(CommandContext& context) {
                                     : "Its watcher has died: 'kestcfg rollback' restores these "
                                       "settings now, 'kestcfg confirm' keeps the change:\n");
             PrintSettings(context.out, pending["items"]);
+        }
+    }
+    const OpenRecordFile running{OpenRecord(RunningRollbackPath())};
+    if (running.descriptor >= 0) {
+        const bool underWay = HeldByAnother(running.descriptor);
+        context.document["rollback"] = {{"underWay", underWay}, {"record", RunningRollbackPath()}};
+        if (!context.options.json) {
+            context.out << (underWay ? "A rollback is under way.\n"
+                                     : "A rollback was interrupted; 'kestcfg apply " +
+                                           PrintableText(RunningRollbackPath()) +
+                                           "' restores its saved settings.\n");
         }
     }
     if (const std::optional<Json> last = ReadRecord(LastRollbackPath())) {
