@@ -99,7 +99,8 @@ TEST(IniWriteTest, SafeReplacementUsesTheTemporaryNameAndKeepsModeAndOwner) {
     auto save = [&] { return IniText_Save(ini.get(), target.c_str()); };
 
     IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0, kIniWriteSafeReplacement);
-    EXPECT_THAT(NamesCreatedBy(dir.Root(), save), ::testing::Contains("name.TMP"));
+    EXPECT_THAT(NamesCreatedBy(dir.Root(), save),
+                ::testing::Contains(::testing::MatchesRegex(R"(name\.TMP......)")));
     IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0,
                             kIniWriteSafeReplacement | kIniWriteUniqueTemporary | kIniWriteSync);
     std::vector<std::string> names = NamesCreatedBy(dir.Root(), save);
