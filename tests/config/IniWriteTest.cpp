@@ -1,3 +1,4 @@
+#include <dirent.h>
 #include <signal.h>
 #include <sys/inotify.h>
 #include <sys/resource.h>
@@ -147,7 +148,16 @@ TEST(IniWriteTest, FailedWriteNeverTruncatesTheTarget) {
     EXPECT_EQ(SaveUnderFileSizeLimit(path, kIniWriteSafeReplacement | kIniWriteSync),
               kIniWriteFailed);
     EXPECT_EQ(ReadBytes(path), "[keep]\nk=1\n");
-    EXPECT_FALSE(dir.Exists("/target.TMP"));
+    // The temporary is removed again.
+    std::vector<std::string> names;
+    DIR* listing = opendir(dir.Root().c_str());
+    while (const dirent* entry = readdir(listing)) {
+        if (entry->d_name[0] != '.') {
+            names.emplace_back(entry->d_name);
+        }
+    }
+    closedir(listing);
+    EXPECT_EQ(names, std::vector<std::string>{"target.ini"});
     // Without safe replacement the half-written target is removed rather than left corrupt.
     EXPECT_EQ(SaveUnderFileSizeLimit(path, 0), kIniWriteFailed);
     EXPECT_FALSE(dir.Exists("/target.ini"));
