@@ -1,7 +1,5 @@
 #include "expert/FirmwareToolRun.h"
 
-#include <unistd.h>
-
 #include "support/ExternalApplication.h"
 #include "support/TextConversion.h"
 
@@ -11,24 +9,12 @@ namespace {
 // The argument the tool expects after the image path.
 constexpr wchar_t kUpdateMode[] = L"3";
 
-// A child process that gives the program an empty environment: nothing of the host's settings
-// reaches the tool.
-class EmptyEnvironmentApplication : public vq::dsc::osdep::ExternalApplication {
-  public:
-    EmptyEnvironmentApplication() : ExternalApplication(LaunchMode::Fork) {}
-
-  protected:
-    // Runs in the child only, between fork and exec: assigning one pointer is all it does.
-    void PrepareChild() override {
-        static char* emptyEnvironment[] = {nullptr};
-        environ = emptyEnvironment;
-    }
-};
-
 }  // namespace
 
 bool RunFirmwareTool(const std::string& tool, const std::string& stagingPath) {
-    EmptyEnvironmentApplication application;
+    // The tool gets an empty environment: nothing of the host's settings reaches it.
+    vq::dsc::osdep::ExternalApplication application;
+    application.SetEnvironment({});
     const bool started = application.Start(
         vq::dsc::WideFromNarrow(tool), {vq::dsc::WideFromNarrow(stagingPath), kUpdateMode}, true);
     if (!started || !application.Wait(-1, false, true)) {

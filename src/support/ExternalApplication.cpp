@@ -1,16 +1,21 @@
 #include "support/ExternalApplication.h"
 
+#include <fcntl.h>
+#include <poll.h>
 #include <signal.h>
+#include <sys/resource.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <chrono>
+#include <climits>
 
 #include "support/Exceptions.h"
 #include "support/PathHelpers.h"
 #include "support/ProcessControl.h"
-#include "support/Sleep.h"
 #include "support/TextConversion.h"
 
 namespace vq {
@@ -18,33 +23,20 @@ namespace dsc {
 namespace osdep {
 namespace {
 
-constexpr int32_t kPollIntervalMs = 100;
 constexpr int kChildFailureStatus = 1;
+// Highest descriptor the fallback closes one by one when the limit is unbounded.
+constexpr int kDescriptorScanLimit = 65536;
+
+// What the intermediate process tells the parent: first Started (the program's pid) or
+// NotStarted (an errno), later Ended (the program's wait status).
+struct Report {
+    enum Kind : int32_t { Started = 1, NotStarted = 2, Ended = 3 };
+    int32_t kind;
+    int32_t value;
+};
 
 bool IsCommandLineSeparator(wchar_t c) {
     return c == L' ' || c == L'\t' || c == L'\n' || c == L'\r';
-}
-
-// A vfork child shares the parent's memory and stack: it may only change directory, exec and
-// _exit, all on data prepared before vfork.
-pid_t SpawnWithVfork(const char* program, char* const* argv, const char* directory) {
-    const pid_t child = vfork();
-    if (child == 0) {
-        if (directory != nullptr && chdir(directory) != 0) {
-            _exit(kChildFailureStatus);
-        }
-        execvp(program, argv);
-        _exit(kChildFailureStatus);
-    }
-    return child;
-}
-
-pid_t WaitPidRetryingInterrupts(pid_t child, int& status, int options) {
-    pid_t result;
-    do {
-        result = waitpid(child, &status, options);
-    } while (result < 0 && errno == EINTR);
-    return result;
 }
 
 int32_t ExitResultFromWaitStatus(int status) {
@@ -54,16 +46,170 @@ int32_t ExitResultFromWaitStatus(int status) {
     return WEXITSTATUS(status);
 }
 
+// One report with a single write (smaller than PIPE_BUF, so it arrives whole). Safe between
+// fork and exec.
+void SendReport(int descriptor, Report::Kind kind, int32_t value) {
+    const Report report{kind, value};
+    while (write(descriptor, &report, sizeof report) < 0 && errno == EINTR) {
+    }
+}
+
+// Reads one whole report; false at end of file or on failure.
+bool ReceiveReport(int descriptor, Report& report) {
+    char* data = reinterpret_cast<char*>(&report);
+    size_t received = 0;
+    while (received < sizeof report) {
+        const ssize_t result = read(descriptor, data + received, sizeof report - received);
+        if (result < 0 && errno == EINTR) {
+            continue;
+        }
+        if (result <= 0) {
+            return false;
+        }
+        received += static_cast<size_t>(result);
+    }
+    return true;
+}
+
+// Closes descriptors `first` to `last`. Safe between fork and exec.
+void CloseRange(int first, int last) {
+#ifdef SYS_close_range
+    if (syscall(SYS_close_range, static_cast<unsigned>(first), static_cast<unsigned>(last), 0) ==
+        0) {
+        return;
+    }
+#endif
+    rlimit limit{};
+    int end = kDescriptorScanLimit;
+    if (getrlimit(RLIMIT_NOFILE, &limit) == 0 && limit.rlim_cur != RLIM_INFINITY) {
+        end = static_cast<int>(std::min<rlim_t>(limit.rlim_cur, INT_MAX));
+    }
+    for (int descriptor = first; descriptor <= last && descriptor < end; ++descriptor) {
+        close(descriptor);
+    }
+}
+
+// Closes every descriptor above 2 except those in the sorted `keep`. Safe between fork and exec.
+void CloseDescriptorsExcept(const int* keep, size_t count) {
+    int next = STDERR_FILENO + 1;
+    for (size_t index = 0; index < count; ++index) {
+        if (keep[index] > next) {
+            CloseRange(next, keep[index] - 1);
+        }
+        next = std::max(next, keep[index] + 1);
+    }
+    CloseRange(next, INT_MAX);
+}
+
+// Gives every signal its default action; SIGPIPE stays ignored when `ignorePipe` is set.
+// Safe between fork and exec.
+void ResetSignalDispositions(bool ignorePipe) {
+    struct sigaction action {};
+    sigemptyset(&action.sa_mask);
+    for (int signal = 1; signal < NSIG; ++signal) {
+        if (signal == SIGKILL || signal == SIGSTOP) {
+            continue;
+        }
+        action.sa_handler = signal == SIGPIPE && ignorePipe ? SIG_IGN : SIG_DFL;
+        sigaction(signal, &action, nullptr);  // fails harmlessly for reserved signals
+    }
+}
+
+pid_t WaitPidRetryingInterrupts(pid_t child, int& status) {
+    pid_t result;
+    do {
+        result = waitpid(child, &status, 0);
+    } while (result < 0 && errno == EINTR);
+    return result;
+}
+
+// Blocks every signal of the calling thread for its lifetime and restores the mask after.
+class AllSignalsBlocked {
+  public:
+    AllSignalsBlocked() {
+        sigset_t all;
+        sigfillset(&all);
+        pthread_sigmask(SIG_SETMASK, &all, &previous_);
+    }
+    ~AllSignalsBlocked() { pthread_sigmask(SIG_SETMASK, &previous_, nullptr); }
+    AllSignalsBlocked(const AllSignalsBlocked&) = delete;
+    AllSignalsBlocked& operator=(const AllSignalsBlocked&) = delete;
+
+  private:
+    sigset_t previous_;
+};
+
+// A pipe whose ends are closed on destruction unless released.
+class ReportPipe {
+  public:
+    ReportPipe() {
+        if (pipe2(ends_, O_CLOEXEC) != 0) {
+            throw PosixError();
+        }
+    }
+    ~ReportPipe() {
+        CloseWriteEnd();
+        if (ends_[0] >= 0) {
+            close(ends_[0]);
+        }
+    }
+    ReportPipe(const ReportPipe&) = delete;
+    ReportPipe& operator=(const ReportPipe&) = delete;
+
+    int ReadEnd() const { return ends_[0]; }
+    int WriteEnd() const { return ends_[1]; }
+    void CloseWriteEnd() {
+        if (ends_[1] >= 0) {
+            close(ends_[1]);
+            ends_[1] = -1;
+        }
+    }
+    int ReleaseReadEnd() {
+        const int descriptor = ends_[0];
+        ends_[0] = -1;
+        return descriptor;
+    }
+
+  private:
+    int ends_[2] = {-1, -1};
+};
+
 }  // namespace
+
+// Everything the child processes need, built before the first fork: between fork and exec they
+// may only make system calls on data prepared beforehand.
+struct ExternalApplication::LaunchPlan {
+    std::vector<std::string> argumentTexts;
+    std::vector<char*> argv;
+    std::vector<char*> environment;
+    std::string directory;
+    std::vector<int> inherited;
+    std::vector<int> keep;  // sorted: the inherited descriptors and the report pipe
+    int reportDescriptor = -1;
+};
 
 ExternalApplication::ExternalApplication(LaunchMode mode)
     : mode_(mode == LaunchMode::Default ? LaunchMode::Vfork : mode) {}
 
-ExternalApplication::~ExternalApplication() = default;
+ExternalApplication::~ExternalApplication() {
+    if (reportDescriptor_ >= 0) {
+        close(reportDescriptor_);
+    }
+}
 
 void ExternalApplication::SetWorkingDirectory(const std::wstring& directory) {
     ScopedLock lock(mutex_);
     workingDirectory_ = directory;
+}
+
+void ExternalApplication::SetInheritedDescriptors(std::vector<int> descriptors) {
+    ScopedLock lock(mutex_);
+    inheritedDescriptors_ = std::move(descriptors);
+}
+
+void ExternalApplication::SetEnvironment(std::vector<std::string> variables) {
+    ScopedLock lock(mutex_);
+    environment_ = std::move(variables);
 }
 
 std::vector<std::wstring> ExternalApplication::SplitCommandLine(const std::wstring& commandLine) {
@@ -107,53 +253,115 @@ bool ExternalApplication::StartLocked(const std::wstring& program,
     if (!workingDirectory_.empty() && !IsDirectory(workingDirectory_)) {
         throw exception::NonexistentException();
     }
-
-    // Everything the child needs is built here, before the child exists.
-    std::vector<std::string> argumentTexts;
-    argumentTexts.reserve(arguments.size() + 1);
-    argumentTexts.push_back(NarrowFromWide(program));
-    for (const std::wstring& argument : arguments) {
-        argumentTexts.push_back(NarrowFromWide(argument));
+    if (mode_ != LaunchMode::Fork && mode_ != LaunchMode::Vfork) {
+        throw PosixError(EINVAL);
     }
-    std::vector<char*> argv;
-    argv.reserve(argumentTexts.size() + 1);
-    for (std::string& text : argumentTexts) {
-        argv.push_back(&text[0]);
-    }
-    argv.push_back(nullptr);
-    const std::string directory = NarrowFromWide(workingDirectory_);
-    const char* directoryOrNull = directory.empty() ? nullptr : directory.c_str();
-
-    pid_t child = -1;
-    if (mode_ == LaunchMode::Vfork) {
-        child = SpawnWithVfork(argv[0], argv.data(), directoryOrNull);
-    } else if (mode_ == LaunchMode::Fork) {
-        child = fork();
-        if (child == 0) {
-            RunChildAfterFork(argv[0], argv.data(), directoryOrNull);
+    for (int descriptor : inheritedDescriptors_) {
+        if (descriptor <= STDERR_FILENO || fcntl(descriptor, F_GETFD) < 0) {
+            throw PosixError("Descriptor to hand over is not open: " + std::to_string(descriptor),
+                             EBADF);
         }
-    } else {
-        errno = EINVAL;
     }
-    if (child < 0) {
-        throw PosixError();
+
+    LaunchPlan plan;
+    plan.argumentTexts.push_back(NarrowFromWide(program));
+    for (const std::wstring& argument : arguments) {
+        plan.argumentTexts.push_back(NarrowFromWide(argument));
     }
-    processId_.store(child);
+    for (std::string& text : plan.argumentTexts) {
+        plan.argv.push_back(&text[0]);
+    }
+    plan.argv.push_back(nullptr);
+    for (std::string& variable : environment_) {
+        plan.environment.push_back(&variable[0]);
+    }
+    plan.environment.push_back(nullptr);
+    plan.directory = NarrowFromWide(workingDirectory_);
+    plan.inherited = inheritedDescriptors_;
+
+    ReportPipe pipe;
+    plan.reportDescriptor = pipe.WriteEnd();
+    plan.keep = plan.inherited;
+    plan.keep.push_back(plan.reportDescriptor);
+    std::sort(plan.keep.begin(), plan.keep.end());
+
+    pid_t intermediate = -1;
+    int forkError = 0;
+    {
+        // The children start with every signal blocked, so that no handler of the host runs in
+        // them before the dispositions are reset.
+        AllSignalsBlocked blocked;
+        intermediate = fork();
+        if (intermediate == 0) {
+            RunIntermediate(plan);
+        }
+        forkError = errno;
+    }
+    if (intermediate < 0) {
+        throw PosixError(forkError);
+    }
+    pipe.CloseWriteEnd();
+    intermediateId_ = intermediate;
+    reportDescriptor_ = pipe.ReleaseReadEnd();
+
+    Report report{};
+    const bool received = ReceiveReport(reportDescriptor_, report);
+    if (!received || report.kind != Report::Started) {
+        Finish(0);
+        state_.store(State::StartAttempted);
+        throw PosixError(received && report.kind == Report::NotStarted ? report.value : ECHILD);
+    }
+    processId_.store(report.value);
     state_.store(State::Running);
     return true;
 }
 
-void ExternalApplication::RunChildAfterFork(const char* program, char* const* argv,
-                                            const char* directory) {
-    try {
-        PrepareChild();
-    } catch (...) {
+void ExternalApplication::RunIntermediate(const LaunchPlan& plan) {
+    // Its own session keeps the terminal's signals away; all signals stay blocked, so only
+    // SIGKILL ends it before it has reported.
+    setsid();
+    ResetSignalDispositions(true);
+    CloseDescriptorsExcept(plan.keep.data(), plan.keep.size());
+    const pid_t program = fork();
+    if (program == 0) {
+        RunProgram(plan);
+    }
+    if (program < 0) {
+        SendReport(plan.reportDescriptor, Report::NotStarted, errno);
         _exit(kChildFailureStatus);
     }
-    if (directory != nullptr && chdir(directory) != 0) {
+    SendReport(plan.reportDescriptor, Report::Started, program);
+    int status = 0;
+    if (WaitPidRetryingInterrupts(program, status) != program) {
+        _exit(kChildFailureStatus);  // the parent sees the pipe end without a result
+    }
+    SendReport(plan.reportDescriptor, Report::Ended, status);
+    _exit(0);
+}
+
+void ExternalApplication::RunProgram(const LaunchPlan& plan) {
+    setsid();
+    ResetSignalDispositions(false);
+    close(plan.reportDescriptor);
+    for (int descriptor : plan.inherited) {
+        if (fcntl(descriptor, F_SETFD, 0) != 0) {
+            _exit(kChildFailureStatus);
+        }
+    }
+    if (mode_ == LaunchMode::Fork) {
+        try {
+            PrepareChild();
+        } catch (...) {
+            _exit(kChildFailureStatus);
+        }
+    }
+    if (!plan.directory.empty() && chdir(plan.directory.c_str()) != 0) {
         _exit(kChildFailureStatus);
     }
-    execvp(program, argv);
+    sigset_t none;
+    sigemptyset(&none);
+    sigprocmask(SIG_SETMASK, &none, nullptr);
+    execvpe(plan.argv[0], plan.argv.data(), plan.environment.data());
     _exit(kChildFailureStatus);
 }
 
@@ -173,43 +381,59 @@ bool ExternalApplication::WaitLocked(int32_t timeoutMs, bool killOnTimeout) {
     if (state_.load() != State::Running) {
         return true;
     }
-    const bool unlimited = timeoutMs < 0;
-    int32_t remainingMs = timeoutMs;
-    while (true) {
-        if (CollectExitStatus(unlimited)) {
-            return true;
-        }
-        if (remainingMs <= 0) {
-            break;
-        }
-        const int32_t stepMs = std::min(remainingMs, kPollIntervalMs);
-        SleepMs(static_cast<uint32_t>(stepMs));
-        remainingMs -= stepMs;
+    if (ReceiveExitStatus(timeoutMs)) {
+        return true;
     }
     if (killOnTimeout) {
-        const pid_t child = processId_.load();
-        KillProcess(child);
-        // Reap the killed child so that no zombie is left behind.
-        int status = 0;
-        const bool reaped = WaitPidRetryingInterrupts(child, status, 0) == child;
-        exitResult_.store(reaped ? ExitResultFromWaitStatus(status) : -SIGKILL);
-        state_.store(State::Finished);
+        KillProcess(processId_.load());
+        // The intermediate process reaps the killed program and reports.
+        ReceiveExitStatus(-1);
     }
     throw exception::Timeout();
 }
 
-bool ExternalApplication::CollectExitStatus(bool block) {
-    int status = 0;
-    const pid_t result = WaitPidRetryingInterrupts(processId_.load(), status, block ? 0 : WNOHANG);
-    if (result < 0) {
-        throw PosixError();
+bool ExternalApplication::ReceiveExitStatus(int32_t timeoutMs) {
+    using Clock = std::chrono::steady_clock;
+    const Clock::time_point deadline = Clock::now() + std::chrono::milliseconds(timeoutMs);
+    while (true) {
+        int pollMs = -1;
+        if (timeoutMs >= 0) {
+            const auto left = deadline - Clock::now();
+            pollMs =
+                left.count() <= 0
+                    ? 0
+                    : static_cast<int>(std::chrono::ceil<std::chrono::milliseconds>(left).count());
+        }
+        pollfd ready{reportDescriptor_, POLLIN, 0};
+        const int result = poll(&ready, 1, pollMs);
+        if (result < 0 && errno != EINTR) {
+            throw PosixError();
+        }
+        if (result > 0) {
+            break;
+        }
+        if (result == 0 && Clock::now() >= deadline) {
+            return false;
+        }
     }
-    if (result == 0) {
-        return false;
+    Report report{};
+    if (!ReceiveReport(reportDescriptor_, report) || report.kind != Report::Ended) {
+        Finish(-SIGKILL);
+        throw PosixError("The exit status of the started program was lost", ECHILD);
     }
-    exitResult_.store(ExitResultFromWaitStatus(status));
-    state_.store(State::Finished);
+    Finish(ExitResultFromWaitStatus(report.value));
     return true;
+}
+
+void ExternalApplication::Finish(int32_t exitResult) {
+    close(reportDescriptor_);
+    reportDescriptor_ = -1;
+    // The intermediate exits right after its last report. A host that ignores SIGCHLD has it
+    // reaped by the system, and waitpid then fails with ECHILD, which is fine.
+    int status = 0;
+    WaitPidRetryingInterrupts(intermediateId_, status);
+    exitResult_.store(exitResult);
+    state_.store(State::Finished);
 }
 
 }  // namespace osdep

@@ -2,7 +2,9 @@
 
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
+#include <chrono>
 #include <cstdint>
 
 #include "property/BagAccess.h"
@@ -34,16 +36,28 @@ constexpr wchar_t kTimeZoneMessage[] = L"Timezone not supported.";
 constexpr wchar_t kHardwareClockArgumentsWithoutAdjtime[] = L"--systohc --noadjfile --utc";
 constexpr wchar_t kHardwareClockArguments[] = L"--systohc";
 
+// The whole environment of the hardware-clock tool: nothing of the host's reaches it.
+constexpr char kHardwareClockSearchPath[] = "PATH=/usr/sbin:/usr/bin:/sbin:/bin";
+// A real-time clock that does not answer must not hold a persist for ever.
+constexpr std::chrono::milliseconds kDefaultHardwareClockTimeLimit{60000};
+
 constexpr uint32_t kMicrosecondsPerSecond = 1000000;
 
-// Copies the system time to the hardware clock with the hardware-clock tool and waits for it.
+std::atomic<int64_t>& HardwareClockTimeLimitMs() {
+    static std::atomic<int64_t> limit{kDefaultHardwareClockTimeLimit.count()};
+    return limit;
+}
+
+// Copies the system time to the hardware clock with the hardware-clock tool and waits for it;
+// a tool that outlives its time limit is killed and raises Timeout.
 void CopySystemTimeToHardwareClock() {
     const bool adjtimeUsable = access(kest::paths::AdjtimeFile().c_str(), R_OK | W_OK) == 0;
     vq::dsc::osdep::ExternalApplication tool;
+    tool.SetEnvironment({kHardwareClockSearchPath});
     tool.StartCommandLine(
         vq::dsc::WideFromNarrow(kest::paths::HardwareClockTool()),
         adjtimeUsable ? kHardwareClockArguments : kHardwareClockArgumentsWithoutAdjtime);
-    tool.Wait();
+    tool.Wait(static_cast<int32_t>(HardwareClockTimeLimitMs().load()), true);
     if (tool.ExitResult() != 0) {
         throw vq::dsc::osdep::PosixError(
             "hardware clock update ended with " + std::to_string(tool.ExitResult()), EIO);
@@ -196,6 +210,10 @@ HRESULT SystemTimeAssistant::PersistSystemPropertyCurrentTime(IuxSysPropertyBag*
         return E_FAIL;
     }
     return S_OK;
+}
+
+void SystemTimeAssistant::SetHardwareClockTimeLimit(std::chrono::milliseconds limit) {
+    HardwareClockTimeLimitMs().store(limit.count());
 }
 
 bool SystemTimeAssistant::HasRealTimeClock() {

@@ -3,6 +3,7 @@
 // through the time-zone table file, read through the process-wide INI cache.
 #pragma once
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -60,9 +61,12 @@ class SystemTimeAssistant {
     // True when one of the real-time clock device nodes is readable.
     static bool HasRealTimeClock();
     // Sets the system clock to `time` and copies it to the hardware clock when there is one.
-    // Raises vq::dsc::osdep::PosixError when either step fails (the system time stays set), or
-    // vq::dsc::exception::OutOfRange for a time the system clock cannot hold.
+    // Raises vq::dsc::osdep::PosixError when either step fails (the system time stays set),
+    // vq::dsc::exception::Timeout when the hardware-clock tool outlives its limit (it is killed),
+    // or vq::dsc::exception::OutOfRange for a time the system clock cannot hold.
     static void SetCurrentSystemTime(const vq::dsc::AbsTime& time);
+    // How long the hardware-clock tool may run: 60 s in the plug-in; tests shorten it.
+    static void SetHardwareClockTimeLimit(std::chrono::milliseconds limit);
 
   private:
     HRESULT Lookup(const char* section, const std::string& key, std::string& value);

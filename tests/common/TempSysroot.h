@@ -5,7 +5,8 @@
 //
 //     kest::test::TempSysroot sysroot;
 //     sysroot.WriteFile("/etc/korvane/version", "1.2.3\n");
-//     sysroot.WriteScript("/sbin/hwclock", "echo \"$@\" > \"$KEST_SYSROOT/hwclock.args\"\n");
+//     sysroot.WriteScript("/sbin/hwclock", "echo \"$@\" > '" + sysroot.PathOf("/hwclock.args") +
+//     "'\n");
 //     ... code under test ...
 //     EXPECT_EQ(sysroot.ReadFile("/hwclock.args"), "--systohc\n");
 #pragma once

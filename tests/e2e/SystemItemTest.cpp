@@ -196,7 +196,8 @@ TEST_F(SystemItemTest, SetsTheTimeZoneInEitherNotation) {
 
 TEST_F(SystemItemTest, SetsTheClockAndTheHardwareClock) {
     sysroot.WriteFile("/dev/rtc0", "");
-    sysroot.WriteScript("/sbin/hwclock", "echo \"$@\" >> \"$KEST_SYSROOT/hwclock.log\"\n");
+    sysroot.WriteScript("/sbin/hwclock",
+                        "echo \"$@\" >> '" + sysroot.PathOf("/hwclock.log") + "'\n");
     const Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
         changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds + 1700000000});
     }));

@@ -1,12 +1,18 @@
 #include "support/ExternalApplication.h"
 
+#include <dirent.h>
 #include <fcntl.h>
+#include <limits.h>
+#include <pthread.h>
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
 #include <chrono>
+#include <cstring>
+#include <fstream>
+#include <set>
 
 #include <gtest/gtest.h>
 
@@ -158,6 +164,100 @@ TEST(ExternalApplicationTest, ChildGetsArgumentsWorkingDirectoryAndForkHook) {
     ASSERT_TRUE(vforked.Start(L"/bin/true", {}));
     ASSERT_TRUE(vforked.Wait());
     EXPECT_FALSE(tree.Exists("/vforked")) << "the hook runs only after fork";
+}
+
+// The host's state that must not reach a started program: ignored and blocked signals, a
+// descriptor without close-on-exec, its environment. SIGCHLD is ignored as some hosts do, which
+// makes the system reap children at once.
+class HostStateTest : public ::testing::Test {
+  protected:
+    void SetUp() override {
+        struct sigaction ignore {};
+        ignore.sa_handler = SIG_IGN;
+        for (int signal : {SIGINT, SIGPIPE, SIGCHLD}) {
+            sigaction(signal, &ignore, &previous_[signal]);
+        }
+        sigset_t blocked;
+        sigemptyset(&blocked);
+        sigaddset(&blocked, SIGUSR1);
+        pthread_sigmask(SIG_BLOCK, &blocked, &previousMask_);
+        stray_ = open("/dev/null", O_RDONLY);
+        handedOver_ = open("/dev/null", O_RDONLY | O_CLOEXEC);
+    }
+    void TearDown() override {
+        for (int signal : {SIGINT, SIGPIPE, SIGCHLD}) {
+            sigaction(signal, &previous_[signal], nullptr);
+        }
+        pthread_sigmask(SIG_SETMASK, &previousMask_, nullptr);
+        close(stray_);
+        close(handedOver_);
+    }
+
+    struct sigaction previous_[NSIG] {};
+    sigset_t previousMask_{};
+    int stray_ = -1;
+    int handedOver_ = -1;
+};
+
+// The first line of /proc/<pid>/<file> that starts with `key`, or all of it without a key.
+std::string ProcText(pid_t pid, const char* file, const std::string& key = "") {
+    std::ifstream in("/proc/" + std::to_string(pid) + "/" + file, std::ios::binary);
+    if (key.empty()) {
+        return std::string(std::istreambuf_iterator<char>(in), {});
+    }
+    for (std::string line; std::getline(in, line);) {
+        if (line.compare(0, key.size(), key) == 0) {
+            return line;
+        }
+    }
+    return "";
+}
+
+std::set<int> OpenDescriptors(pid_t pid) {
+    std::set<int> descriptors;
+    DIR* directory = opendir(("/proc/" + std::to_string(pid) + "/fd").c_str());
+    while (const dirent* entry = directory != nullptr ? readdir(directory) : nullptr) {
+        if (entry->d_name[0] != '.') {
+            descriptors.insert(std::atoi(entry->d_name));
+        }
+    }
+    if (directory != nullptr) {
+        closedir(directory);
+    }
+    return descriptors;
+}
+
+TEST_F(HostStateTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSigchld) {
+    for (Mode mode : {Mode::Fork, Mode::Vfork}) {
+        ExternalApplication application(mode);
+        application.SetInheritedDescriptors({handedOver_});
+        application.SetEnvironment({"PATH=/usr/bin:/bin", "A=b c"});
+        ASSERT_TRUE(application.Start(L"/bin/sleep", {L"30"}));
+        const pid_t pid = application.ProcessId();
+        char exe[PATH_MAX] = {};
+        for (int attempt = 0; attempt < 2000 && std::strstr(exe, "sleep") == nullptr; ++attempt) {
+            std::fill(std::begin(exe), std::end(exe), '\0');
+            readlink(("/proc/" + std::to_string(pid) + "/exe").c_str(), exe, sizeof exe - 1);
+            usleep(5000);
+        }
+        ASSERT_NE(std::strstr(exe, "sleep"), nullptr) << "the program never ran";
+        EXPECT_EQ(OpenDescriptors(pid), (std::set<int>{0, 1, 2, handedOver_}));
+        EXPECT_EQ(ProcText(pid, "status", "SigIgn:"), "SigIgn:\t0000000000000000");
+        EXPECT_EQ(ProcText(pid, "status", "SigBlk:"), "SigBlk:\t0000000000000000");
+        EXPECT_EQ(getsid(pid), pid) << "own session";
+        EXPECT_EQ(ProcText(pid, "environ"), std::string("PATH=/usr/bin:/bin\0A=b c\0", 25));
+        EXPECT_EQ(fcntl(handedOver_, F_GETFD), FD_CLOEXEC) << "cleared in the child only";
+        EXPECT_FALSE(application.Wait(0, true, true));
+        EXPECT_EQ(application.ExitResult(), -9);
+    }
+    ExternalApplication exiting;
+    StartShell(exiting, L"exit 5");
+    EXPECT_TRUE(exiting.Wait());
+    EXPECT_EQ(exiting.ExitResult(), 5);
+
+    ExternalApplication closedDescriptor;
+    closedDescriptor.SetInheritedDescriptors({stray_ + 100});
+    EXPECT_THROW(closedDescriptor.Start(L"/bin/true", {}), vq::dsc::osdep::PosixError);
 }
 
 }  // namespace

@@ -25,8 +25,8 @@ class SystemItemChangesTest : public ::testing::Test, public test::SystemItemSys
         // The hardware-clock tool also logs the web-service settings it finds.
         sysroot_.WriteFile("/dev/rtc", "");
         sysroot_.WriteScript("/sbin/hwclock",
-                             "cat \"$KEST_SYSROOT/etc/korvane/share/vqkest.ini\" >> "
-                             "\"$KEST_SYSROOT/hwclock.log\" 2>/dev/null || true\n");
+                             "cat '" + sysroot_.PathOf("/etc/korvane/share/vqkest.ini") + "' >> '" +
+                                 sysroot_.PathOf("/hwclock.log") + "' 2>/dev/null || true\n");
     }
 
     HRESULT Validate() {

@@ -77,8 +77,8 @@ class SystemItemSysroot : public vqsim_test::SimSysroot {
         sysroot_.WriteFile("/etc/korvane/version", "22.5.0\nbuild 17\n");
         sysroot_.WriteFile(kTimeZoneTablePath, kSmallTimeZoneTable);
         sysroot_.MakeDirectory("/etc/korvane/share");
-        sysroot_.WriteScript("/sbin/hwclock", "echo \"$@\" >> \"$KEST_SYSROOT" +
-                                                  std::string(kHardwareClockLog) + "\"\n");
+        sysroot_.WriteScript("/sbin/hwclock",
+                             "echo \"$@\" >> '" + sysroot_.PathOf(kHardwareClockLog) + "'\n");
     }
 
     // The shipped table from the source tree, installed in place of the small one.

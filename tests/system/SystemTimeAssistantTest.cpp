@@ -1,7 +1,10 @@
 #include "system/SystemTimeAssistant.h"
 
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/stat.h>
+
+#include <chrono>
 
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/ConvertStatusCode.h"
@@ -214,6 +217,30 @@ TEST_F(ClockTest, ClockFailuresBecomeEFailAfterTheSystemTimeIsSet) {
 
     chmod(sysroot_.PathOf("/sbin/hwclock").c_str(), 0644);
     EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+}
+
+TEST_F(ClockTest, HardwareClockGetsOnlyTheSearchPathAndATimeLimit) {
+    sysroot_.WriteFile("/dev/rtc", "");
+    sysroot_.WriteScript("/sbin/hwclock",
+                         "tr '\\0' ';' < /proc/$$/environ > '" + sysroot_.PathOf("/env") + "'\n");
+    // A host that ignores SIGCHLD, whose children the system reaps at once.
+    struct sigaction ignore {};
+    struct sigaction previous {};
+    ignore.sa_handler = SIG_IGN;
+    sigaction(SIGCHLD, &ignore, &previous);
+    EXPECT_NO_THROW(SystemTimeAssistant::SetCurrentSystemTime(vq::dsc::AbsTime{0, kEpoch + 60}));
+    sigaction(SIGCHLD, &previous, nullptr);
+    EXPECT_EQ("PATH=/usr/sbin:/usr/bin:/sbin:/bin;", sysroot_.ReadFile("/env"));
+
+    sysroot_.WriteScript("/sbin/hwclock", "exec sleep 30\n");
+    constexpr std::chrono::milliseconds kShortLimit{200};
+    SystemTimeAssistant::SetHardwareClockTimeLimit(kShortLimit);
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    bag->SetTimestamp(SystemTag::kCurrentTime, {0, kEpoch + 100});
+    const auto start = std::chrono::steady_clock::now();
+    EXPECT_EQ(E_FAIL, assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0));
+    EXPECT_GE(std::chrono::steady_clock::now() - start, kShortLimit);
+    SystemTimeAssistant::SetHardwareClockTimeLimit(std::chrono::seconds(60));
 }
 
 TEST_F(ClockTest, TimesTheClockCannotHoldBecomeEFail) {
