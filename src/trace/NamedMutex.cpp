@@ -66,25 +66,15 @@ int OpenLockFile(const std::string& path, bool& created) {
 // shares its file lock with the parent.
 class NamedLockState {
   public:
-    explicit NamedLockState(std::string lockFilePath)
+    // Without `directoryTrusted` no lock file is opened at all.
+    NamedLockState(std::string lockFilePath, bool directoryTrusted)
         : path(std::move(lockFilePath)), openedBy_(getpid()) {
-        descriptor_ = OpenLockFile(path, created_);
+        if (directoryTrusted) {
+            descriptor_ = OpenLockFile(path, created_);
+        }
         usable_.store(descriptor_ >= 0);
     }
-    ~NamedLockState() {
-        if (descriptor_ < 0) {
-            return;
-        }
-        // Only the file this very process created goes, and only while the name still is it.
-        struct stat named {};
-        struct stat held {};
-        if (created_ && openedBy_ == getpid() && lstat(path.c_str(), &named) == 0 &&
-            fstat(descriptor_, &held) == 0 && named.st_dev == held.st_dev &&
-            named.st_ino == held.st_ino) {
-            unlink(path.c_str());
-        }
-        close(descriptor_);
-    }
+    ~NamedLockState() { CloseLockFile(); }
     NamedLockState(const NamedLockState&) = delete;
     NamedLockState& operator=(const NamedLockState&) = delete;
 
@@ -92,9 +82,7 @@ class NamedLockState {
     // held); -1 without a usable lock file.
     int DescriptorOfThisProcess() {
         if (openedBy_ != getpid()) {
-            if (descriptor_ >= 0) {
-                close(descriptor_);
-            }
+            CloseLockFile();  // the parent's file: closed, never removed here
             descriptor_ = OpenLockFile(path, created_);
             openedBy_ = getpid();
         }
@@ -133,10 +121,24 @@ class NamedLockState {
   private:
     void GiveUpFileLock() {
         usable_.store(false);
-        if (descriptor_ >= 0) {
-            close(descriptor_);
-            descriptor_ = -1;
+        CloseLockFile();
+    }
+
+    // Closes the lock file, removing it when this very process created it and the name still
+    // is that file.
+    void CloseLockFile() {
+        if (descriptor_ < 0) {
+            return;
         }
+        struct stat named {};
+        struct stat held {};
+        if (created_ && openedBy_ == getpid() && lstat(path.c_str(), &named) == 0 &&
+            fstat(descriptor_, &held) == 0 && named.st_dev == held.st_dev &&
+            named.st_ino == held.st_ino) {
+            unlink(path.c_str());
+        }
+        close(descriptor_);
+        descriptor_ = -1;
     }
 
     int descriptor_ = -1;
@@ -156,12 +158,13 @@ class NamedLockRegistry {
         std::shared_ptr<NamedLockState> state = states_[name].lock();
         if (!state) {
             const std::string directory = kest::paths::NamedMutexDirectory();
+            bool directoryTrusted = true;
             try {
                 osdep::CreateDirectories(directory, kLockDirectoryMode);
             } catch (const exception::Exception&) {
-                // The lock file cannot be created below; the state goes on without it.
+                directoryTrusted = false;  // the state goes on without a lock file
             }
-            state = std::make_shared<NamedLockState>(directory + "/" + name);
+            state = std::make_shared<NamedLockState>(directory + "/" + name, directoryTrusted);
             states_[name] = state;
         }
         return state;
