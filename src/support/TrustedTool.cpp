@@ -34,7 +34,7 @@ std::string TrustedToolPath(const std::string& path) {
     if (realpath(path.c_str(), resolved) == nullptr) {
         throw vq::dsc::osdep::PosixError();
     }
-    const std::string tool = resolved;
+    std::string tool = resolved;
     const std::string directory = tool.substr(0, tool.rfind('/'));
     if (!OnlyOwnerMayChange(tool) || !OnlyOwnerMayChange(directory.empty() ? "/" : directory)) {
         throw vq::dsc::osdep::PosixError("Tool may be changed by others, not started: " + tool,

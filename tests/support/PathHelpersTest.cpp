@@ -113,8 +113,9 @@ TEST_F(PathHelpersTest, CreateDirectoriesFailures) {
     ASSERT_EQ(lchown(At("/open/theirlink").c_str(), 65534, 65534), 0);
     const std::pair<const char*, int> refused[] = {
         {"/open/theirs/below", EPERM}, {"/open/link/below", ELOOP}, {"/open/theirlink", ELOOP}};
-    for (const auto& [path, error] : refused) {
-        EXPECT_EQ(PosixErrorOf([&] { CreateDirectories(At(path)); }), error) << path;
+    for (const auto& entry : refused) {
+        const std::string path = At(entry.first);
+        EXPECT_EQ(PosixErrorOf([&] { CreateDirectories(path); }), entry.second) << path;
     }
     EXPECT_FALSE(IsDirectory(At("/dir/below")));
 
