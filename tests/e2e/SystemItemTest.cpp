@@ -201,6 +201,20 @@ TEST_F(SystemItemTest, SetsTheClockAndTheHardwareClock) {
     EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot.ReadFile("/hwclock.log"));
 }
 
+TEST_F(SystemItemTest, ClockFollowsTheLegacyZoneHoweverItIsSpelled) {
+    // From Europe/Berlin (an Olson name: no built-in offset) to eight hours west of UTC.
+    for (const wchar_t* spelling : {L"PST8PDT", L"pst8pdt", L" PST8PDT "}) {
+        WriteControllerState(std::string(kSystemState) + "DeviceDescription = KEST 9100\n");
+        const Outcome outcome = Apply(Changes([&](IuxSysPropertyBag2* changes) {
+            changes->SetString(kLegacyTimeZoneTag, spelling);
+            changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds + 1700000000});
+        }));
+        EXPECT_EQ(S_OK, outcome.persistence);
+        EXPECT_EQ("1700028800 0\n", sysroot.ReadFile("/run/kest/system-clock"));
+        EXPECT_EQ(L"America/Los_Angeles", Text(kOlsonTimeZoneTag));
+    }
+}
+
 TEST_F(SystemItemTest, SwitchesTheWebService) {
     Outcome outcome =
         Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 1); }));
@@ -229,14 +243,31 @@ TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
          UX_E_VALUE_INVALID, L"Comment length cannot exceed 64 characters."},
         {kLocaleTag, L"e", UX_E_VALUE_INVALID, L"Locale not supported."},
         {kLegacyTimeZoneTag, L"NFT-11:30", UX_E_VALUE_INVALID, L"Timezone not supported."},
+        {kHostNameTag, L"kest-2\nreboot", UX_E_HOSTNAME_INVALID,
+         L"Hostname must contain only alphanumeric characters and hyphens."},
+        {kOlsonTimeZoneTag, L"../x", UX_E_VALUE_INVALID, L"Timezone not supported."},
+        {kCommentTag, L"rack\r4", UX_E_VALUE_INVALID,
+         L"Comment cannot contain control characters."},
     };
+    // A zone file that a name leading out of the zone directory would find.
+    sysroot.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
         const Outcome outcome = Apply(
             Changes([&](IuxSysPropertyBag2* changes) { changes->SetString(c.tag, c.value); }));
         EXPECT_EQ(c.status, outcome.validation) << std::hex << c.tag;
         EXPECT_EQ(c.message, outcome.message) << std::hex << c.tag;
         EXPECT_TRUE(outcome.validated.empty());
+
+        // A host that persists without validating first gets the same status.
+        IuxSysPropertyBag2* changes =
+            Changes([&](IuxSysPropertyBag2* bag) { bag->SetString(c.tag, c.value); });
+        int32_t restart = -1;
+        EXPECT_EQ(c.status, expert->PersistPropertyChanges(kSystemItemName, changes, &restart))
+            << std::hex << c.tag;
+        changes->Release();
     }
+    EXPECT_EQ(std::string::npos, sysroot.ReadFile(kControllerCallLogPath).find("\tSet"))
+        << "nothing reached the controller";
     const Outcome old = Apply(Changes([](IuxSysPropertyBag2* changes) {
         changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds - 1});
     }));
