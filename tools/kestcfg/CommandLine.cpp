@@ -95,7 +95,7 @@ std::string UsageText() {
         "UTC (2030-01-02T03:04:05Z) or now.\n"
         "\n"
         "examples:\n"
-        "  kestcfg sim init /tmp/kest && export KEST_SYSROOT=/tmp/kest\n"
+        "  root=$(mktemp -d) && kestcfg sim init \"$root\" && export KEST_SYSROOT=\"$root\"\n"
         "  kestcfg get eth0\n"
         "  kestcfg set eth0 polling-interval=250\n"
         "  kestcfg refresh 'VQ KEST Chassis' current-time\n"
