@@ -13,7 +13,8 @@ constexpr wchar_t kUpdateMode[] = L"3";
 
 }  // namespace
 
-bool RunFirmwareTool(const std::string& tool, const std::string& stagingPath) {
+bool RunFirmwareTool(const std::string& tool, const std::string& stagingPath,
+                     int inheritedDescriptor, const std::function<void(pid_t)>& started) {
     // The tool gets an empty environment: nothing of the host's settings reaches it.
     vq::dsc::osdep::ExternalApplication application;
     application.SetEnvironment({});
@@ -23,10 +24,15 @@ bool RunFirmwareTool(const std::string& tool, const std::string& stagingPath) {
     } catch (const vq::dsc::exception::Exception&) {
         return false;
     }
-    const bool started =
-        application.Start(vq::dsc::WideFromNarrow(trustedTool),
-                          {vq::dsc::WideFromNarrow(stagingPath), kUpdateMode}, true);
-    if (!started || !application.Wait(-1, false, true)) {
+    if (inheritedDescriptor >= 0) {
+        application.SetInheritedDescriptors({inheritedDescriptor});
+    }
+    if (!application.Start(vq::dsc::WideFromNarrow(trustedTool),
+                           {vq::dsc::WideFromNarrow(stagingPath), kUpdateMode}, true)) {
+        return false;
+    }
+    started(application.ProcessId());
+    if (!application.Wait(-1, false, true)) {
         return false;
     }
     // A negative result is the signal that ended the tool: the update did not finish.

@@ -73,17 +73,24 @@ HRESULT FirmwareUpdater::Prepare(uint32_t imageSize, CvqBStr* updateId) noexcept
         return E_FAIL;
     }
     try {
+        if (!TakeUpdateLock()) {
+            TraceIfEnabled("Another firmware update of the controller is under way", kTraceErrors);
+            busy_.store(0);
+            return E_FAIL;
+        }
         uint64_t freeBytes = 0;
         const std::string stagingDirectory = kest::paths::FirmwareStagingDirectory();
         if (GetFreeDiskSpace(stagingDirectory.c_str(), nullptr, &freeBytes) != 0 ||
             freeBytes < 2 * static_cast<uint64_t>(imageSize)) {
             TraceIfEnabled("Not enough free space for the firmware image", kTraceErrors);
+            ReleaseUpdateLock();
             busy_.store(0);
             return E_FAIL;
         }
         updateId_ = vq::dsc::GuidToString(vq::dsc::Guid::CreateTimeBased());
         *updateId = CvqBStrAlloc(updateId_.c_str());
         if (*updateId == nullptr) {
+            ReleaseUpdateLock();
             busy_.store(0);
             return E_OUTOFMEMORY;
         }
@@ -92,8 +99,34 @@ HRESULT FirmwareUpdater::Prepare(uint32_t imageSize, CvqBStr* updateId) noexcept
         return S_OK;
     } catch (...) {
         const HRESULT status = StatusOfCurrentException();
+        TraceIfEnabled("Cannot prepare the firmware update", kTraceErrors);
+        ReleaseUpdateLock();
         busy_.store(0);
-        return status;
+        return FAILED(status) ? status : E_FAIL;
+    }
+}
+
+bool FirmwareUpdater::TakeUpdateLock() {
+    std::lock_guard<std::mutex> lock(lockMutex_);
+    if (!updateLock_.IsHeld()) {
+        updateLock_ =
+            vq::dsc::osdep::ProcessLockFile::TryTake(kest::paths::FirmwareUpdateLockFile());
+    }
+    return updateLock_.IsHeld();
+}
+
+void FirmwareUpdater::ReleaseUpdateLock() noexcept {
+    try {
+        std::lock_guard<std::mutex> lock(lockMutex_);
+        updateLock_.Release();
+    } catch (...) {
+        // Taking a standard mutex fails only when the system is out of resources.
+    }
+}
+
+void FirmwareUpdater::ReleasePreparedUpdate() noexcept {
+    if (state_.load() == FirmwareUpdateState::kPrepared) {
+        ReleaseUpdateLock();
     }
 }
 
@@ -122,6 +155,11 @@ HRESULT FirmwareUpdater::StartPrepared(const wchar_t* updateId, IUnknown* imageS
     if (updateId_ != updateId) {
         return FailUpdate(UX_E_FIRMWARE_ID_MISMATCH);
     }
+    // A prepared update whose lock was let go (Uninitialize) needs it back before staging.
+    if (!TakeUpdateLock()) {
+        TraceIfEnabled("Another firmware update of the controller is under way", kTraceErrors);
+        return FailUpdate(E_FAIL);
+    }
     const HRESULT staged = StageFirmwareImage(imageSource, stagingPath_, announcedSize_);
     if (FAILED(staged)) {
         return FailUpdate(staged);
@@ -147,6 +185,7 @@ HRESULT FirmwareUpdater::StartPrepared(const wchar_t* updateId, IUnknown* imageS
 
 HRESULT FirmwareUpdater::FailUpdate(HRESULT status) noexcept {
     state_.store(FirmwareUpdateState::kFailed);
+    ReleaseUpdateLock();
     // Cleared last: a new update may begin as soon as it is.
     busy_.store(0);
     return status;
@@ -156,19 +195,39 @@ void FirmwareUpdater::RunFirmwareUpdateTool(const std::string& stagingPath) noex
     bool installed = false;
     if (state_.load() == FirmwareUpdateState::kRunning) {
         try {
-            installed = RunFirmwareTool(kest::paths::FirmwareUpdateTool(), stagingPath);
+            // Held until the tool runs: then the tool's process alone keeps the update lock, so
+            // that it lasts exactly as long as the tool, even when this process dies.
+            std::unique_lock<std::mutex> handingOver(lockMutex_);
+            installed = RunFirmwareTool(kest::paths::FirmwareUpdateTool(), stagingPath,
+                                        updateLock_.Descriptor(), [&](pid_t tool) {
+                                            updateLock_.RecordHolder(tool);
+                                            updateLock_.Release();
+                                            handingOver.unlock();
+                                        });
         } catch (...) {
             installed = false;
         }
     }
     if (installed) {
+        ReleaseUpdateLock();
         // The busy flag stays set: this expert installs no second image.
         state_.store(FirmwareUpdateState::kInstalled);
         return;
     }
     TraceIfEnabled("The firmware update tool failed", kTraceErrors);
-    unlink(stagingPath.c_str());
+    RemoveStagedImage(stagingPath);
     FailUpdate(E_FAIL);
+}
+
+void FirmwareUpdater::RemoveStagedImage(const std::string& stagingPath) noexcept {
+    try {
+        if (TakeUpdateLock()) {
+            unlink(stagingPath.c_str());
+        }
+    } catch (...) {
+        TraceIfEnabled("Cannot take the firmware update lock to remove the staged image",
+                       kTraceErrors);
+    }
 }
 
 HRESULT FirmwareUpdater::GetStatus(int32_t* state, int32_t* percent) noexcept {

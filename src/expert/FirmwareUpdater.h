@@ -10,6 +10,7 @@
 #include <boost/thread/thread.hpp>
 
 #include "expert/FirmwareUpdateState.h"
+#include "support/ProcessLockFile.h"
 #include "uxsys/HostString.h"
 #include "uxsys/IUnknown.h"
 
@@ -27,8 +28,9 @@ class FirmwareUpdater {
     void SetStagingPath(std::string stagingPath);
 
     // Announces an image of `imageSize` bytes and stores its new identifier ("{...}", upper-case)
-    // in *updateId. E_FAIL while another update holds the updater or when the staging directory
-    // has less than twice `imageSize` free; E_POINTER for a null result.
+    // in *updateId. E_FAIL while another update holds the updater or the controller's update
+    // lock (another expert or process), when the lock cannot be set up, or when the staging
+    // directory has less than twice `imageSize` free; E_POINTER for a null result.
     HRESULT Prepare(uint32_t imageSize, CvqBStr* updateId) noexcept;
 
     // Stages the image of `imageSource` for the prepared update `updateId`, then runs the tool on
@@ -44,12 +46,22 @@ class FirmwareUpdater {
     // Waits until a started worker has ended. E_FAIL when called on the worker itself.
     HRESULT WaitForWorker() noexcept;
 
+    // Lets other updates of the controller begin when this one was prepared but not started;
+    // a later Start takes the update lock again or fails.
+    void ReleasePreparedUpdate() noexcept;
+
   private:
     // The worker's body: runs the tool and records how it ended.
     void RunFirmwareUpdateTool(const std::string& stagingPath) noexcept;
     // Ends the update attempt as failed and frees the updater; returns `status`.
     HRESULT FailUpdate(HRESULT status) noexcept;
     HRESULT StartPrepared(const wchar_t* updateId, IUnknown* imageSource);
+    // Takes the controller's update lock unless this updater holds it; false when another does.
+    bool TakeUpdateLock();
+    void ReleaseUpdateLock() noexcept;
+    // Removes the staged image after a failed run, unless another update has taken the
+    // controller since the tool ended (the staging file is then that update's).
+    void RemoveStagedImage(const std::string& stagingPath) noexcept;
 
     std::atomic<FirmwareUpdateState> state_{FirmwareUpdateState::kIdle};
     uint32_t announcedSize_ = 0;
@@ -60,6 +72,10 @@ class FirmwareUpdater {
     // Serialises Start, SetStagingPath and the handling of the worker handle.
     std::mutex startMutex_;
     boost::thread worker_;
+    // The controller-wide update lock, held from Prepare until the attempt ends or the tool runs
+    // (the tool's process then holds it).
+    std::mutex lockMutex_;
+    vq::dsc::osdep::ProcessLockFile updateLock_;
 };
 
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100

@@ -48,6 +48,7 @@ HRESULT KestSysApiExpert::Initialize() {
 HRESULT KestSysApiExpert::Uninitialize() {
     const HRESULT status = CuxNetConfigExpert::Uninitialize();
     const HRESULT waited = firmwareUpdate_.WaitForWorker();
+    firmwareUpdate_.ReleasePreparedUpdate();
     return FAILED(waited) ? waited : status;
 }
 

@@ -31,8 +31,9 @@ class KestSysApiExpert : public CuxNetConfigExpert,
     // The framework's Initialize, then the firmware staging path. A failure to set the path
     // undoes the framework's part.
     HRESULT Initialize() override;
-    // The framework's Uninitialize, then waits for a running firmware update to end. E_FAIL,
-    // without waiting, on the update's own worker thread.
+    // The framework's Uninitialize, then waits for a running firmware update to end and lets
+    // go of the controller's update lock of an update prepared but not started. E_FAIL, without
+    // waiting, on the update's own worker thread.
     HRESULT Uninitialize() override;
 
     // Keeps one reference to `callback` (null drops the one held) and never calls it.

@@ -80,6 +80,10 @@ std::string FirmwareUpdateStatusFile() {
     return ResolveSystemPath("/var/run/firmware_update/status");
 }
 
+std::string FirmwareUpdateLockFile() {
+    return ResolveSystemPath("/var/run/firmware_update/update.lock");
+}
+
 std::string FirmwareStagingDirectory() {
     return ResolveSystemPath("/var/volatile/tmp");
 }

@@ -40,6 +40,8 @@ std::string TimeZoneTableFile();
 std::string FirmwareUpdateTool();
 // The firmware-update tool's progress file.
 std::string FirmwareUpdateStatusFile();
+// The lock file beside the status file that admits one firmware update per controller.
+std::string FirmwareUpdateLockFile();
 // Directory that holds the staged firmware image.
 std::string FirmwareStagingDirectory();
 // The staged firmware image file.

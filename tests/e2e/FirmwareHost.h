@@ -22,9 +22,13 @@ constexpr char kStagingPath[] = "/var/volatile/tmp/kestsysxp.fwupdate.cfg";
 // What GetFirmwareUpdateStatus leaves in a percentage it does not write.
 constexpr int32_t kUntouchedPercent = 12345;
 
-// The stand-in tool's ending that waits for ReleaseTool and exits with the code given there.
+constexpr char kUpdateLockPath[] = "/var/run/firmware_update/update.lock";
+
+// The stand-in tool's ending that waits for ReleaseTool, records the staging file's checksum
+// again and exits with the code given there.
 constexpr char kWaitForRelease[] =
     "while [ ! -e \"$root/tool/release\" ]; do sleep 0.02; done\n"
+    "cksum < \"$1\" > \"$root/tool/sum.end\"\n"
     ": > \"$root/tool/finished\"\n"
     "exit \"$(cat \"$root/tool/release\")\"\n";
 
@@ -106,14 +110,16 @@ class FirmwareHostTest : public ExpertHostTest {
         ExpertHostTest::TearDown();
     }
 
-    // Installs the stand-in tool: it records what it was given, then runs `ending`. The tool
-    // gets an empty environment, so it names the sysroot itself.
+    // Installs the stand-in tool: it records what it was given (the staging file's checksum
+    // included), then runs `ending`. The tool gets an empty environment, so it names the sysroot
+    // itself.
     void InstallTool(const std::string& ending) const {
         sysroot.WriteScript(kToolPath, "root='" + sysroot.Root() +
                                            "'\n"
                                            "printf '%s\\n' \"$0\" \"$@\" > \"$root/tool/args\"\n"
                                            "export -p > \"$root/tool/environment\"\n"
                                            "cat \"$1\" > \"$root/tool/image\"\n"
+                                           "cksum < \"$1\" > \"$root/tool/sum.start\"\n"
                                            ": > \"$root/tool/started\"\n" +
                                            ending);
     }

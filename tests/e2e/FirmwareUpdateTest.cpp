@@ -1,11 +1,16 @@
 // Firmware update as a host drives it: prepare, start with either kind of image source, follow
 // the stand-in tool's progress, and the end of the worker at Uninitialize and destruction.
+#include <dirent.h>
+#include <fcntl.h>
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <chrono>
+#include <cstring>
 #include <functional>
 #include <regex>
 #include <thread>
@@ -24,6 +29,21 @@ std::string NarrowText(const std::wstring& text) {
 ino_t InodeOf(const std::string& path) {
     struct stat status {};
     return lstat(path.c_str(), &status) == 0 ? status.st_ino : 0;
+}
+
+// The names in `directory` other than the staging file: temporaries left behind.
+std::vector<std::string> LeftoverTemporaries(const std::string& directory) {
+    std::vector<std::string> names;
+    if (DIR* listing = opendir(directory.c_str())) {
+        while (const dirent* entry = readdir(listing)) {
+            const std::string name = entry->d_name;
+            if (name != "." && name != ".." && name != "kestsysxp.fwupdate.cfg") {
+                names.push_back(name);
+            }
+        }
+        closedir(listing);
+    }
+    return names;
 }
 
 class FirmwareUpdateTest : public FirmwareHostTest {
@@ -133,7 +153,9 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndFreeTheExpert) {
     HostImage shortImage(kImage, sizeof kImage - 2);
     HostImage failingPath(L"/nowhere", E_FAIL);
     HostImage missingFile(L"/nonexistent/firmware.bin");
-    const std::string outside = sysroot.PathOf("/outside");
+    const std::string pipePath = sysroot.PathOf("/images/pipe");
+    HostImage pipeFile(std::wstring(pipePath.begin(), pipePath.end()));
+    sysroot.MakeDirectory("/images");
     const std::string staging = sysroot.PathOf(kStagingPath);
     const struct {
         const char* name;
@@ -147,12 +169,9 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndFreeTheExpert) {
         {"no image source", true, nullptr, E_POINTER, [] {}},
         {"image path refused", true, &failingPath, E_FAIL, [] {}},
         {"image file missing", true, &missingFile, E_FAIL, [] {}},
-        {"staging path is a symbolic link", true, &bytes, E_FAIL,
-         [&] { ASSERT_EQ(0, symlink(outside.c_str(), staging.c_str())); }},
-        {"staging path is a second name of another file", true, &bytes, E_FAIL,
-         [&] { ASSERT_EQ(0, link(outside.c_str(), staging.c_str())); }},
-        {"staging path is a pipe", true, &bytes, E_FAIL,
-         [&] { ASSERT_EQ(0, mkfifo(staging.c_str(), 0600)); }},
+        // A pipe links like a file but would stall the tool.
+        {"image file is a pipe", true, &pipeFile, E_FAIL,
+         [&] { ASSERT_EQ(0, mkfifo(pipePath.c_str(), 0600)); }},
         {"staging path is a directory", true, &bytes, E_FAIL,
          [&] { ASSERT_EQ(0, mkdir(staging.c_str(), 0700)); }},
     };
@@ -172,9 +191,188 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndFreeTheExpert) {
         const FirmwareStatus after = Poll();
         EXPECT_EQ(UX_FIRMWARE_STATE_FAILED, after.state);
         EXPECT_EQ(-1, after.percent);
+        EXPECT_EQ(std::vector<std::string>{},
+                  LeftoverTemporaries(sysroot.PathOf(kStagingDirectory)));
+        unlink(pipePath.c_str());
     }
-    EXPECT_EQ("keep me", sysroot.ReadFile("/outside"));
     EXPECT_FALSE(sysroot.Exists("/tool/args"));
+}
+
+// What stands at the staging path before an update, and where the host's image comes from.
+struct StagingCase {
+    const char* name;
+    void (*prepare)(const kest::test::TempSysroot& sysroot);
+    // The image file the host names; empty: the host hands over bytes.
+    std::string (*imageFile)(const kest::test::TempSysroot& sysroot);
+};
+
+class FirmwareStagingTest : public FirmwareHostTest,
+                            public testing::WithParamInterface<StagingCase> {};
+
+// Whatever stood at the staging path is replaced, never written through, and the tool reads the
+// host's image unchanged from its start to its end.
+TEST_P(FirmwareStagingTest, TheToolReadsExactlyTheHostsImage) {
+    sysroot.WriteFile("/outside", "keep me");
+    GetParam().prepare(sysroot);
+    const std::string imageFile = GetParam().imageFile ? GetParam().imageFile(sysroot) : "";
+    HostImage bytes(kImage, sizeof kImage - 1);
+    HostImage file(std::wstring(imageFile.begin(), imageFile.end()));
+    ASSERT_EQ(S_OK, Start(Prepare(sizeof kImage - 1), imageFile.empty() ? bytes : file));
+    ReleaseTool(0);
+    WaitForTool();
+    EXPECT_EQ(UX_FIRMWARE_STATE_INSTALLED, Poll().state);
+    EXPECT_EQ(kImage, sysroot.ReadFile("/tool/image"));
+    EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
+    EXPECT_EQ("keep me", sysroot.ReadFile("/outside"));
+    struct stat staged {};
+    ASSERT_EQ(0, lstat(sysroot.PathOf(kStagingPath).c_str(), &staged));
+    EXPECT_TRUE(S_ISREG(staged.st_mode));
+    if (imageFile.empty()) {
+        EXPECT_EQ(0600u, staged.st_mode & 07777);
+        EXPECT_EQ(geteuid(), staged.st_uid);
+    }
+    EXPECT_EQ(std::vector<std::string>{}, LeftoverTemporaries(sysroot.PathOf(kStagingDirectory)));
+}
+
+std::string ImageInTheSysroot(const kest::test::TempSysroot& sysroot) {
+    sysroot.WriteFile("/images/firmware.bin", kImage);
+    return sysroot.PathOf("/images/firmware.bin");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Staging, FirmwareStagingTest,
+    testing::Values(
+        StagingCase{"PlantedSymbolicLink",
+                    [](const kest::test::TempSysroot& sysroot) {
+                        ASSERT_EQ(0, symlink(sysroot.PathOf("/outside").c_str(),
+                                             sysroot.PathOf(kStagingPath).c_str()));
+                    },
+                    nullptr},
+        StagingCase{"PlantedSecondNameOfAnotherFile",
+                    [](const kest::test::TempSysroot& sysroot) {
+                        ASSERT_EQ(0, link(sysroot.PathOf("/outside").c_str(),
+                                          sysroot.PathOf(kStagingPath).c_str()));
+                    },
+                    nullptr},
+        StagingCase{"PlantedPipe",
+                    [](const kest::test::TempSysroot& sysroot) {
+                        ASSERT_EQ(0, mkfifo(sysroot.PathOf(kStagingPath).c_str(), 0666));
+                    },
+                    nullptr},
+        StagingCase{"LeftoverStagingFileBeforeALinkedImage",
+                    [](const kest::test::TempSysroot& sysroot) {
+                        sysroot.WriteFile(kStagingPath, "an earlier image");
+                    },
+                    &ImageInTheSysroot},
+        StagingCase{"ImageNamedByARelativeSymbolicLink",
+                    [](const kest::test::TempSysroot& sysroot) {
+                        ImageInTheSysroot(sysroot);
+                        ASSERT_EQ(
+                            0, symlink("firmware.bin", sysroot.PathOf("/images/link.bin").c_str()));
+                    },
+                    [](const kest::test::TempSysroot& sysroot) {
+                        return sysroot.PathOf("/images/link.bin");
+                    }},
+        // /dev/shm is a file system of its own on Linux; the image is copied from there.
+        StagingCase{
+            "ImageOnAnotherFileSystem",
+            [](const kest::test::TempSysroot& sysroot) {
+                const std::string shared = "/dev/shm/kest-image-" + std::to_string(getpid());
+                FILE* file = fopen(shared.c_str(), "w");
+                ASSERT_NE(nullptr, file);
+                fputs(kImage, file);
+                fclose(file);
+                ASSERT_EQ(0, symlink(shared.c_str(), sysroot.PathOf("/images-elsewhere").c_str()));
+            },
+            [](const kest::test::TempSysroot& sysroot) {
+                return sysroot.PathOf("/images-elsewhere");
+            }}),
+    [](const testing::TestParamInfo<StagingCase>& entry) { return entry.param.name; });
+
+TEST_F(FirmwareUpdateTest, AStagingFilePlantedByAnotherUserAndRewrittenLaterIsNotInstalled) {
+    // The sysroot is reachable for an unprivileged user and the staging directory is shared.
+    ASSERT_EQ(0, chmod(sysroot.Root().c_str(), 0755));
+    ASSERT_EQ(0, chmod(sysroot.PathOf(kStagingDirectory).c_str(), 01777));
+    const std::string staging = sysroot.PathOf(kStagingPath);
+    int planted[2];
+    int rewrite[2];
+    ASSERT_EQ(0, pipe(planted));
+    ASSERT_EQ(0, pipe(rewrite));
+    const pid_t user = fork();
+    ASSERT_LE(0, user);
+    if (user == 0) {
+        // Only system calls between fork and _exit: the test process has other threads.
+        char go = 0;
+        if (setgid(65534) != 0 || setuid(65534) != 0) {
+            _exit(2);
+        }
+        const int file = open(staging.c_str(), O_WRONLY | O_CREAT | O_EXCL, 0666);
+        const bool written = file >= 0 && write(file, "planted", 7) == 7;
+        if (write(planted[1], written ? "y" : "n", 1) != 1 || read(rewrite[0], &go, 1) != 1) {
+            _exit(3);
+        }
+        static const char kEvil[] = "the user's own image";
+        _exit(pwrite(file, kEvil, sizeof kEvil - 1, 0) == sizeof kEvil - 1 ? 0 : 4);
+    }
+    char answer = 0;
+    ASSERT_EQ(1, read(planted[0], &answer, 1));
+    ASSERT_EQ('y', answer);
+    HostImage image(kImage, sizeof kImage - 1);
+    ASSERT_EQ(S_OK, Start(Prepare(sizeof kImage - 1), image));
+    WaitForToolStart();
+    ASSERT_EQ(1, write(rewrite[1], "g", 1));
+    int status = 0;
+    ASSERT_EQ(user, waitpid(user, &status, 0));
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+    ReleaseTool(0);
+    WaitForTool();
+    EXPECT_EQ(UX_FIRMWARE_STATE_INSTALLED, Poll().state);
+    EXPECT_EQ(kImage, sysroot.ReadFile("/tool/image"));
+    EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
+    EXPECT_EQ(kImage, sysroot.ReadFile(kStagingPath));
+    for (int descriptor : {planted[0], planted[1], rewrite[0], rewrite[1]}) {
+        close(descriptor);
+    }
+}
+
+// A second expert of the same process stands for any other host: the controller runs one update.
+TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
+    IuxSysExpert3* other = plugin.CreateExpert();
+    ASSERT_NE(nullptr, other);
+    ASSERT_EQ(S_OK, other->Initialize());
+    void* pointer = nullptr;
+    ASSERT_EQ(S_OK, other->QueryInterface(IID_IuxSysExpertFirmware, &pointer));
+    auto* otherFirmware = static_cast<IuxSysExpertFirmware*>(pointer);
+    const auto otherPrepare = [&]() {
+        CvqBStr id = nullptr;
+        const HRESULT status =
+            otherFirmware->PrepareFirmwareUpdate(kSystemItemName, 0, sizeof kImage - 1, &id);
+        return std::make_pair(status, TakeHostString(id));
+    };
+
+    const std::wstring id = Prepare(sizeof kImage - 1);
+    EXPECT_EQ(std::to_string(getpid()) + "\n", sysroot.ReadFile(kUpdateLockPath));
+    EXPECT_EQ(E_FAIL, otherPrepare().first);
+    // Uninitialize lets go of an update that was prepared but not started; starting it later
+    // needs the lock back.
+    ASSERT_EQ(S_OK, expert->Uninitialize());
+    const auto [otherStatus, otherId] = otherPrepare();
+    ASSERT_EQ(S_OK, otherStatus);
+    HostImage image(kImage, sizeof kImage - 1);
+    EXPECT_EQ(E_FAIL, Start(id, image));
+    EXPECT_EQ(UX_FIRMWARE_STATE_FAILED, Poll().state);
+
+    ASSERT_EQ(S_OK, otherFirmware->StartFirmwareUpdate(kSystemItemName, otherId.c_str(), 0, nullptr,
+                                                       &image));
+    WaitForToolStart();
+    EXPECT_EQ(E_FAIL, PrepareStatus());
+    ReleaseTool(0);
+    ASSERT_EQ(S_OK, other->Uninitialize());
+    EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
+    // The tool has ended: the controller is free again, although the other expert stays busy.
+    EXPECT_EQ(S_OK, PrepareStatus());
+    otherFirmware->Release();
+    other->Release();
 }
 
 TEST_F(FirmwareUpdateTest, StatusFileStagesReportTheirPercentages) {
@@ -262,6 +460,7 @@ struct ToolEnding {
     const char* name;
     const char* script;
     int32_t state;
+    bool hostIgnoresChildren = false;  // the host sets SIGCHLD to SIG_IGN
 };
 
 class FirmwareToolEndingTest : public FirmwareHostTest,
@@ -270,8 +469,17 @@ class FirmwareToolEndingTest : public FirmwareHostTest,
 TEST_P(FirmwareToolEndingTest, DecidesTheOutcome) {
     InstallTool(GetParam().script);
     HostImage image(kImage, sizeof kImage - 1);
+    struct sigaction previous {};
+    if (GetParam().hostIgnoresChildren) {
+        struct sigaction ignore {};
+        ignore.sa_handler = SIG_IGN;
+        ASSERT_EQ(0, sigaction(SIGCHLD, &ignore, &previous));
+    }
     ASSERT_EQ(S_OK, Start(Prepare(sizeof kImage - 1), image));
     WaitForTool();
+    if (GetParam().hostIgnoresChildren) {
+        sigaction(SIGCHLD, &previous, nullptr);
+    }
     const FirmwareStatus status = Poll();
     EXPECT_EQ(GetParam().state, status.state);
     const bool installed = GetParam().state == UX_FIRMWARE_STATE_INSTALLED;
@@ -285,7 +493,11 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(ToolEnding{"ExitStatus0", "exit 0\n", UX_FIRMWARE_STATE_INSTALLED},
                     ToolEnding{"ExitStatus1", "exit 1\n", UX_FIRMWARE_STATE_FAILED},
                     ToolEnding{"Killed", "kill -KILL $$\n", UX_FIRMWARE_STATE_FAILED},
-                    ToolEnding{"Terminated", "kill -TERM $$\n", UX_FIRMWARE_STATE_FAILED}),
+                    ToolEnding{"Terminated", "kill -TERM $$\n", UX_FIRMWARE_STATE_FAILED},
+                    ToolEnding{"ExitStatus0HostIgnoringChildren", "exit 0\n",
+                               UX_FIRMWARE_STATE_INSTALLED, true},
+                    ToolEnding{"ExitStatus1HostIgnoringChildren", "exit 1\n",
+                               UX_FIRMWARE_STATE_FAILED, true}),
     [](const testing::TestParamInfo<ToolEnding>& entry) { return entry.param.name; });
 
 TEST_F(FirmwareUpdateTest, UninitializeWaitsForTheRunningTool) {

@@ -31,19 +31,36 @@ inline std::string ReadWhole(const std::string& path) {
     return text.str();
 }
 
-// Runs `program` with `arguments` (argv[0] is the program) and `environment` (the test's own by
-// default), collecting standard output and error in temporary files.
-inline RunResult RunProgram(const std::string& program, const std::vector<std::string>& arguments,
-                            char* const* environment = environ) {
+// A program started in the background, its output collected in temporary files.
+struct RunningProgram {
+    pid_t pid = -1;
+    std::string directory;  // holds "out" and "err"
+};
+
+// Starts `program` with `arguments` (argv[0] is the program) and `environment` (the test's own by
+// default), collecting standard output and error in temporary files; with `ownProcessGroup` the
+// program leads a process group of its own, as a shell's foreground job does.
+inline RunningProgram StartProgram(const std::string& program,
+                                   const std::vector<std::string>& arguments,
+                                   char* const* environment = environ,
+                                   bool ownProcessGroup = false) {
     char directory[] = "/tmp/kestcfg-test-XXXXXX";
     EXPECT_NE(nullptr, mkdtemp(directory));
-    const std::string outPath = std::string(directory) + "/out";
-    const std::string errPath = std::string(directory) + "/err";
+    RunningProgram running;
+    running.directory = directory;
+    const std::string outPath = running.directory + "/out";
+    const std::string errPath = running.directory + "/err";
 
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_addopen(&actions, 1, outPath.c_str(), O_WRONLY | O_CREAT, 0600);
     posix_spawn_file_actions_addopen(&actions, 2, errPath.c_str(), O_WRONLY | O_CREAT, 0600);
+    posix_spawnattr_t attributes;
+    posix_spawnattr_init(&attributes);
+    if (ownProcessGroup) {
+        posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETPGROUP);
+        posix_spawnattr_setpgroup(&attributes, 0);
+    }
     std::vector<std::string> words = {program};
     words.insert(words.end(), arguments.begin(), arguments.end());
     std::vector<char*> argv;
@@ -51,37 +68,78 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
         argv.push_back(word.data());
     }
     argv.push_back(nullptr);
-
-    RunResult result;
-    pid_t child = 0;
     const int spawned =
-        posix_spawn(&child, program.c_str(), &actions, nullptr, argv.data(), environment);
+        posix_spawn(&running.pid, program.c_str(), &actions, &attributes, argv.data(), environment);
     posix_spawn_file_actions_destroy(&actions);
+    posix_spawnattr_destroy(&attributes);
     EXPECT_EQ(0, spawned);
+    if (spawned != 0) {
+        running.pid = -1;
+    }
+    return running;
+}
+
+// What the program has written to standard error so far.
+inline std::string ErrorOutputSoFar(const RunningProgram& running) {
+    return ReadWhole(running.directory + "/err");
+}
+
+// Waits for a started program; its exit code is -1 when a signal ended it.
+inline RunResult FinishProgram(RunningProgram& running) {
+    RunResult result;
     int status = 0;
-    if (spawned == 0 && waitpid(child, &status, 0) == child && WIFEXITED(status)) {
+    if (running.pid > 0 && waitpid(running.pid, &status, 0) == running.pid && WIFEXITED(status)) {
         result.exitCode = WEXITSTATUS(status);
     }
+    running.pid = -1;
+    const std::string outPath = running.directory + "/out";
+    const std::string errPath = running.directory + "/err";
     result.out = ReadWhole(outPath);
     result.err = ReadWhole(errPath);
     unlink(outPath.c_str());
     unlink(errPath.c_str());
-    rmdir(directory);
+    rmdir(running.directory.c_str());
     return result;
 }
 
-// Runs the built kestcfg; when the tests run under an emulator (a cross build), through the
-// same emulator command.
-inline RunResult RunKestcfg(const std::vector<std::string>& arguments) {
+// Runs `program` with `arguments` and `environment` and waits for it.
+inline RunResult RunProgram(const std::string& program, const std::vector<std::string>& arguments,
+                            char* const* environment = environ) {
+    RunningProgram running = StartProgram(program, arguments, environment);
+    return FinishProgram(running);
+}
+
+// Starts the built kestcfg in the background; when the tests run under an emulator (a cross
+// build), through the same emulator command.
+inline RunningProgram StartKestcfg(const std::vector<std::string>& arguments,
+                                   bool ownProcessGroup = false) {
     std::vector<std::string> command = {KEST_TEST_EMULATOR};
     if (command.empty()) {
-        return RunProgram(KESTCFG_PATH, arguments);
+        return StartProgram(KESTCFG_PATH, arguments, environ, ownProcessGroup);
     }
     const std::string launcher = command.front();
     command.erase(command.begin());
     command.push_back(KESTCFG_PATH);
     command.insert(command.end(), arguments.begin(), arguments.end());
-    return RunProgram(launcher, command);
+    return StartProgram(launcher, command, environ, ownProcessGroup);
+}
+
+// Runs the built kestcfg and waits for it.
+inline RunResult RunKestcfg(const std::vector<std::string>& arguments) {
+    RunningProgram running = StartKestcfg(arguments);
+    return FinishProgram(running);
+}
+
+// Polls `condition` every 10 ms, at most `limitMs`; true once it holds.
+template <class Condition>
+bool PollUntil(Condition condition, int limitMs = 60000) {
+    for (int waited = 0; waited < limitMs; waited += 10) {
+        if (condition()) {
+            return true;
+        }
+        usleep(10000);
+    }
+    return condition();
 }
 
 // Parses `jsonLines` (one JSON document per line) with python3 and returns every scalar as a

@@ -98,7 +98,7 @@ TEST(KestcfgTest, HelpListsTheCommands) {
     const RunResult result = RunKestcfg({"--help"});
     EXPECT_EQ(0, result.exitCode);
     EXPECT_EQ(0u, result.out.rfind("usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] "
-                                   "COMMAND",
+                                   "[--no-wait] COMMAND",
                                    0));
     for (const char* command : {"info", "items", "get [ITEM]", "refresh ITEM TAG...",
                                 "set ITEM NAME=VALUE...", "sim init DIR"}) {

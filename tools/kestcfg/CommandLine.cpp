@@ -49,6 +49,8 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
             }
         } else if (argument == "--json") {
             line.json = true;
+        } else if (argument == "--no-wait") {
+            line.noWait = true;
         } else if (argument == "--help" || argument == "-h") {
             line.help = true;
         } else {
@@ -69,7 +71,8 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
 
 std::string UsageText() {
     std::string text =
-        "usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] COMMAND [ARGUMENTS...]\n"
+        "usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] [--no-wait] COMMAND "
+        "[ARGUMENTS...]\n"
         "\n"
         "options:\n"
         "  --sysroot DIR  resolve the controller's fixed paths under DIR (sets KEST_SYSROOT;\n"
@@ -77,6 +80,8 @@ std::string UsageText() {
         "  --plugin PATH  the plug-in to load (default: libvqkestSysApiChassisExpert.so next\n"
         "                 to kestcfg)\n"
         "  --json         print results as JSON, one object per line (per item)\n"
+        "  --no-wait      fail at once (exit status 4) while another kestcfg changes the\n"
+        "                 controller, instead of waiting for it\n"
         "\n"
         "commands:\n";
     size_t width = 0;
@@ -100,6 +105,8 @@ std::string UsageText() {
         "  kestcfg set eth0 polling-interval=250\n"
         "  kestcfg refresh 'VQ KEST Chassis' current-time\n"
         "\n"
-        "exit status: 0 success, 1 value rejected, 2 usage error, 3 other failure\n";
+        "exit status: 0 success, 1 value rejected, 2 usage error or unusable input, 3 other\n"
+        "failure, 4 busy (another kestcfg with --no-wait, or a firmware update under way),\n"
+        "5 partly done, 128+N interrupted by signal N\n";
     return text;
 }

@@ -1,4 +1,5 @@
-// kestcfg's command line: [--sysroot DIR] [--plugin PATH] [--json] COMMAND [ARGUMENTS...]
+// kestcfg's command line: [--sysroot DIR] [--plugin PATH] [--json] [--no-wait] COMMAND
+// [ARGUMENTS...]
 #pragma once
 
 #include <string>
@@ -8,6 +9,7 @@ struct CommandLine {
     std::string sysroot;  // empty: KEST_SYSROOT is left as it is
     std::string plugin;   // empty: the plug-in next to the program
     bool json = false;
+    bool noWait = false;  // fail instead of waiting while another kestcfg changes the controller
     bool help = false;
     std::string command;
     std::vector<std::string> arguments;

@@ -11,10 +11,10 @@ const std::vector<CommandDescription>& AllCommands() {
         {"refresh", "refresh ITEM TAG...", "read the named properties of ITEM afresh", 2, SIZE_MAX,
          ExpertUse::kItems, &RunRefresh},
         {"set", "set ITEM NAME=VALUE...", "validate and persist changed properties of ITEM", 2,
-         SIZE_MAX, ExpertUse::kItems, &RunSet},
+         SIZE_MAX, ExpertUse::kItems, &RunSet, true},
         {"firmware", "firmware ITEM IMAGE",
          "install the firmware image file IMAGE on ITEM, showing the update's progress", 2, 2,
-         ExpertUse::kItems, &RunFirmware},
+         ExpertUse::kItems, &RunFirmware, true},
         {"sim", "sim init DIR", "create a demo controller under DIR (use DIR as the sysroot)", 2, 2,
          ExpertUse::kNone, &RunSim},
     };

@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include "ControllerTurn.h"
 #include "uxsys/Expert.h"
 
 // What a command needs of the plug-in.
@@ -22,6 +23,8 @@ struct CommandContext {
     bool json;
     std::ostream& out;
     std::ostream& err;  // warnings and notes
+    // This kestcfg's turn at changing the controller; null for commands that do not take one.
+    ControllerTurn* turn = nullptr;
 };
 
 struct CommandDescription {
@@ -33,6 +36,8 @@ struct CommandDescription {
     ExpertUse expertUse;
     // Runs the command; throws CommandFailure to end with a message and an exit code.
     void (*run)(CommandContext& context);
+    // Whether the command changes the controller and therefore waits for its turn.
+    bool takesTurn = false;
 };
 
 // Every command, in the order the usage text lists them.

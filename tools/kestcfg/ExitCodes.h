@@ -1,4 +1,4 @@
-// kestcfg's exit codes and the failures that carry them to main.
+// kestcfg's exit codes, the same for every command, and the failures that carry them to main.
 #pragma once
 
 #include <stdexcept>
@@ -6,10 +6,17 @@
 
 enum ExitCode : int {
     kExitSuccess = 0,
-    kExitRejectedValue = 1,
-    kExitUsageError = 2,
-    kExitFailure = 3,
+    kExitRejectedValue = 1,  // a value rejected by validation
+    kExitUsageError = 2,     // usage error or unusable input
+    kExitFailure = 3,        // the plug-in or the system failed
+    kExitBusy = 4,           // another kestcfg (with --no-wait) or a firmware update is under way
+    kExitPartlyDone = 5,     // some changes were stored, some were not
 };
+
+// The exit code after the command was interrupted by signal `signalNumber`: 128 + the number.
+constexpr int ExitCodeAfterSignal(int signalNumber) {
+    return 128 + signalNumber;
+}
 
 // A failure that ends the program with `code` after printing the message.
 class CommandFailure : public std::runtime_error {

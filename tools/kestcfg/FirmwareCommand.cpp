@@ -1,9 +1,13 @@
 // kestcfg firmware ITEM IMAGE: installs a firmware image as a host does. It announces the image,
 // hands it over, follows the update with a progress bar until the plug-in reports it installed
 // or failed, and then waits for the update tool to end before it reports the final state.
+#include <fcntl.h>
+#include <stdlib.h>
+#include <sys/file.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <string>
 
 #include "Commands.h"
@@ -11,6 +15,7 @@
 #include "HostFirmwareImage.h"
 #include "HostText.h"
 #include "InterfaceRef.h"
+#include "Interruption.h"
 #include "ItemAccess.h"
 #include "StatusNames.h"
 #include "uxsys/HostString.h"
@@ -19,6 +24,7 @@
 namespace {
 
 constexpr useconds_t kPollInterval = 200000;
+constexpr char kUpdateLockFile[] = "/var/run/firmware_update/update.lock";
 constexpr int kBarWidth = 20;
 
 struct UpdateStatus {
@@ -98,6 +104,27 @@ UpdateStatus FollowUpdate(IuxSysExpertFirmware* firmware, const std::wstring& it
     return status;
 }
 
+// The process id recorded in the controller's firmware update lock when some process holds the
+// lock; empty when it is free or cannot be examined.
+std::string UpdateLockHolder() {
+    const char* root = getenv("KEST_SYSROOT");
+    const std::string path =
+        std::string(root != nullptr && root[0] == '/' ? root : "") + kUpdateLockFile;
+    const int file = open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+    if (file < 0) {
+        return std::string();
+    }
+    std::string holder;
+    if (flock(file, LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK) {
+        char text[32] = {};
+        const ssize_t count = pread(file, text, sizeof text - 1, 0);
+        holder = count > 0 ? std::string(text, static_cast<size_t>(count)) : "?";
+        holder.erase(holder.find_last_not_of(" \n") + 1);
+    }
+    close(file);
+    return holder;
+}
+
 }  // namespace
 
 void RunFirmware(CommandContext& context) {
@@ -115,13 +142,26 @@ void RunFirmware(CommandContext& context) {
     const HRESULT prepared =
         firmware->PrepareFirmwareUpdate(item.c_str(), 0, image.GetImageSize(), updateId.Receive());
     if (prepared < 0) {
+        const std::string holder = UpdateLockHolder();
+        if (!holder.empty()) {
+            throw CommandFailure(kExitBusy,
+                                 "another firmware update of the controller is under way "
+                                 "(process " +
+                                     holder + ")");
+        }
         throw Failure("the plug-in refused to prepare the update (" + StatusWithName(prepared) +
                       "): not enough free space for twice the image, or an update is under way");
     }
+    // From here the update belongs to the tool; kestcfg only follows it.
+    GuardFirmwareUpdate();
     const HRESULT started =
         firmware->StartFirmwareUpdate(item.c_str(), updateId.Get(), 0, nullptr, &image);
     if (started < 0) {
         throw Failure("the plug-in could not start the update (" + StatusWithName(started) + ")");
+    }
+    // The plug-in's update lock now keeps other updates out; other kestcfg commands may go on.
+    if (context.turn != nullptr) {
+        context.turn->End();
     }
 
     FollowUpdate(firmware.Get(), item, context.json, context.err);

@@ -7,6 +7,7 @@
 #include "ExitCodes.h"
 #include "HostPropertyBag.h"
 #include "HostText.h"
+#include "Interruption.h"
 #include "ItemAccess.h"
 #include "PropertyCatalogue.h"
 #include "StatusNames.h"
@@ -113,6 +114,35 @@ ExitCode ExitCodeFor(HRESULT status) {
     throw CommandFailure(ExitCodeFor(status), text);
 }
 
+// After a failed persist: ends with kExitPartlyDone, naming what was stored and what not, when the
+// item now shows some of the new values but not all. A value that equalled the old one tells
+// nothing and is left out. Returns when nothing or everything changed.
+void RefuseIfPartlyDone(CommandContext& context, const std::wstring& item,
+                        const std::vector<Assignment>& assignments,
+                        const std::vector<PropertyValue>& oldValues,
+                        const std::vector<PropertyValue>& values) {
+    InterfaceRef<IuxSysPropertyBag2> current;
+    if (CurrentProperties(context.expert, item, &current) < 0) {
+        return;
+    }
+    std::string stored;
+    std::string notStored;
+    for (size_t i = 0; i < assignments.size(); ++i) {
+        if (ValueAsJson(oldValues[i]) == ValueAsJson(values[i])) {
+            continue;
+        }
+        PropertyValue now;
+        const bool isNew = ReadBagValue(current.Get(), assignments[i].tag, &now) >= 0 &&
+                           ValueAsJson(now) == ValueAsJson(values[i]);
+        std::string& list = isNew ? stored : notStored;
+        list += (list.empty() ? "" : ", ") + assignments[i].word;
+    }
+    if (!stored.empty() && !notStored.empty()) {
+        throw CommandFailure(kExitPartlyDone, ItemText(item) + ": only some changes were stored: " +
+                                                  stored + "; not stored: " + notStored);
+    }
+}
+
 }  // namespace
 
 void RunSet(CommandContext& context) {
@@ -123,7 +153,11 @@ void RunSet(CommandContext& context) {
     const InterfaceRef<IuxSysPropertyBag4> changes = HostPropertyBag::Create();
     CopyCurrentProperties(context, item, changes.Get());
     std::vector<PropertyValue> values;
+    std::vector<PropertyValue> oldValues;
     for (const Assignment& assignment : assignments) {
+        PropertyValue oldValue;
+        ReadBagValue(changes.Get(), assignment.tag, &oldValue);
+        oldValues.push_back(oldValue);
         const uint32_t type = ValueType(changes.Get(), assignment);
         std::optional<PropertyValue> value = ParseValue(assignment.text, type);
         if (!value) {
@@ -170,10 +204,14 @@ void RunSet(CommandContext& context) {
                                                      "; nothing was changed");
     }
 
+    // From here the controller changes: an interruption waits until the plug-in has finished,
+    // so that an interface it takes down comes up again.
+    DeferInterruptions();
     int32_t restartRequired = 0;
     const HRESULT persisted =
         context.expert->PersistPropertyChanges(item.c_str(), changes.Get(), &restartRequired);
     if (persisted < 0) {
+        RefuseIfPartlyDone(context, item, assignments, oldValues, values);
         Refuse(context, itemText, "persisting", persisted, std::string());
     }
 

@@ -7,12 +7,14 @@
 #include <exception>
 #include <iostream>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "CommandLine.h"
 #include "Commands.h"
 #include "ExitCodes.h"
 #include "ExpertSession.h"
+#include "Interruption.h"
 #include "PluginLoader.h"
 
 namespace {
@@ -62,10 +64,19 @@ int Run(int argc, const char* const* argv) {
                fromEnvironment != nullptr && *fromEnvironment != '\0') {
         UseSysroot(fromEnvironment, "KEST_SYSROOT");
     }
+    std::optional<ControllerTurn> turn;
+    if (command->takesTurn) {
+        turn.emplace(line.noWait, std::cerr);
+        context.turn = &*turn;
+    }
     const Plugin plugin(line.plugin.empty() ? DefaultPluginPath()
                                             : PluginPathArgument(line.plugin));
     const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
     context.expert = expert.Get();
+    // Ends the handling of interruptions a command began once Uninitialize has returned.
+    struct InterruptionHandlingEnd {
+        ~InterruptionHandlingEnd() { EndInterruptionHandling(); }
+    } interruptionHandlingEnd;
     std::unique_ptr<ExpertSession> session;
     if (command->expertUse == ExpertUse::kItems) {
         session = std::make_unique<ExpertSession>(expert.Get());
@@ -74,11 +85,17 @@ int Run(int argc, const char* const* argv) {
     return kExitSuccess;
 }
 
+// The exit code of a run that ended with `code`, unless a signal interrupted it.
+int ExitCodeUnlessInterrupted(int code) {
+    const int signalNumber = RecordedInterruption();
+    return signalNumber != 0 ? ExitCodeAfterSignal(signalNumber) : code;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
     try {
-        return Run(argc, argv);
+        return ExitCodeUnlessInterrupted(Run(argc, argv));
     } catch (const CommandFailure& failure) {
         std::cout.flush();
         if (*failure.what() != '\0') {
@@ -87,10 +104,10 @@ int main(int argc, char** argv) {
         if (failure.Code() == kExitUsageError) {
             std::cerr << "Try 'kestcfg --help' for more information.\n";
         }
-        return failure.Code();
+        return ExitCodeUnlessInterrupted(failure.Code());
     } catch (const std::exception& failure) {
         std::cout.flush();
         std::cerr << "kestcfg: " << failure.what() << "\n";
-        return kExitFailure;
+        return ExitCodeUnlessInterrupted(kExitFailure);
     }
 }
