@@ -1,7 +1,9 @@
 #include "expert/FirmwareToolRun.h"
 
+#include "support/Exceptions.h"
 #include "support/ExternalApplication.h"
 #include "support/TextConversion.h"
+#include "support/TrustedTool.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
@@ -16,10 +18,16 @@ bool RunFirmwareTool(const std::string& tool, const std::string& stagingPath,
     // The tool gets an empty environment: nothing of the host's settings reaches it.
     vq::dsc::osdep::ExternalApplication application;
     application.SetEnvironment({});
+    std::string trustedTool;
+    try {
+        trustedTool = kest::TrustedToolPath(tool);
+    } catch (const vq::dsc::exception::Exception&) {
+        return false;
+    }
     if (inheritedDescriptor >= 0) {
         application.SetInheritedDescriptors({inheritedDescriptor});
     }
-    if (!application.Start(vq::dsc::WideFromNarrow(tool),
+    if (!application.Start(vq::dsc::WideFromNarrow(trustedTool),
                            {vq::dsc::WideFromNarrow(stagingPath), kUpdateMode}, true)) {
         return false;
     }

@@ -2,6 +2,11 @@
 // accepts (host name, comment, locale, time zone in both notations, clock, web service),
 // including the rejections a host shows for bad values.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdio>
 
 #include <fstream>
 #include <map>
@@ -23,6 +28,7 @@ constexpr uint32_t kLegacyTimeZoneTag = 0x0D120000;
 constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
 constexpr uint32_t kWebServiceTag = 0x21004000;
 constexpr int64_t kUnixEpochIn1904Seconds = 2082844800;
+constexpr char kSettingsPath[] = "/etc/korvane/share/vqkest.ini";
 
 // The time-zone table the plug-in ships, from the source tree.
 std::string ShippedTimeZoneTable() {
@@ -227,6 +233,41 @@ TEST_F(SystemItemTest, SwitchesTheWebService) {
         Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 0); }));
     EXPECT_EQ(S_OK, outcome.persistence);
     EXPECT_FALSE(Bool(kWebServiceTag));
+}
+
+// Another process switches the web service on and adds its own section: the host that read the
+// switch before shows the change, and its own save keeps that section.
+TEST_F(SystemItemTest, SeesAndKeepsWhatAnotherProcessSaved) {
+    EXPECT_FALSE(Bool(kWebServiceTag));
+    const pid_t other = fork();
+    if (other == 0) {
+        sysroot.WriteFile("/etc/korvane/share/other.new",
+                          "[Other]\nKey = x\n[WebService]\nEnable = 1\n");
+        _exit(std::rename(sysroot.PathOf("/etc/korvane/share/other.new").c_str(),
+                          sysroot.PathOf(kSettingsPath).c_str()));
+    }
+    int status = -1;
+    ASSERT_EQ(other, waitpid(other, &status, 0));
+    ASSERT_EQ(0, status);
+    EXPECT_TRUE(Bool(kWebServiceTag));
+    Outcome outcome =
+        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 0); }));
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ("[Other]\nKey = x\n\n[WebService]\nEnable = 0\n\n", sysroot.ReadFile(kSettingsPath));
+}
+
+// A settings file that cannot be read (a FIFO here) hangs neither a get nor a set, and is left
+// in place: the set fails.
+TEST_F(SystemItemTest, ASettingsFileThatCannotBeReadIsLeftAlone) {
+    const std::string path = sysroot.PathOf(kSettingsPath);
+    ASSERT_EQ(0, mkfifo(path.c_str(), 0600));
+    EXPECT_FALSE(Bool(kWebServiceTag));
+    Outcome outcome =
+        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 1); }));
+    EXPECT_EQ(E_FAIL, outcome.persistence);
+    struct stat fifo;
+    ASSERT_EQ(0, lstat(path.c_str(), &fifo));
+    EXPECT_TRUE(S_ISFIFO(fifo.st_mode));
 }
 
 TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
