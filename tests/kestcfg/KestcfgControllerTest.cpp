@@ -214,6 +214,19 @@ TEST_F(KestcfgControllerTest, APersistFailingPartWayReportsWhatWasStoredWithStat
     }
 }
 
+TEST_F(KestcfgControllerTest, AChangeTheControllerDoesNotStoreIsReportedWithStatus5) {
+    // The controller keeps its TCP/IP mode when asked to switch to another TCP/IP mode.
+    sysroot_.WriteFile(kStatePath, std::regex_replace(State(), std::regex("SupportedModes = 0x0B"),
+                                                      "SupportedModes = 0x6B"));
+    const RunResult result = RunKestcfg({"set", "eth0", "adapter-mode=0x20"});
+    EXPECT_EQ(5, result.exitCode);
+    EXPECT_EQ("", result.out);
+    EXPECT_NE(std::string::npos,
+              result.err.find("kestcfg: eth0: adapter-mode was not stored (it is still 0x02 "
+                              "tcpip; asked for 0x20)\n"))
+        << result.err;
+}
+
 TEST_F(KestcfgControllerTest, SetChangesTheTimeZoneInEitherNotation) {
     for (const char* zone : {"America/Chicago", "America/Los_Angeles"}) {
         sysroot_.WriteFile(std::string("/usr/share/zoneinfo/") + zone, "TZif");
