@@ -1,6 +1,7 @@
 // Address texts: IPAddress parsing of narrow and wide text, the display text of every parsed
 // address parsing back to the same address, and the IPv4 text checks of the network items
-// (which must be monotonic in their permissions and agree with plain dotted decimal).
+// (which must be monotonic in their permissions, agree with plain dotted decimal, and accept only
+// texts that are stored as the address they were checked as).
 //
 // Input: byte 0 selects the permissions of the IPv4 check (bits 0-2) and whether the rest is
 // read as 32-bit wide characters (bit 3) instead of one character per byte.
@@ -68,6 +69,12 @@ void CheckIPv4Text(const std::wstring& text, uint8_t permissions) {
     FUZZ_CHECK(!valid || IsValidIPv4Text(text, true, true, true));
     FUZZ_CHECK(IsValidIPv4Text(text, false, false, false) <= valid);
     const uint32_t parsed = ParseIPv4(text);
+    if (IsValidIPv4Text(text, true, true, true)) {
+        IPAddress stored;
+        FUZZ_CHECK(stored.TryParse(text) && stored.family == IPFamily::IPv4);
+        FUZZ_CHECK((uint32_t{stored.bytes[0]} << 24 | uint32_t{stored.bytes[1]} << 16 |
+                    uint32_t{stored.bytes[2]} << 8 | stored.bytes[3]) == parsed);
+    }
     uint32_t plain = 0;
     if (PlainDottedDecimal(text, &plain)) {
         FUZZ_CHECK(parsed == plain);

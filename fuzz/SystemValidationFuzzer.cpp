@@ -5,6 +5,7 @@
 #include <fuzzer/FuzzedDataProvider.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cctype>
 #include <cstdint>
 #include <set>
@@ -122,7 +123,11 @@ bool PredictTag(IuxSysPropertyBag4* bag, uint32_t tag, HRESULT* verdict) {
             if (tag == tag::kHostName) {
                 *verdict = ExpectedHostName(vq::dsc::NarrowFromWide(text));
             } else if (tag == tag::kComment) {
-                *verdict = vq::dsc::NarrowFromWide(text).size() > 64 ? UX_E_VALUE_INVALID : S_OK;
+                const std::string narrow = vq::dsc::NarrowFromWide(text);
+                const bool control = std::any_of(narrow.begin(), narrow.end(), [](char c) {
+                    return static_cast<unsigned char>(c) < 0x20 || c == 0x7F;
+                });
+                *verdict = narrow.size() > 64 || control ? UX_E_VALUE_INVALID : S_OK;
             } else {
                 const bool supported = text == L"en" || text == L"de" || text == L"fr";
                 *verdict = supported ? S_OK : UX_E_VALUE_INVALID;

@@ -12,7 +12,8 @@ namespace {
 
 // Cached documents keep empty values and lose the double quotes around values.
 constexpr uint32_t kCacheReadFlags = kIniReadKeepEmptyValues | kIniReadStripDoubleQuotes;
-// Saves replace the file through "name.TMP", write " = " and reach the disk before the rename.
+// Saves replace the file through a new temporary named after it ("name.TMP" and six random
+// characters), write " = " and reach the disk, directory included.
 constexpr uint32_t kCacheWriteFlags =
     kIniWriteSafeReplacement | kIniWriteSpacedSeparator | kIniWriteSync;
 constexpr mode_t kNewFileMode = 0664;

@@ -268,13 +268,13 @@ int TextStart(std::string_view bytes) {
     return startsWith("\xEF\xBB\xBF"sv) ? 3 : 0;
 }
 
-int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, timespec* modified) {
+int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, FileStamp* stamp) {
     if (path == nullptr || *path == '\0') {
         return kIniInvalidArgument;
     }
     int descriptor;
     do {
-        descriptor = open(path, O_RDONLY | O_CLOEXEC);
+        descriptor = open(path, O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
     } while (descriptor < 0 && errno == EINTR);
     if (descriptor < 0) {
         struct stat status;
@@ -285,8 +285,11 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, tim
     if (fstat(descriptor, &status) != 0) {
         return kIniReadError;
     }
+    if (!S_ISREG(status.st_mode)) {
+        return kIniCannotOpenForReading;
+    }
     std::string bytes;
-    bytes.resize(status.st_size > 0 ? static_cast<size_t>(status.st_size) + 1 : 4096);
+    bytes.resize(static_cast<size_t>(status.st_size) + 1);
     size_t filled = 0;
     for (;;) {
         if (filled == bytes.size()) {
@@ -303,10 +306,9 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, tim
             break;
         }
         filled += static_cast<size_t>(count);
-        // A regular file that gave exactly its size with room to spare has ended: asking again
-        // only to hear so would cost a system call on every load.
-        if (S_ISREG(status.st_mode) && filled == static_cast<size_t>(status.st_size) &&
-            filled < bytes.size()) {
+        // A file that gave exactly its size with room to spare has ended: asking again only to
+        // hear so would cost a system call on every load.
+        if (filled == static_cast<size_t>(status.st_size) && filled < bytes.size()) {
             break;
         }
     }
@@ -316,7 +318,7 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, tim
         return start;
     }
     ParseIni(text.substr(static_cast<size_t>(start)), readFlags, document);
-    *modified = status.st_mtim;
+    *stamp = FileStamp::Of(status);
     return 0;
 }
 

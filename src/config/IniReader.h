@@ -2,6 +2,8 @@
 // retention and the joining of values that the writer split into numbered " Line" keys.
 #pragma once
 
+#include <sys/stat.h>
+
 #include <cstdint>
 #include <ctime>
 #include <string_view>
@@ -21,8 +23,27 @@ void ParseIni(std::string_view text, uint32_t readFlags, IniDocument& document);
 // with a UTF-16 or UTF-32 byte-order mark.
 int TextStart(std::string_view bytes);
 
-// Reads and parses the file at `path` into `document` (which must be empty) and gives its
-// modification time. Returns 0 or an engine failure.
-int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, timespec* modified);
+// What tells one version of a file from another: a replacement by rename gives a new inode even
+// within one tick of the file-system clock, a rewrite in place a new modification time or size.
+struct FileStamp {
+    dev_t device = 0;
+    ino_t inode = 0;
+    off_t size = 0;
+    timespec modified{};
+
+    static FileStamp Of(const struct stat& status) {
+        return FileStamp{status.st_dev, status.st_ino, status.st_size, status.st_mtim};
+    }
+    bool operator==(const FileStamp& other) const {
+        return device == other.device && inode == other.inode && size == other.size &&
+               modified.tv_sec == other.modified.tv_sec &&
+               modified.tv_nsec == other.modified.tv_nsec;
+    }
+};
+
+// Reads and parses the file at `path` into `document` (which must be empty) and gives the stamp
+// of the version read. The file is opened without blocking and must be a regular file: a FIFO or
+// a device gives -5001 rather than a hang. Returns 0 or an engine failure.
+int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, FileStamp* stamp);
 
 }  // namespace kest_ini

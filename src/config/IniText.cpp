@@ -21,10 +21,10 @@ struct IniText {
     kest_ini::IniDocument document;
     uint32_t readFlags = kIniDefaultReadFlags;
     kest_ini::WriteOptions writeOptions;
-    bool hasFile = false;  // a file was loaded or saved: `path` and `modified` describe it
+    bool hasFile = false;  // a file was loaded or saved: `path` and `stamp` describe it
     std::string path;
-    timespec modified{};  // in full resolution: a rewrite within the same second is a change
-    std::string decoded;  // scratch buffer of IniText_GetEscapedString
+    kest_ini::FileStamp stamp;  // of the version loaded or saved
+    std::string decoded;        // scratch buffer of IniText_GetEscapedString
 };
 
 namespace {
@@ -51,6 +51,11 @@ bool HasLineBreak(std::string_view text) {
     return text.find_first_of("\r\n") != std::string_view::npos;
 }
 
+// True when reading strips the first and last character as a pair of double quotes.
+bool EnclosedInDoubleQuotes(std::string_view value) {
+    return value.size() >= 2 && value.front() == '"' && value.back() == '"';
+}
+
 // 1 when section, key and value would read back as given, else the engine failure.
 int CheckWritable(const char* section, const char* key, const char* value, char quote) {
     if ((section != nullptr && TrimIniSpace(section).empty()) || key == nullptr ||
@@ -62,7 +67,7 @@ int CheckWritable(const char* section, const char* key, const char* value, char 
         (section == nullptr || (!HasLineBreak(section) && std::strchr(section, ']') == nullptr)) &&
         !HasLineBreak(keyName) && keyName.find('=') == std::string_view::npos &&
         keyName.front() != '[' && keyName.front() != ';' && !HasLineBreak(value) &&
-        (quote == 0 || quote == '"' || quote == '\'');
+        (quote == '"' || (quote == 0 && !EnclosedInDoubleQuotes(TrimIniSpace(value))));
     return readable ? kIniFound : kIniInvalidArgument;
 }
 
@@ -122,14 +127,14 @@ void IniText_SetNameOptions(IniText* ini, bool uniqueNames, bool caseSensitive) 
 int IniText_Load(IniText* ini, const char* path) {
     return Guarded([&] {
         kest_ini::IniDocument fresh(ini->document.UniqueNames(), ini->document.CaseSensitive());
-        timespec modified{};
-        int result = kest_ini::ReadIniFile(path, ini->readFlags, fresh, &modified);
+        kest_ini::FileStamp stamp;
+        int result = kest_ini::ReadIniFile(path, ini->readFlags, fresh, &stamp);
         if (result < 0) {
             return result;
         }
         ini->path = path;
         ini->document = std::move(fresh);
-        ini->modified = modified;
+        ini->stamp = stamp;
         ini->hasFile = true;
         return 0;
     });
@@ -142,15 +147,15 @@ int IniText_Save(IniText* ini, const char* path) {
     return Guarded([&] {
         std::string text;
         int result = kest_ini::FormatIni(ini->document, ini->writeOptions, text);
-        timespec modified{};
+        kest_ini::FileStamp stamp;
         if (result == 0) {
-            result = kest_ini::WriteIniFile(path, text, ini->writeOptions.flags, &modified);
+            result = kest_ini::WriteIniFile(path, text, ini->writeOptions.flags, &stamp);
         }
         if (result < 0) {
             return result;
         }
         ini->path = path;
-        ini->modified = modified;
+        ini->stamp = stamp;
         ini->hasFile = true;
         return 0;
     });
@@ -164,9 +169,7 @@ int IniText_HasFileChanged(const IniText* ini) {
     if (stat(ini->path.c_str(), &status) != 0) {
         return errno == ENOENT ? kIniInvalidArgument : kIniCannotOpenForReading;
     }
-    bool same = status.st_mtim.tv_sec == ini->modified.tv_sec &&
-                status.st_mtim.tv_nsec == ini->modified.tv_nsec;
-    return same ? 0 : 1;
+    return kest_ini::FileStamp::Of(status) == ini->stamp ? 0 : 1;
 }
 
 int IniText_GetString(const IniText* ini, const char* section, const char* key,

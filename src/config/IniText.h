@@ -70,9 +70,9 @@ void IniText_SetNameOptions(IniText* ini, bool uniqueNames, bool caseSensitive);
 int IniText_Load(IniText* ini, const char* path);
 // Writes the document to `path` following the write options.
 int IniText_Save(IniText* ini, const char* path);
-// 1 when the remembered file's modification time (to the nanosecond) differs from the one
-// remembered at the last load or save, 0 when it is the same, negative when there is no
-// remembered file or it cannot be examined.
+// 1 when the remembered file is no longer the version of the last load or save (another inode,
+// size or modification time to the nanosecond), 0 when it is the same, negative when there is
+// no remembered file or it cannot be examined.
 int IniText_HasFileChanged(const IniText* ini);
 
 // Pointer to the stored value (valid until the key is changed or the document destroyed).
@@ -92,10 +92,13 @@ int IniText_GetInt32(const IniText* ini, const char* section, const char* key, i
 int IniText_GetBoolean(const IniText* ini, const char* section, const char* key, bool* value);
 int IniText_GetDouble(const IniText* ini, const char* section, const char* key, double* value);
 
-// Sets a value (surrounding whitespace removed) with its quote mark (0, '"' or '\''), creating
-// the section and key when missing. Empty names give -6. Names and values that would not read
-// back as given give -22: a line break anywhere, ']' in a section name, '=' in a key name or a
-// key name starting with '[' or ';'; so does a quote mark other than those three.
+// Sets a value (surrounding whitespace removed) with its quote mark (0 or '"'), creating the
+// section and key when missing. Empty names give -6. What is accepted reads back as given under
+// the read flags of the INI cache (kIniReadKeepEmptyValues | kIniReadStripDoubleQuotes, with or
+// without kIniReadKeepComments); what would not gives -22: a line break anywhere, ']' in a
+// section name, '=' in a key name or a key name starting with '[' or ';', a value enclosed in
+// double quotes with quote mark 0 (it would lose them), and any other quote mark (the apostrophe
+// would stay part of the value).
 int IniText_SetRaw(IniText* ini, const char* section, const char* key, const char* value,
                    char quoteMark);
 // Sets a value written between double quotes, with backslash escapes when `escape` is set.

@@ -2,8 +2,10 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <time.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <cstdio>
 #include <cstdlib>
@@ -142,6 +144,14 @@ class ScopedDescriptor {
     int descriptor_;
 };
 
+std::atomic<void (*)(SaveStage)> saveStageObserver{nullptr};
+
+void Reached(SaveStage stage) {
+    if (void (*observer)(SaveStage) = saveStageObserver.load()) {
+        observer(stage);
+    }
+}
+
 int OpenRetrying(const char* path, int flags, mode_t mode = 0) {
     int descriptor;
     do {
@@ -150,24 +160,15 @@ int OpenRetrying(const char* path, int flags, mode_t mode = 0) {
     return descriptor;
 }
 
-// Proves that the target can be written: opens an existing one for update, or creates and
-// deletes a new one.
+// Proves that an existing target can be written by opening it for update. A missing target is
+// left alone: creating the temporary and the rename report whether the directory takes it.
 bool TargetIsWritable(const char* path) {
-    int descriptor = OpenRetrying(path, O_RDWR | O_CLOEXEC);
+    int descriptor = OpenRetrying(path, O_RDWR | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
     if (descriptor >= 0) {
         close(descriptor);
         return true;
     }
-    if (errno != ENOENT) {
-        return false;
-    }
-    descriptor = OpenRetrying(path, O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
-    if (descriptor < 0) {
-        return false;
-    }
-    close(descriptor);
-    unlink(path);
-    return true;
+    return errno == ENOENT;
 }
 
 bool WriteAll(int descriptor, std::string_view text) {
@@ -182,6 +183,132 @@ bool WriteAll(int descriptor, std::string_view text) {
         text.remove_prefix(static_cast<size_t>(written));
     }
     return true;
+}
+
+// Six characters for a temporary's name, as mkstemp would pick them: different in every process
+// and on every call.
+std::string RandomSuffix() {
+    static constexpr char kCharacters[] =
+        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789";
+    static std::atomic<uint64_t> calls{0};
+    timespec now{};
+    clock_gettime(CLOCK_MONOTONIC, &now);
+    uint64_t mixed = (static_cast<uint64_t>(getpid()) << 40) ^
+                     (static_cast<uint64_t>(now.tv_sec) << 30) ^
+                     static_cast<uint64_t>(now.tv_nsec) ^ (calls++ * 0x9E3779B97F4A7C15ULL);
+    mixed = (mixed ^ (mixed >> 30)) * 0xBF58476D1CE4E5B9ULL;
+    mixed = (mixed ^ (mixed >> 27)) * 0x94D049BB133111EBULL;
+    mixed ^= mixed >> 31;
+    std::string suffix;
+    for (int i = 0; i < 6; ++i, mixed /= sizeof kCharacters - 1) {
+        suffix += kCharacters[mixed % (sizeof kCharacters - 1)];
+    }
+    return suffix;
+}
+
+// Creates a new temporary in `directory` under `prefix` and six random characters. An existing
+// name is never followed nor reused, so a temporary left by a killed save only costs a retry.
+int CreateTemporary(int directory, const std::string& prefix, mode_t mode, std::string* name) {
+    constexpr int kAttempts = 100;
+    for (int attempt = 0; attempt < kAttempts; ++attempt) {
+        *name = prefix + RandomSuffix();
+        int descriptor;
+        do {
+            descriptor = openat(directory, name->c_str(),
+                                O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, mode);
+        } while (descriptor < 0 && errno == EINTR);
+        if (descriptor >= 0 || errno != EEXIST) {
+            return descriptor;
+        }
+    }
+    return -1;
+}
+
+bool SyncUnlessInterrupted(int descriptor) {
+    int result;
+    do {
+        result = fsync(descriptor);
+    } while (result != 0 && errno == EINTR);
+    return result == 0;
+}
+
+// Writes the target itself, truncating it; a failed write removes the half-written target.
+int WriteInPlace(const char* path, std::string_view text, uint32_t writeFlags, FileStamp* stamp) {
+    int descriptor = OpenRetrying(path, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOCTTY, 0666);
+    if (descriptor < 0) {
+        return kIniCannotOpenOutput;
+    }
+    ScopedDescriptor output(descriptor);
+    struct stat written;
+    bool complete = WriteAll(descriptor, text) &&
+                    ((writeFlags & kIniWriteSync) == 0 || SyncUnlessInterrupted(descriptor)) &&
+                    fstat(descriptor, &written) == 0;
+    if (!output.Close() || !complete) {
+        unlink(path);
+        return kIniWriteFailed;
+    }
+    *stamp = FileStamp::Of(written);
+    return 0;
+}
+
+// Writes a new temporary beside the target, syncs it and renames it over the target, so that a
+// reader sees the old or the whole new document and a kill at any point leaves one of them.
+int ReplaceSafely(const char* path, std::string_view text, uint32_t writeFlags, FileStamp* stamp) {
+    if (!TargetIsWritable(path)) {
+        return kIniCannotWriteTarget;
+    }
+    std::string_view target(path);
+    size_t slash = target.rfind('/');
+    std::string directoryPath = slash == std::string_view::npos ? std::string(".")
+                                : slash == 0                    ? std::string("/")
+                                             : std::string(target.substr(0, slash));
+    std::string name(slash == std::string_view::npos ? target : target.substr(slash + 1));
+    ScopedDescriptor directory(
+        OpenRetrying(directoryPath.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    if (directory.Get() < 0) {
+        return kIniCannotCreateTemporary;
+    }
+    struct stat previous;
+    bool existed = fstatat(directory.Get(), name.c_str(), &previous, 0) == 0;
+    bool unique = (writeFlags & kIniWriteUniqueTemporary) != 0;
+    std::string prefix = TemporaryPathFor(target);
+    prefix = unique ? std::string("ini$$.TMP") : prefix.substr(prefix.rfind('/') + 1);
+    // Over an existing target the temporary is private until it has the target's owner and mode,
+    // so none of the content shows to anyone the target keeps out.
+    std::string temporary;
+    ScopedDescriptor output(
+        CreateTemporary(directory.Get(), prefix, existed ? 0600 : 0666, &temporary));
+    if (output.Get() < 0) {
+        return kIniCannotCreateTemporary;
+    }
+    Reached(SaveStage::kTemporaryCreated);
+    if (existed) {
+        // A process without the right to give files away still saves: a refused fchown is
+        // tolerated. The mode is set after the owner, which may clear set-id bits.
+        (void)!fchown(output.Get(), previous.st_uid, previous.st_gid);
+        fchmod(output.Get(), previous.st_mode & 07777);
+    } else if (unique) {
+        fchmod(output.Get(), 0644);
+    }
+    struct stat written;
+    bool complete = WriteAll(output.Get(), text) && SyncUnlessInterrupted(output.Get()) &&
+                    fstat(output.Get(), &written) == 0;
+    if (!output.Close() || !complete) {
+        unlinkat(directory.Get(), temporary.c_str(), 0);
+        return kIniWriteFailed;
+    }
+    Reached(SaveStage::kTemporaryWritten);
+    if (renameat(directory.Get(), temporary.c_str(), directory.Get(), name.c_str()) != 0) {
+        unlinkat(directory.Get(), temporary.c_str(), 0);
+        return kIniCannotWriteTarget;
+    }
+    Reached(SaveStage::kRenamed);
+    // The new name reaches the disk only with its directory.
+    if ((writeFlags & kIniWriteSync) != 0 && !SyncUnlessInterrupted(directory.Get())) {
+        return kIniWriteFailed;
+    }
+    *stamp = FileStamp::Of(written);
+    return 0;
 }
 
 }  // namespace
@@ -236,60 +363,17 @@ std::string TemporaryPathFor(std::string_view target) {
     return path;
 }
 
-int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, timespec* modified) {
+void SetSaveStageObserver(void (*observer)(SaveStage)) {
+    saveStageObserver = observer;
+}
+
+int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, FileStamp* stamp) {
     if (path == nullptr || *path == '\0') {
         return kIniInvalidArgument;
     }
-    bool safe = (writeFlags & kIniWriteSafeReplacement) != 0;
-    std::string outputPath = path;
-    int descriptor = -1;
-    if (safe) {
-        if (!TargetIsWritable(path)) {
-            return kIniCannotWriteTarget;
-        }
-        if ((writeFlags & kIniWriteUniqueTemporary) != 0) {
-            std::string_view target(path);
-            size_t slash = target.rfind('/');
-            outputPath = std::string(slash == std::string_view::npos ? std::string_view()
-                                                                     : target.substr(0, slash + 1));
-            outputPath += "ini$$.TMPXXXXXX";
-            descriptor = mkostemp(&outputPath[0], O_CLOEXEC);
-            if (descriptor < 0) {
-                return kIniCannotCreateTemporary;
-            }
-            fchmod(descriptor, 0644);
-        } else {
-            outputPath = TemporaryPathFor(path);
-            descriptor = OpenRetrying(outputPath.c_str(),
-                                      O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOFOLLOW, 0666);
-        }
-    } else {
-        descriptor = OpenRetrying(path, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
-    }
-    if (descriptor < 0) {
-        return kIniCannotOpenOutput;
-    }
-    ScopedDescriptor output(descriptor);
-    bool written =
-        WriteAll(descriptor, text) && ((writeFlags & kIniWriteSync) == 0 || fsync(descriptor) == 0);
-    struct stat previous;
-    if (written && safe && stat(path, &previous) == 0) {
-        // A process without the right to give files away still saves: a refused fchown is
-        // tolerated. The mode is set after the owner, which may clear set-id bits.
-        (void)!fchown(descriptor, previous.st_uid, previous.st_gid);
-        fchmod(descriptor, previous.st_mode & 07777);
-    }
-    if (!output.Close() || !written) {
-        unlink(outputPath.c_str());
-        return kIniWriteFailed;
-    }
-    if (safe && rename(outputPath.c_str(), path) != 0) {
-        unlink(outputPath.c_str());
-        return kIniCannotWriteTarget;
-    }
-    struct stat current;
-    *modified = stat(path, &current) == 0 ? current.st_mtim : timespec{};
-    return 0;
+    return (writeFlags & kIniWriteSafeReplacement) != 0
+               ? ReplaceSafely(path, text, writeFlags, stamp)
+               : WriteInPlace(path, text, writeFlags, stamp);
 }
 
 }  // namespace kest_ini

@@ -29,6 +29,13 @@ IPAddress ReadAddress(IuxSysPropertyBag* bag, uint32_t tag) {
     return address;
 }
 
+// As ReadAddress, but an empty text gives 0.0.0.0, the value an empty gateway or DNS server is
+// stored as.
+IPAddress ReadStoredAddress(IuxSysPropertyBag* bag, uint32_t tag) {
+    const IPAddress address = ReadAddress(bag, tag);
+    return address.IsUnset() ? ZeroIPv4Address() : address;
+}
+
 // As ReadAddress, but an empty text leaves `address` as it is.
 void ReadOptionalAddress(IuxSysPropertyBag* bag, uint32_t tag, IPAddress& address) {
     StatusHolder status;
@@ -63,8 +70,8 @@ bool HasMediaModeChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
 bool HaveStaticAddressesChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
     const IPAddress newAddress = ReadAddress(bag, NetworkTag::kIPAddress);
     const IPAddress newMask = ReadAddress(bag, NetworkTag::kSubnetMask);
-    const IPAddress newGateway = ReadAddress(bag, NetworkTag::kGateway);
-    const IPAddress newDnsServer = ReadAddress(bag, NetworkTag::kDnsServer);
+    const IPAddress newGateway = ReadStoredAddress(bag, NetworkTag::kGateway);
+    const IPAddress newDnsServer = ReadStoredAddress(bag, NetworkTag::kDnsServer);
 
     // The adapter's addresses start as 0.0.0.0, the value its properties show when the library
     // has none, so reading those properties back is no change. An adapter without an address
@@ -94,7 +101,9 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
     status = BagGetBool(bag, NetworkTag::kPrimaryAdapter, primary);
     uint32_t primaryIndex = 0;
     ThrowIfLibraryCallFailed(network::GetPrimaryDeviceIndex(primaryIndex));
-    if ((primaryIndex == deviceIndex) != primary) {
+    // A false flag never takes the primary role away, so only a true one on another adapter
+    // changes anything.
+    if (primary && primaryIndex != deviceIndex) {
         changed = true;
         return S_OK;
     }

@@ -8,9 +8,10 @@
 #include "uxsys/PropertyBag.h"
 #include "uxsys/Types.h"
 
-// Sets `changed` when the settings in `bag` differ from the adapter's (device `deviceIndex`):
-// the primary role, a switch to adapter mode 1, 4 or 8, the request mode, the media mode of a
-// mode-2 adapter, and for a static address the address, mask, gateway or DNS server. Returns
+// Sets `changed` when storing the settings in `bag` would alter the adapter's (device
+// `deviceIndex`): the primary role given to it, a switch to adapter mode 1, 4 or 8, the request
+// mode, the media mode of a mode-2 adapter, and for a static address the address, mask, gateway
+// or DNS server (an empty gateway or DNS server counts as the 0.0.0.0 it is stored as). Returns
 // S_OK, or E_FAIL when a non-empty address text is no address; other failures are thrown as a
 // status (long).
 HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag, bool& changed);

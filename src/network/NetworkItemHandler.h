@@ -23,9 +23,10 @@ class NetworkItemHandler : public ItemHandler {
     // violated rule's status; `message` (may be null) receives an explanation for some rules.
     HRESULT ValidatePropertyChanges(IuxSysPropertyBag* changes, PropertyTagSet& validated,
                                     CvqBStr* message) override;
-    // Writes the modified network settings at once and hands the adapter back in
-    // `deviceHandler` for a deferred interface restart. Returns S_OK, S_FALSE when nothing is
-    // modified, E_POINTER, or the first failure's status.
+    // Checks the changes as ValidatePropertyChanges does (a rejection is returned and nothing is
+    // written), writes the modified network settings at once and, when something was written,
+    // hands the adapter back in `deviceHandler` for a deferred interface restart. Returns S_OK,
+    // S_FALSE when nothing is modified, E_POINTER, or the first failure's status.
     HRESULT PersistPropertyChanges(IuxSysPropertyBag* changes, int32_t& persistFlag,
                                    CountedPtr<vq::targetcfg::IDeviceHandler>& deviceHandler,
                                    bool& adapterDisabled) override;

@@ -33,6 +33,10 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
     }
 
     try {
+        // A host may persist without validating first: what would be rejected is not written.
+        PropertyTagSet checked;
+        status = ValidatePropertyChanges(changes, checked, nullptr);
+
         uint32_t primaryIndex = 0;
         ThrowIfLibraryCallFailed(network::GetPrimaryDeviceIndex(primaryIndex));
         const bool wasPrimary = DeviceIndex() == primaryIndex;
@@ -40,32 +44,26 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
         // A false flag never takes the primary role away.
         bool primary = false;
         BagGetBool(changes, NetworkTag::kPrimaryAdapter, primary);
-        bool madePrimary = false;
+        bool written = false;
         if (primary && !wasPrimary) {
             ThrowIfLibraryCallFailed(network::SetPrimaryDeviceByIndex(DeviceIndex()));
             status = changes->SetULong(NetworkTag::kAdapterMode, AdapterMode::kTcpIp);
-            madePrimary = true;
+            written = true;
         }
 
         bool changed = false;
         status = HaveInterfaceSettingsChanged(DeviceIndex(), changes, changed);
-        if (!changed && !madePrimary) {
+        if (!changed && !written) {
             return S_OK;
         }
 
+        // Read before the new mode is stored: entering or leaving EtherCAT needs a restart.
         const uint32_t newMode = ReadULong(changes, NetworkTag::kAdapterMode);
         uint32_t currentMode = 0;
         ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(DeviceIndex(), currentMode));
-        if (newMode != currentMode &&
-            (newMode == AdapterMode::kEtherCAT || currentMode == AdapterMode::kEtherCAT)) {
-            persistFlag |= 1;
-        }
-
-        if (NeedsInterfaceRestart()) {
-            deviceHandler = CountedPtr<vq::targetcfg::IDeviceHandler>(Device());
-            adapterDisabled =
-                ReadULong(changes, NetworkTag::kAdapterMode) == AdapterMode::kDisabled;
-        }
+        const bool switchesEtherCAT =
+            newMode != currentMode &&
+            (newMode == AdapterMode::kEtherCAT || currentMode == AdapterMode::kEtherCAT);
 
         if (changed) {
             bool settingsApplied = false;
@@ -75,11 +73,25 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
                     if (!settingsApplied) {
                         settingsApplied = true;
                         status = ApplyInterfaceSettings(DeviceIndex(), changes, wasPrimary);
+                        written = true;
                     }
                 } else if (tag == NetworkTag::kPreferredMediaMode) {
                     ThrowIfLibraryCallFailed(
                         network::SetDeviceSettings(DeviceIndex(), ReadULong(changes, tag), 0, 0));
+                    written = true;
                 }
+            }
+        }
+
+        // A persist that wrote nothing leaves the link alone.
+        if (written) {
+            if (switchesEtherCAT) {
+                persistFlag |= 1;
+            }
+            if (NeedsInterfaceRestart()) {
+                deviceHandler = CountedPtr<vq::targetcfg::IDeviceHandler>(Device());
+                adapterDisabled =
+                    ReadULong(changes, NetworkTag::kAdapterMode) == AdapterMode::kDisabled;
             }
         }
     } catch (long failure) {

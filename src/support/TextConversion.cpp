@@ -4,6 +4,7 @@
 #include <langinfo.h>
 
 #include <cerrno>
+#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -82,11 +83,32 @@ class CachedDescriptor {
     std::unique_ptr<IconvDescriptor> descriptor_;
 };
 
+// True for a code point that has an encoding: at most U+10FFFF and not a UTF-16 surrogate.
+bool IsScalarValue(wchar_t character) {
+    const uint32_t value = static_cast<uint32_t>(character);
+    return value <= 0x10FFFF && (value < 0xD800 || value > 0xDFFF);
+}
+
 }  // namespace
 
 std::string NarrowFromWide(const wchar_t* text, size_t count) {
     if (count == 0) {
         return std::string();
+    }
+    // Characters without an encoding become '?' before conversion: the converter would give
+    // them sequences that are not valid text, longer than the four bytes sized per character.
+    std::wstring checked;
+    for (size_t i = 0; i < count; ++i) {
+        if (!IsScalarValue(text[i])) {
+            checked.assign(text, count);
+            break;
+        }
+    }
+    if (!checked.empty()) {
+        for (wchar_t& character : checked) {
+            character = IsScalarValue(character) ? character : L'?';
+        }
+        text = checked.data();
     }
     thread_local CachedDescriptor toNarrow(true);
     std::string out(count * 4, '\0');
@@ -108,6 +130,10 @@ std::wstring WideFromNarrow(const char* text, size_t count) {
         text, count, reinterpret_cast<char*>(&out[0]), out.size() * sizeof(wchar_t), 1,
         reinterpret_cast<const char*>(&question), sizeof(question));
     out.resize(written / sizeof(wchar_t));
+    // A sequence the converter decodes beyond U+10FFFF (F4 90 80 80 and above) has no character.
+    for (wchar_t& character : out) {
+        character = IsScalarValue(character) ? character : L'?';
+    }
     return out;
 }
 

@@ -1,5 +1,6 @@
 // The plug-in's own settings file "vqkest.ini": the web-service switch (section WebService, key
-// Enable). The file is loaded once at construction and written at every change.
+// Enable). The file is read again whenever it changed on disk, so other processes' saves are
+// seen, and every save changes the file as it is at that moment.
 #pragma once
 
 #include "config/IniTextPtr.h"
@@ -15,15 +16,22 @@ class KestConfigIni {
     KestConfigIni(const KestConfigIni&) = delete;
     KestConfigIni& operator=(const KestConfigIni&) = delete;
 
-    // True when the switch is present and not 0; as loaded or as last set.
-    bool IsWebServiceEnabled() const;
-    // Stores the switch as 1 or 0 and saves the file by safe replacement, flushed to the disk.
-    // A failure throws E_FAIL (a long) and leaves the settings as the file now holds them.
+    // True when the switch is present and not 0 in the file as it is now (re-loaded when it
+    // changed; a file that cannot be read keeps the last settings read, a missing one reads as
+    // disabled).
+    bool IsWebServiceEnabled();
+    // Stores the switch as 1 or 0 into the file as it is now, keeping the rest of it, and saves
+    // it by safe replacement, flushed to the disk. Saves of all processes take turns on a lock
+    // file beside it. A failure, including a file that exists but cannot be read (left
+    // unchanged), throws E_FAIL (a long) and leaves the settings as the file now holds them.
     void SetWebServiceEnabled(bool enabled);
 
   private:
-    // A new document holding the settings file's content (empty when it cannot be read).
-    static IniTextPtr LoadSettings();
+    // A new empty document with the settings file's write options.
+    static IniTextPtr NewDocument();
+    // Loads the settings file into a new document: 0 or, when it exists but cannot be read,
+    // the engine failure; a missing file gives an empty document.
+    static int LoadSettings(IniTextPtr& settings);
 
     IniTextPtr settings_;
 };

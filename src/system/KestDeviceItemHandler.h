@@ -36,9 +36,10 @@ class KestDeviceItemHandler : public ItemHandler {
     // when nothing is modified.
     HRESULT ValidatePropertyChanges(IuxSysPropertyBag* changes, PropertyTagSet& validated,
                                     CvqBStr* message) override;
-    // Applies each modified setting of `changes` in tag order and the clock last; sets
-    // `persistFlag` to 1 after host-name, locale and web-service changes. S_FALSE when nothing
-    // is modified; the first failure ends the walk (earlier changes stay applied).
+    // Checks the changes as ValidatePropertyChanges does (a rejection is returned and nothing is
+    // applied), then applies each modified setting of `changes` in tag order and the clock last;
+    // sets `persistFlag` to 1 after host-name, locale and web-service changes. S_FALSE when
+    // nothing is modified; the first failure ends the walk (earlier changes stay applied).
     HRESULT PersistPropertyChanges(IuxSysPropertyBag* changes, int32_t& persistFlag,
                                    CountedPtr<vq::targetcfg::IDeviceHandler>& deviceHandler,
                                    bool& adapterDisabled) override;

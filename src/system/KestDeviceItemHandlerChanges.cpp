@@ -115,6 +115,12 @@ HRESULT KestDeviceItemHandler::PersistPropertyChanges(
         if (!tags) {
             return S_FALSE;
         }
+        // A host may persist without validating first: what would be rejected is not written.
+        PropertyTagSet checked;
+        const HRESULT verdict = ValidatePropertyChanges(changes, checked, nullptr);
+        if (verdict < 0) {
+            return verdict;
+        }
 
         // The clock correction uses the time zone in force before any change is applied.
         int32_t clockCorrection = 0;

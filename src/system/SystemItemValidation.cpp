@@ -20,6 +20,8 @@ constexpr wchar_t kHostNameCharactersMessage[] =
 constexpr wchar_t kHostNameNumericMessage[] =
     L"The hostname must include at least one non-numeric character.";
 constexpr wchar_t kCommentLengthMessage[] = L"Comment length cannot exceed 64 characters.";
+constexpr wchar_t kCommentCharactersMessage[] = L"Comment cannot contain control characters.";
+constexpr wchar_t kTimeZoneMessage[] = L"Timezone not supported.";
 constexpr wchar_t kLocaleMessage[] = L"Locale not supported.";
 constexpr wchar_t kTimestampMessage[] = L"Timestamps older than 1970 are not supported.";
 
@@ -29,6 +31,35 @@ bool IsAlphanumeric(char byte) {
 
 bool IsDecimalDigit(char byte) {
     return byte >= '0' && byte <= '9';
+}
+
+bool IsControlCharacter(char byte) {
+    const unsigned char code = static_cast<unsigned char>(byte);
+    return code < 0x20 || code == 0x7F;
+}
+
+bool HasControlCharacter(const std::string& text) {
+    for (char byte : text) {
+        if (IsControlCharacter(byte)) {
+            return true;
+        }
+    }
+    return false;
+}
+
+// True when one of the "/"-separated parts of `name` is "..".
+bool HasParentPart(const std::string& name) {
+    size_t start = 0;
+    for (;;) {
+        const size_t slash = name.find('/', start);
+        if (name.compare(start, slash - start, "..") == 0) {
+            return true;
+        }
+        if (slash == std::string::npos) {
+            return false;
+        }
+        start = slash + 1;
+    }
 }
 
 ValidationVerdict Reject(HRESULT status, const wchar_t* message) {
@@ -69,6 +100,16 @@ ValidationVerdict CheckHostName(const std::string& hostName) {
 ValidationVerdict CheckComment(const std::string& comment) {
     if (comment.size() > kMaxCommentLength) {
         return Reject(UX_E_VALUE_INVALID, kCommentLengthMessage);
+    }
+    if (HasControlCharacter(comment)) {
+        return Reject(UX_E_VALUE_INVALID, kCommentCharactersMessage);
+    }
+    return ValidationVerdict();
+}
+
+ValidationVerdict CheckTimeZoneName(const std::string& name) {
+    if ((!name.empty() && name[0] == '/') || HasParentPart(name) || HasControlCharacter(name)) {
+        return Reject(UX_E_VALUE_INVALID, kTimeZoneMessage);
     }
     return ValidationVerdict();
 }

@@ -20,8 +20,13 @@ struct ValidationVerdict {
 // made only of digits. Bytes are judged with isalnum in the process's current locale.
 ValidationVerdict CheckHostName(const std::string& hostName);
 
-// A comment of at most 64 bytes (narrow text, so multi-byte characters count per byte).
+// A comment of at most 64 bytes (narrow text, so multi-byte characters count per byte) without
+// control characters (bytes below 0x20 and 0x7F).
 ValidationVerdict CheckComment(const std::string& comment);
+
+// A time-zone name (either notation) that can only name a zone inside the zone directory: no
+// leading "/", no ".." part and no control characters. A refusal carries the time-zone message.
+ValidationVerdict CheckTimeZoneName(const std::string& name);
 
 // A locale code that is one whole, non-empty element of the comma-separated `localeCodes`.
 ValidationVerdict CheckLocaleCode(const std::wstring& localeCode, const std::wstring& localeCodes);

@@ -7,6 +7,7 @@
 #include <chrono>
 #include <cstdint>
 
+#include "config/IniNames.h"
 #include "property/BagAccess.h"
 #include "support/ConvertStatusCode.h"
 #include "support/Exceptions.h"
@@ -116,8 +117,11 @@ std::string SystemTimeAssistant::GetLegacyTimeZone() {
 }
 
 HRESULT SystemTimeAssistant::FindLegacyOffset(const std::string& text, int32_t& seconds) const {
+    // The time-zone table finds its keys ignoring case and surrounding blanks; so does this
+    // look-up, so every text the table accepts gets its offset.
+    const kest_ini::NameRules sameName;
     for (const LegacyTimeZone& zone : legacyTable_) {
-        if (zone.standardText == text || zone.daylightText == text) {
+        if (sameName(zone.standardText, text) || sameName(zone.daylightText, text)) {
             seconds = zone.offset * kSecondsPerLegacyOffsetUnit;
             return S_OK;
         }
@@ -137,6 +141,13 @@ int32_t SystemTimeAssistant::GetLegacyOffsetDifference(const std::string& first,
 HRESULT SystemTimeAssistant::ValidateOlsonOrLegacyTimeZone(const std::string& text, bool olsonForm,
                                                            CvqBStr* message) {
     TraceIfEnabled("SystemTimeAssistant::ValidateOlsonOrLegacyTimeZone()", kTraceEntry);
+    // A name is looked up as a file below the zone directory: it must not lead out of it.
+    const ValidationVerdict nameVerdict = CheckTimeZoneName(text);
+    if (!nameVerdict.Passed()) {
+        TraceIfEnabled("ValidateOlsonOrLegacyTimeZone() failed", kTraceErrors);
+        StoreValidationMessage(message, nameVerdict.message);
+        return nameVerdict.status;
+    }
     StatusHolder status;
     if (olsonForm) {
         status = ConvertStatusCode(targetsystem::ValidateTimeZone(text));
@@ -179,8 +190,9 @@ HRESULT SystemTimeAssistant::PersistSystemPropertyTimezone(uint32_t tag, IuxSysP
         }
         olsonName = newText;
     }
-    // An empty name would leave the controller without a time zone.
-    if (olsonName.empty()) {
+    // An empty name would leave the controller without a time zone; a name leading out of the
+    // zone directory is never handed on.
+    if (olsonName.empty() || !CheckTimeZoneName(olsonName).Passed()) {
         TraceIfEnabled("PersistSystemPropertyTimezone() failed", kTraceErrors);
         return UX_E_VALUE_INVALID;
     }

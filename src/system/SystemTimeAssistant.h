@@ -36,7 +36,8 @@ class SystemTimeAssistant {
     std::string GetLegacyTimeZone();
 
     // The offset in seconds east of UTC of the first built-in row whose standard or daylight
-    // text equals `text` exactly: S_OK, or S_FALSE with `seconds` untouched.
+    // text equals `text`, ignoring case and surrounding blanks as the time-zone table does: S_OK,
+    // or S_FALSE with `seconds` untouched.
     HRESULT FindLegacyOffset(const std::string& text, int32_t& seconds) const;
     // Offset of `first` minus offset of `second`, in seconds; texts outside the built-in table
     // count as offset 0.
@@ -44,14 +45,16 @@ class SystemTimeAssistant {
 
     // Checks a time zone in Olson form (through the library, without message) or in legacy form
     // (through the table; an unknown text gives UX_E_VALUE_INVALID and "Timezone not supported."
-    // in `message` when given). Library and cache failures are thrown as statuses.
+    // in `message` when given). A name with a leading "/", a ".." part or a control character is
+    // refused in either form like an unknown legacy text. Library and cache failures are thrown
+    // as statuses.
     HRESULT ValidateOlsonOrLegacyTimeZone(const std::string& text, bool olsonForm,
                                           CvqBStr* message);
 
     // Applies the time zone under `tag` (legacy text or Olson name) from `bag`: S_FALSE when it
-    // is already in force, S_OK once set, UX_E_VALUE_INVALID for a legacy text without Olson name
-    // or an empty name, the bag's status when the value cannot be read. `persistFlag` is not
-    // touched. A tag other than the two time-zone tags throws E_FAIL.
+    // is already in force, S_OK once set, UX_E_VALUE_INVALID for a legacy text without Olson name,
+    // an empty name or one CheckTimeZoneName refuses, the bag's status when the value cannot be
+    // read. `persistFlag` is not touched. A tag other than the two time-zone tags throws E_FAIL.
     HRESULT PersistSystemPropertyTimezone(uint32_t tag, IuxSysPropertyBag* bag,
                                           int32_t& persistFlag);
     // Sets the clock to the bag's current-time value plus `offsetSeconds`: S_OK, the bag's

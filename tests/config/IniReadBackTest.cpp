@@ -125,3 +125,33 @@ TEST(IniReadBackPiecesTest, JoinedRunsKeepNamesUnique) {
         EXPECT_EQ(IniText_GetKeyCount(repeated.get(), "S"), 3) << c.lines;
     }
 }
+
+// The setters' promise under the cache's read flags: every value and quote mark they accept
+// reads back as given, whatever the line length; what they refuse (-22) would not have.
+TEST(IniReadBackPromiseTest, AcceptedValuesReadBackAndRefusedOnesWouldNot) {
+    TempSysroot dir;
+    constexpr uint32_t kCacheReadFlags = kIniReadKeepEmptyValues | kIniReadStripDoubleQuotes;
+    const std::string values[] = {
+        "",     "plain", "\"enclosed\"", "'apostrophes'", "\"",
+        "\"\"", "''",    "a\"b",         "\"a",           "a\"",
+        "'a",   "x=y;z", "\"a\" \"b\"",  "\" padded \"",  "\"" + std::string(50, 'l') + "\""};
+    for (char quote : {'\0', '"', '\'', '`'}) {
+        for (const std::string& value : values) {
+            for (int maxLineLength : {kIniNoMaxLineLength, 30}) {
+                IniTextPtr ini(IniText_Create());
+                const int set = IniText_SetRaw(ini.get(), "S", "k", value.c_str(), quote);
+                std::string saved;
+                if (set == kIniFound) {
+                    saved = SavedText(dir, ini.get(), kIniWriteSpacedSeparator, maxLineLength);
+                } else {
+                    EXPECT_EQ(set, kIniInvalidArgument);
+                    // What the line would have been.
+                    saved = "[S]\nk = " + (quote != 0 ? quote + value + quote : value) + "\n";
+                }
+                IniTextPtr loaded = LoadFromBytes(dir, saved, kCacheReadFlags);
+                EXPECT_EQ(ValueOf(loaded.get(), "S", "k") == value, set == kIniFound)
+                    << "quote " << int(quote) << ": " << saved;
+            }
+        }
+    }
+}

@@ -53,26 +53,23 @@ class DocumentGenerator {
         const char splits[] = {0, ',', ' '};
         IniText_SetWriteOptions(ini, lengths[Number(0, 2)], splits[Number(0, 2)],
                                 static_cast<uint32_t>(Number(0, 63)) & ~kIniWriteComments);
-        return kIniReadKeepEmptyValues | kIniReadStripDoubleQuotes | kIniReadStripApostrophes |
+        return kIniReadKeepEmptyValues | kIniReadStripDoubleQuotes |
                (unnamed ? kIniReadColonsAndUnnamedSection : 0);
     }
 
   private:
     void SetValue(IniText* ini, const char* section, const char* key) {
         std::string value = Text("abcdefghij KLMNOP 0123 \"'=;[],\\:#\t\xC3\xA9", 0, 150);
-        int kind = Number(0, 3);
-        // An unquoted value between a pair of quote characters reads as a quoted one: that is
-        // the format, so such values get the quote mark.
+        int kind = Number(0, 2);
+        // An unquoted value between a pair of double quotes reads as a quoted one: that is the
+        // format, so such values get the quote mark.
         std::string trimmed = value.substr(0, value.find_last_not_of(" \t") + 1);
         trimmed.erase(0, trimmed.find_first_not_of(" \t"));
-        bool enclosed = trimmed.size() >= 2 && trimmed.front() == trimmed.back() &&
-                        (trimmed.front() == '"' || trimmed.front() == '\'');
-        if (kind == 0 && enclosed) {
+        if (kind == 0 && trimmed.size() >= 2 && trimmed.front() == '"' && trimmed.back() == '"') {
             kind = 1;
         }
-        const char quotes[] = {0, '"', '\''};
-        int result = kind < 3
-                         ? IniText_SetRaw(ini, section, key, value.c_str(), quotes[kind])
+        int result = kind < 2
+                         ? IniText_SetRaw(ini, section, key, value.c_str(), kind == 0 ? 0 : '"')
                          : IniText_SetString(ini, section, key, (value + "\n\x01").c_str(), true);
         EXPECT_EQ(result, kIniFound);
     }

@@ -1,3 +1,4 @@
+#include <dirent.h>
 #include <signal.h>
 #include <sys/inotify.h>
 #include <sys/resource.h>
@@ -99,7 +100,8 @@ TEST(IniWriteTest, SafeReplacementUsesTheTemporaryNameAndKeepsModeAndOwner) {
     auto save = [&] { return IniText_Save(ini.get(), target.c_str()); };
 
     IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0, kIniWriteSafeReplacement);
-    EXPECT_THAT(NamesCreatedBy(dir.Root(), save), ::testing::Contains("name.TMP"));
+    EXPECT_THAT(NamesCreatedBy(dir.Root(), save),
+                ::testing::Contains(::testing::MatchesRegex(R"(name\.TMP......)")));
     IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0,
                             kIniWriteSafeReplacement | kIniWriteUniqueTemporary | kIniWriteSync);
     std::vector<std::string> names = NamesCreatedBy(dir.Root(), save);
@@ -146,7 +148,16 @@ TEST(IniWriteTest, FailedWriteNeverTruncatesTheTarget) {
     EXPECT_EQ(SaveUnderFileSizeLimit(path, kIniWriteSafeReplacement | kIniWriteSync),
               kIniWriteFailed);
     EXPECT_EQ(ReadBytes(path), "[keep]\nk=1\n");
-    EXPECT_FALSE(dir.Exists("/target.TMP"));
+    // The temporary is removed again.
+    std::vector<std::string> names;
+    DIR* listing = opendir(dir.Root().c_str());
+    while (const dirent* entry = readdir(listing)) {
+        if (entry->d_name[0] != '.') {
+            names.emplace_back(entry->d_name);
+        }
+    }
+    closedir(listing);
+    EXPECT_EQ(names, std::vector<std::string>{"target.ini"});
     // Without safe replacement the half-written target is removed rather than left corrupt.
     EXPECT_EQ(SaveUnderFileSizeLimit(path, 0), kIniWriteFailed);
     EXPECT_FALSE(dir.Exists("/target.ini"));

@@ -18,6 +18,7 @@ using ::testing::HasSubstr;
 constexpr uint32_t kIPAddressTag = 0x0D107000;
 constexpr uint32_t kSubnetMaskTag = 0x0D109000;
 constexpr uint32_t kGatewayTag = 0x0D10A000;
+constexpr uint32_t kPrimaryAdapterTag = 0x0D126000;
 constexpr wchar_t kEth0[] = L"eth0";
 
 double MonotonicMs() {
@@ -126,6 +127,21 @@ TEST_F(EthernetItemTest, NewAddressIsWrittenAtOnceAndTheInterfaceRestartsAfterTh
     EXPECT_GE(calls[1].first + 0.001, returnedMs);
     EXPECT_GE(calls[1].first, calledMs + 100);
     EXPECT_GE(calls[2].first, calls[1].first + 900);
+}
+
+TEST_F(EthernetItemTest, PersistsThatWriteNothingLeaveTheLinkAlone) {
+    // A false primary flag on the primary adapter, then an address read otherwise than stored.
+    ASSERT_EQ(S_OK, bag->SetBool(kPrimaryAdapterTag, 0));
+    int32_t restart = -1;
+    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    ASSERT_EQ(S_OK, bag->SetString(kGatewayTag, L"192.168.1.0255"));
+    EXPECT_EQ(UX_E_GATEWAY_INVALID, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    EXPECT_EQ(std::make_pair(UX_E_GATEWAY_INVALID, std::wstring()), Validate());
+
+    // Releasing the expert waits for any restart that was started.
+    expert->Release();
+    expert = nullptr;
+    EXPECT_TRUE(ControllerChanges().empty());
 }
 
 TEST_F(EthernetItemTest, PersistingAgainWaitsForTheRunningRestart) {

@@ -2,6 +2,11 @@
 // accepts (host name, comment, locale, time zone in both notations, clock, web service),
 // including the rejections a host shows for bad values.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdio>
 
 #include <fstream>
 #include <map>
@@ -23,6 +28,7 @@ constexpr uint32_t kLegacyTimeZoneTag = 0x0D120000;
 constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
 constexpr uint32_t kWebServiceTag = 0x21004000;
 constexpr int64_t kUnixEpochIn1904Seconds = 2082844800;
+constexpr char kSettingsPath[] = "/etc/korvane/share/vqkest.ini";
 
 // The time-zone table the plug-in ships, from the source tree.
 std::string ShippedTimeZoneTable() {
@@ -201,6 +207,20 @@ TEST_F(SystemItemTest, SetsTheClockAndTheHardwareClock) {
     EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot.ReadFile("/hwclock.log"));
 }
 
+TEST_F(SystemItemTest, ClockFollowsTheLegacyZoneHoweverItIsSpelled) {
+    // From Europe/Berlin (an Olson name: no built-in offset) to eight hours west of UTC.
+    for (const wchar_t* spelling : {L"PST8PDT", L"pst8pdt", L" PST8PDT "}) {
+        WriteControllerState(std::string(kSystemState) + "DeviceDescription = KEST 9100\n");
+        const Outcome outcome = Apply(Changes([&](IuxSysPropertyBag2* changes) {
+            changes->SetString(kLegacyTimeZoneTag, spelling);
+            changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds + 1700000000});
+        }));
+        EXPECT_EQ(S_OK, outcome.persistence);
+        EXPECT_EQ("1700028800 0\n", sysroot.ReadFile("/run/kest/system-clock"));
+        EXPECT_EQ(L"America/Los_Angeles", Text(kOlsonTimeZoneTag));
+    }
+}
+
 TEST_F(SystemItemTest, SwitchesTheWebService) {
     Outcome outcome =
         Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 1); }));
@@ -213,6 +233,41 @@ TEST_F(SystemItemTest, SwitchesTheWebService) {
         Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 0); }));
     EXPECT_EQ(S_OK, outcome.persistence);
     EXPECT_FALSE(Bool(kWebServiceTag));
+}
+
+// Another process switches the web service on and adds its own section: the host that read the
+// switch before shows the change, and its own save keeps that section.
+TEST_F(SystemItemTest, SeesAndKeepsWhatAnotherProcessSaved) {
+    EXPECT_FALSE(Bool(kWebServiceTag));
+    const pid_t other = fork();
+    if (other == 0) {
+        sysroot.WriteFile("/etc/korvane/share/other.new",
+                          "[Other]\nKey = x\n[WebService]\nEnable = 1\n");
+        _exit(std::rename(sysroot.PathOf("/etc/korvane/share/other.new").c_str(),
+                          sysroot.PathOf(kSettingsPath).c_str()));
+    }
+    int status = -1;
+    ASSERT_EQ(other, waitpid(other, &status, 0));
+    ASSERT_EQ(0, status);
+    EXPECT_TRUE(Bool(kWebServiceTag));
+    Outcome outcome =
+        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 0); }));
+    EXPECT_EQ(S_OK, outcome.persistence);
+    EXPECT_EQ("[Other]\nKey = x\n\n[WebService]\nEnable = 0\n\n", sysroot.ReadFile(kSettingsPath));
+}
+
+// A settings file that cannot be read (a FIFO here) hangs neither a get nor a set, and is left
+// in place: the set fails.
+TEST_F(SystemItemTest, ASettingsFileThatCannotBeReadIsLeftAlone) {
+    const std::string path = sysroot.PathOf(kSettingsPath);
+    ASSERT_EQ(0, mkfifo(path.c_str(), 0600));
+    EXPECT_FALSE(Bool(kWebServiceTag));
+    Outcome outcome =
+        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 1); }));
+    EXPECT_EQ(E_FAIL, outcome.persistence);
+    struct stat fifo;
+    ASSERT_EQ(0, lstat(path.c_str(), &fifo));
+    EXPECT_TRUE(S_ISFIFO(fifo.st_mode));
 }
 
 TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
@@ -229,14 +284,31 @@ TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
          UX_E_VALUE_INVALID, L"Comment length cannot exceed 64 characters."},
         {kLocaleTag, L"e", UX_E_VALUE_INVALID, L"Locale not supported."},
         {kLegacyTimeZoneTag, L"NFT-11:30", UX_E_VALUE_INVALID, L"Timezone not supported."},
+        {kHostNameTag, L"kest-2\nreboot", UX_E_HOSTNAME_INVALID,
+         L"Hostname must contain only alphanumeric characters and hyphens."},
+        {kOlsonTimeZoneTag, L"../x", UX_E_VALUE_INVALID, L"Timezone not supported."},
+        {kCommentTag, L"rack\r4", UX_E_VALUE_INVALID,
+         L"Comment cannot contain control characters."},
     };
+    // A zone file that a name leading out of the zone directory would find.
+    sysroot.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
         const Outcome outcome = Apply(
             Changes([&](IuxSysPropertyBag2* changes) { changes->SetString(c.tag, c.value); }));
         EXPECT_EQ(c.status, outcome.validation) << std::hex << c.tag;
         EXPECT_EQ(c.message, outcome.message) << std::hex << c.tag;
         EXPECT_TRUE(outcome.validated.empty());
+
+        // A host that persists without validating first gets the same status.
+        IuxSysPropertyBag2* changes =
+            Changes([&](IuxSysPropertyBag2* bag) { bag->SetString(c.tag, c.value); });
+        int32_t restart = -1;
+        EXPECT_EQ(c.status, expert->PersistPropertyChanges(kSystemItemName, changes, &restart))
+            << std::hex << c.tag;
+        changes->Release();
     }
+    EXPECT_EQ(std::string::npos, sysroot.ReadFile(kControllerCallLogPath).find("\tSet"))
+        << "nothing reached the controller";
     const Outcome old = Apply(Changes([](IuxSysPropertyBag2* changes) {
         changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds - 1});
     }));

@@ -3,7 +3,11 @@
 // the deferred restart.
 #include <gmock/gmock.h>
 
+#include <map>
+#include <tuple>
+
 #include "NetworkTestSupport.h"
+#include "network/InterfaceSettings.h"
 
 namespace network_test {
 namespace {
@@ -76,11 +80,14 @@ TEST_F(PersistenceTest, MediaModeAloneIsSetWithoutTouchingPolling) {
     const PersistResult result = Persist(AdapterState(), "media=8");
     EXPECT_EQ(S_OK, result.status);
     EXPECT_TRUE(result.deviceHandler);
-    EXPECT_THAT(CallLog(),
-                ElementsAre("GetPrimaryDeviceIndex\t0", "GetPrimaryDeviceIndex\t0",
-                            "GetDeviceModeByIndex\t0\t0", "GetDeviceTCPIPRequestModeByIndex\t0\t0",
-                            "GetCurrentDeviceSettings\t0\t0", "GetDeviceModeByIndex\t0\t0",
-                            "SetDeviceSettings\t0\t0\t8\t0\t0"));
+    // The checks of validation come first, then the change test and the write.
+    EXPECT_THAT(
+        CallLog(),
+        ElementsAre("GetPrimaryDeviceIndex\t0", "GetDeviceSupportedTCPIPRequestModesByIndex\t0\t0",
+                    "GetPrimaryDeviceIndex\t0", "GetPrimaryDeviceIndex\t0",
+                    "GetDeviceModeByIndex\t0\t0", "GetDeviceTCPIPRequestModeByIndex\t0\t0",
+                    "GetCurrentDeviceSettings\t0\t0", "GetDeviceModeByIndex\t0\t0",
+                    "SetDeviceSettings\t0\t0\t8\t0\t0"));
 }
 
 TEST_F(PersistenceTest, AdapterModeChangesStoreZeroAddresses) {
@@ -99,21 +106,27 @@ TEST_F(PersistenceTest, AdapterModeChangesStoreZeroAddresses) {
 }
 
 TEST_F(PersistenceTest, NewStaticAddressStoresTheWholeConfiguration) {
-    EXPECT_EQ(S_OK, Persist(AdapterState(), "ip=192.168.1.20 dns=").status);
+    // Another adapter may leave its DNS server empty: it is stored as 0.0.0.0.
+    EXPECT_EQ(S_OK, Persist(AdapterState("", 1), "ip=192.168.1.20 dns=").status);
     EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.1.20"
                                             "\t255.255.255.0\t192.168.1.1\t0.0.0.0"));
     // An adapter without an address yet takes the new one as well.
-    EXPECT_EQ(S_OK, Persist(AdapterState("IPAddress ="), "ip=10.0.0.3 mask=255.0.0.0").status);
-    EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t10.0.0.3"
-                                            "\t255.0.0.0\t192.168.1.1\t192.168.1.2"));
+    EXPECT_EQ(S_OK, Persist(AdapterState("IPAddress ="), "ip=192.168.1.3 mask=255.255.0.0").status);
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.1.3"
+                                            "\t255.255.0.0\t192.168.1.1\t192.168.1.2"));
 }
 
 TEST_F(PersistenceTest, FailuresAreTracedAndReturnedAfterEarlierWrites) {
     CaptureTraces(kTraceErrors);
-    EXPECT_EQ(E_FAIL, Persist(AdapterState(), "gw=gateway").status);
+    EXPECT_EQ(UX_E_GATEWAY_INVALID, Persist(AdapterState(), "gw=gateway").status);
     EXPECT_THAT(CallLog("Set"), IsEmpty());
-    EXPECT_THAT(Traces(), ElementsAre("NetworkItemHandler::HaveInterfaceSettingsChanged() failed +",
-                                      "NetworkItemHandler::PersistPropertyChanges() failed +"));
+    bool changed = true;
+    EXPECT_EQ(E_FAIL, HaveInterfaceSettingsChanged(0, bag_.Get(), changed));
+    EXPECT_THAT(Traces(),
+                ElementsAre("ValidateGatewayDNSHelper() failed",
+                            "NetworkItemHandler::ValidatePropertyChanges() failed +",
+                            "NetworkItemHandler::PersistPropertyChanges() failed +",
+                            "NetworkItemHandler::HaveInterfaceSettingsChanged() failed +"));
 
     EXPECT_EQ(E_INVALIDARG, Persist(AdapterState("[Faults]\nSetDeviceIPConfigByIndex = -375563", 1),
                                     "primary=1 req=2")
@@ -123,6 +136,71 @@ TEST_F(PersistenceTest, FailuresAreTracedAndReturnedAfterEarlierWrites) {
         ElementsAre("SetPrimaryDeviceByIndex\t0\t0",
                     std::string("SetDeviceIPConfigByIndex\t-375563\t0\t0\t2\t2") + kZeroAddresses));
 }
+
+TEST_F(PersistenceTest, SettingsThatWouldNotBeWrittenAreNoChange) {
+    // A false flag on the primary adapter never removes its role.
+    PersistResult result = Persist(AdapterState(), "primary=0");
+    EXPECT_EQ(S_OK, result.status);
+    EXPECT_FALSE(result.deviceHandler);
+    EXPECT_THAT(CallLog("Set"), IsEmpty());
+
+    // Another adapter's empty gateway and DNS server are stored as 0.0.0.0, so against a stored
+    // 0.0.0.0 they change nothing, however often they are persisted.
+    const std::string unset = "Gateway = 0.0.0.0\nDNSServer = 0.0.0.0";
+    for (int persist = 0; persist < 2; ++persist) {
+        result = Persist(AdapterState(unset, 1), "gw= dns=");
+        EXPECT_EQ(S_OK, result.status);
+        EXPECT_FALSE(result.deviceHandler);
+        EXPECT_THAT(CallLog("Set"), IsEmpty());
+    }
+    // Any real change still stores the empty ones as 0.0.0.0 and restarts the interface.
+    result = Persist(AdapterState(unset, 1), "gw= dns= ip=192.168.1.11");
+    EXPECT_TRUE(result.deviceHandler);
+    EXPECT_THAT(CallLog("Set"), ElementsAre("SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.1.11"
+                                            "\t255.255.255.0\t0.0.0.0\t0.0.0.0"));
+}
+
+// Address texts that inet_addr reads as another address than the one they would be stored as
+// (short, octal and hexadecimal forms, leading zeros) are refused in every address field with
+// that field's status, by validation and by a persist that comes without it.
+class AmbiguousAddressTable
+    : public PersistenceTest,
+      public ::testing::WithParamInterface<std::tuple<const char*, const char*>> {};
+
+TEST_P(AmbiguousAddressTable, IsTheFieldsInvalidAddressEverywhere) {
+    const auto [field, text] = GetParam();
+    const std::map<std::string, HRESULT> statuses = {{"ip", UX_E_IP_ADDRESS_INVALID},
+                                                     {"mask", UX_E_SUBNET_MASK_INVALID},
+                                                     {"gw", UX_E_GATEWAY_INVALID},
+                                                     {"dns", UX_E_DNS_ADDRESS_INVALID}};
+    const PersistResult result =
+        Persist(AdapterState(), std::string("ip=192.168.10.21 gw=192.168.10.1 dns=192.168.10.2 ") +
+                                    field + "=" + text);
+    EXPECT_EQ(statuses.at(field), result.status);
+    EXPECT_FALSE(result.deviceHandler);
+    EXPECT_THAT(CallLog("Set"), IsEmpty());
+
+    PropertyTagSet validated;
+    CvqBStrHolder message;
+    HRESULT validation = S_OK;
+    try {
+        validation = handler_->ValidatePropertyChanges(bag_.Get(), validated, message.Receive());
+    } catch (long thrown) {
+        validation = static_cast<HRESULT>(thrown);
+    }
+    EXPECT_EQ(statuses.at(field), validation);
+    EXPECT_EQ(nullptr, message.Get());
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Forms, AmbiguousAddressTable,
+    ::testing::Combine(::testing::Values("ip", "mask", "gw", "dns"),
+                       ::testing::Values("192.168.10.0255", "192.168.012.1", "192.168.2570",
+                                         "0xC0.168.10.21", "192.168.010.020", "255.255.0377.0",
+                                         "255.0xFFFF00", "0300.168.10.21")),
+    [](const ::testing::TestParamInfo<std::tuple<const char*, const char*>>& testCase) {
+        return std::get<0>(testCase.param) + std::to_string(testCase.index % 8);
+    });
 
 TEST_F(PersistenceTest, OtherTagsChangeNothingAndPollingIsSetAlone) {
     const PersistResult result = Persist(AdapterState(), "mac=00:00:00:00:00:01");

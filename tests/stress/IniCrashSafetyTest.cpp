@@ -1,6 +1,7 @@
 // Crash safety of INI saving with safe replacement: a child process saves two complete documents
-// in turn, over and over, and is killed with SIGKILL at a random moment of a save; after each
-// kill the target must hold exactly one of the two documents, byte for byte.
+// in turn, over and over, and is killed with SIGKILL at a random moment of a save, or saves once
+// and is killed at a fixed point of it; after each kill the target must hold exactly one of the
+// documents, byte for byte, and the next save must succeed.
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/wait.h>
@@ -17,6 +18,7 @@
 #include "common/TempSysroot.h"
 #include "config/IniText.h"
 #include "config/IniTextPtr.h"
+#include "config/IniWriter.h"
 
 namespace {
 
@@ -127,5 +129,52 @@ INSTANTIATE_TEST_SUITE_P(
                                 kIniWriteSafeReplacement | kIniWriteUniqueTemporary},
                       CrashCase{"Synchronised", kIniWriteSafeReplacement | kIniWriteSync}),
     [](const ::testing::TestParamInfo<CrashCase>& param) { return std::string(param.param.name); });
+
+// The point at which the saving child kills itself.
+kest_ini::SaveStage killStage;
+
+TEST(IniCrashSafetyStagesTest, SavesKilledAtFixedPointsLeaveOneWholeDocument) {
+    using kest_ini::SaveStage;
+    for (uint32_t flags : {kIniWriteSafeReplacement,
+                           kIniWriteSafeReplacement | kIniWriteUniqueTemporary | kIniWriteSync}) {
+        for (SaveStage stage :
+             {SaveStage::kTemporaryCreated, SaveStage::kTemporaryWritten, SaveStage::kRenamed}) {
+            for (bool existed : {false, true}) {
+                kest::test::TempSysroot dir;
+                const std::string target = dir.PathOf("/settings.ini");
+                IniTextPtr oldDocument = Document("old", flags);
+                IniTextPtr newDocument = Document("new", flags);
+                ASSERT_EQ(0, IniText_Save(newDocument.get(), dir.PathOf("/new.ini").c_str()));
+                const std::string newBytes = ReadAll(dir.PathOf("/new.ini"));
+                if (existed) {
+                    ASSERT_EQ(0, IniText_Save(oldDocument.get(), target.c_str()));
+                }
+                const std::string oldBytes = ReadAll(target);
+                killStage = stage;
+                const pid_t child = fork();
+                if (child == 0) {
+                    kest_ini::SetSaveStageObserver([](SaveStage reached) {
+                        if (reached == killStage) {
+                            raise(SIGKILL);
+                        }
+                    });
+                    _exit(IniText_Save(newDocument.get(), target.c_str()) == 0 ? 0 : 1);
+                }
+                int status = 0;
+                ASSERT_EQ(child, waitpid(child, &status, 0));
+                ASSERT_TRUE(WIFSIGNALED(status)) << "the save did not reach the point";
+                const bool renamed = stage == SaveStage::kRenamed;
+                const std::string context = "stage " + std::to_string(static_cast<int>(stage)) +
+                                            (existed ? ", over a file" : ", no file before");
+                EXPECT_EQ(existed || renamed, access(target.c_str(), F_OK) == 0) << context;
+                EXPECT_TRUE(ReadAll(target) == (renamed ? newBytes : oldBytes)) << context;
+                // The temporary left behind does not block the next save.
+                ASSERT_EQ(0, IniText_Save(oldDocument.get(), target.c_str())) << context;
+                ASSERT_EQ(0, IniText_Save(newDocument.get(), target.c_str())) << context;
+                EXPECT_TRUE(ReadAll(target) == newBytes) << context;
+            }
+        }
+    }
+}
 
 }  // namespace

@@ -63,7 +63,7 @@ int WholeVersion(const std::string& path) {
 struct ReplaceCase {
     const char* name;
     uint32_t writeFlags;
-    int writers;  // a fixed temporary name is only safe for one writer at a time
+    int writers;
 };
 
 // Test names show the case's name rather than its bytes.
@@ -118,7 +118,7 @@ TEST_P(StressIniReplaceTest, LoadsDuringReplacementSeeWholeDocuments) {
 
 INSTANTIATE_TEST_SUITE_P(
     StressReplacement, StressIniReplaceTest,
-    ::testing::Values(ReplaceCase{"FixedTemporary", kIniWriteSafeReplacement, 1},
+    ::testing::Values(ReplaceCase{"TemporaryNamedAfterTheTarget", kIniWriteSafeReplacement, 3},
                       ReplaceCase{"UniqueTemporaries",
                                   kIniWriteSafeReplacement | kIniWriteUniqueTemporary, 3}),
     [](const ::testing::TestParamInfo<ReplaceCase>& param) {

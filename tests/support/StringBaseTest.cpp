@@ -6,6 +6,7 @@
 #include <string>
 
 #include "support/Exceptions.h"
+#include "support/TextConversion.h"
 #include "vq/dsc/SafeInteger.h"
 #include "vq/dsc/StringBase.h"
 #include "vq/dsc/Vector.h"
@@ -145,6 +146,24 @@ TEST(StringBaseConversion, Utf8LocaleConvertsAndReplacesInvalidBytes) {
         EXPECT_EQ(L"a?(b", WideString("a\xC3(b").str());
         EXPECT_EQ(L"end??", WideString("end\xE2\x82").str());
         EXPECT_STREQ("a?b", NarrowString(std::wstring{L'a', wchar_t(0xD800), L'b'}).c_str());
+        // Characters beyond U+10FFFF have no encoding: one '?' each, alone and in a run that
+        // would overflow four bytes per character if they came out as five- or six-byte forms.
+        for (uint32_t beyond : {0x110000u, 0x7FFFFFFFu, 0xFFFFFFFFu}) {
+            const std::wstring one{wchar_t(beyond)};
+            EXPECT_STREQ("?", NarrowString(one).c_str()) << std::hex << beyond;
+            EXPECT_EQ(std::string(64, '?'), vq::dsc::NarrowFromWide(std::wstring(64, one[0])));
+        }
+        EXPECT_STREQ("\xF4\x8F\xBF\xBF", NarrowString(std::wstring{wchar_t(0x10FFFF)}).c_str());
+        // Sequences that decode beyond U+10FFFF become '?' too; the largest valid one stays.
+        for (const char* beyond : {"\xF4\x90\x80\x80", "\xF7\xBF\xBF\xBF", "\xFB\xBF\xBF\xBF\xBF",
+                                   "\xFD\xBF\xBF\xBF\xBF\xBF"}) {
+            const std::wstring wide = WideString(beyond).str();
+            EXPECT_NE(std::wstring::npos, wide.find(L'?')) << beyond;
+            for (wchar_t character : wide) {
+                EXPECT_EQ(L'?', character) << beyond;
+            }
+        }
+        EXPECT_EQ(std::wstring{wchar_t(0x10FFFF)}, WideString("\xF4\x8F\xBF\xBF").str());
     }
     std::setlocale(LC_ALL, previous.c_str());
 }

@@ -1,8 +1,19 @@
 #include "system/KestConfigIni.h"
 
 #include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/resource.h>
+#include <sys/stat.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <functional>
+#include <string>
+#include <vector>
 
 #include "common/TempSysroot.h"
+#include "support/ExclusiveFileLock.h"
 #include "system/SystemItemSysroot.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
@@ -11,7 +22,28 @@ namespace {
 using test::kWebServicePath;
 using test::ThrownStatus;
 
-TEST(KestConfigIniTest, ReadsTheSwitchAsLoadedAtConstruction) {
+constexpr char kEnabledFile[] = "[WebService]\nEnable = 1\n\n";
+constexpr char kDisabledFile[] = "[WebService]\nEnable = 0\n\n";
+
+// Replaces the settings file as another process's save does: a new file renamed over it.
+void ReplaceSettings(const kest::test::TempSysroot& sysroot, const std::string& content) {
+    sysroot.WriteFile("/etc/korvane/share/other.new", content);
+    ASSERT_EQ(0, std::rename(sysroot.PathOf("/etc/korvane/share/other.new").c_str(),
+                             sysroot.PathOf(kWebServicePath).c_str()));
+}
+
+// Runs `body` in a child process; its exit status (-1 when it did not exit).
+int InChild(const std::function<int()>& body) {
+    const pid_t child = fork();
+    if (child == 0) {
+        _exit(body());
+    }
+    int status = 0;
+    waitpid(child, &status, 0);
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+TEST(KestConfigIniTest, ReadsTheSwitchAsTheFileHoldsIt) {
     struct Case {
         const char* content;  // null: no file
         bool enabled;
@@ -33,35 +65,74 @@ TEST(KestConfigIniTest, ReadsTheSwitchAsLoadedAtConstruction) {
         }
         KestConfigIni settings;
         EXPECT_EQ(c.enabled, settings.IsWebServiceEnabled()) << (c.content ? c.content : "none");
-        sysroot.WriteFile(kWebServicePath, "[WebService]\nEnable = 1\n");
-        EXPECT_EQ(c.enabled, settings.IsWebServiceEnabled()) << "the file is read only once";
+        sysroot.MakeDirectory("/etc/korvane/share");
+        ReplaceSettings(sysroot, c.enabled ? kDisabledFile : kEnabledFile);
+        EXPECT_EQ(!c.enabled, settings.IsWebServiceEnabled()) << "a change on disk is seen";
+        ASSERT_EQ(0, unlink(sysroot.PathOf(kWebServicePath).c_str()));
+        EXPECT_FALSE(settings.IsWebServiceEnabled()) << "a removed file reads as disabled";
     }
 }
 
-TEST(KestConfigIniTest, WritesTheSwitchAndDropsComments) {
+TEST(KestConfigIniTest, WritesTheSwitchIntoTheFileAsItIsNow) {
     kest::test::TempSysroot sysroot;
     sysroot.MakeDirectory("/etc/korvane/share");
     KestConfigIni settings;
     settings.SetWebServiceEnabled(true);
     EXPECT_TRUE(settings.IsWebServiceEnabled());
-    EXPECT_EQ("[WebService]\nEnable = 1\n\n", sysroot.ReadFile(kWebServicePath));
+    EXPECT_EQ(kEnabledFile, sysroot.ReadFile(kWebServicePath));
+    // Another process saved its own section since: it stays, comments do not.
+    ReplaceSettings(sysroot, "; managed by the plug-in\n[Other]\nKey = x\n[WebService]\n");
+    settings.SetWebServiceEnabled(false);
+    EXPECT_FALSE(settings.IsWebServiceEnabled());
+    EXPECT_EQ("[Other]\nKey = x\n\n[WebService]\nEnable = 0\n\n",
+              sysroot.ReadFile(kWebServicePath));
+}
 
-    sysroot.WriteFile(kWebServicePath, "; managed by the plug-in\n[WebService]\nEnable = 1\n");
-    KestConfigIni reloaded;
-    reloaded.SetWebServiceEnabled(false);
-    EXPECT_FALSE(reloaded.IsWebServiceEnabled());
-    EXPECT_EQ("[WebService]\nEnable = 0\n\n", sysroot.ReadFile(kWebServicePath));
+// A settings file that exists but cannot be read (another encoding, a directory, a FIFO that
+// would block a reader) is refused and left as it is; once readable again, saving works.
+TEST(KestConfigIniTest, AFileThatCannotBeReadIsNeverOverwritten) {
+    const std::string utf16("\xFF\xFE[\0W\0]\0", 8);
+    for (const char* kind : {"utf16", "directory", "fifo"}) {
+        kest::test::TempSysroot sysroot;
+        const std::string path = sysroot.PathOf(kWebServicePath);
+        sysroot.WriteFile(kWebServicePath, utf16);
+        if (std::string(kind) != "utf16") {
+            ASSERT_EQ(0, unlink(path.c_str()));
+            ASSERT_EQ(0, std::string(kind) == "fifo" ? mkfifo(path.c_str(), 0600)
+                                                     : mkdir(path.c_str(), 0700));
+        }
+        KestConfigIni settings;
+        EXPECT_FALSE(settings.IsWebServiceEnabled()) << kind;
+        EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(true); })) << kind;
+        struct stat status;
+        ASSERT_EQ(0, lstat(path.c_str(), &status));
+        if (std::string(kind) == "utf16") {
+            EXPECT_EQ(utf16, sysroot.ReadFile(kWebServicePath));
+        } else {
+            EXPECT_TRUE(S_ISFIFO(status.st_mode) || S_ISDIR(status.st_mode)) << kind;
+            ASSERT_EQ(0, std::string(kind) == "fifo" ? unlink(path.c_str()) : rmdir(path.c_str()));
+        }
+        sysroot.WriteFile(kWebServicePath, "[Other]\nKey = x\n");
+        settings.SetWebServiceEnabled(true);
+        EXPECT_EQ("[Other]\nKey = x\n\n[WebService]\nEnable = 1\n\n",
+                  sysroot.ReadFile(kWebServicePath));
+    }
 }
 
 TEST(KestConfigIniTest, AFailedSaveKeepsTheFileAndForgetsTheChange) {
     kest::test::TempSysroot sysroot;
-    sysroot.WriteFile(kWebServicePath, "[WebService]\nEnable = 1\n");
-    KestConfigIni settings;
-    // The temporary file of the safe replacement cannot be created.
-    sysroot.MakeDirectory("/etc/korvane/share/vqkest.TMP");
-    EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(false); }));
-    EXPECT_TRUE(settings.IsWebServiceEnabled());
-    EXPECT_EQ("[WebService]\nEnable = 1\n", sysroot.ReadFile(kWebServicePath));
+    sysroot.WriteFile(kWebServicePath, kEnabledFile);
+    // No file may grow in the child, so the temporary cannot be written.
+    EXPECT_EQ(0, InChild([] {
+                  signal(SIGXFSZ, SIG_IGN);
+                  rlimit limit{0, 0};
+                  setrlimit(RLIMIT_FSIZE, &limit);
+                  KestConfigIni settings;
+                  bool refused =
+                      ThrownStatus([&] { settings.SetWebServiceEnabled(false); }) == E_FAIL;
+                  return refused && settings.IsWebServiceEnabled() ? 0 : 1;
+              }));
+    EXPECT_EQ(kEnabledFile, sysroot.ReadFile(kWebServicePath));
 }
 
 TEST(KestConfigIniTest, AFailedFirstSaveLeavesTheSwitchDisabled) {
@@ -71,6 +142,86 @@ TEST(KestConfigIniTest, AFailedFirstSaveLeavesTheSwitchDisabled) {
     KestConfigIni settings;
     EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(true); }));
     EXPECT_FALSE(settings.IsWebServiceEnabled());
+}
+
+// A save waits while another process holds the turn, and then saves into what that process left.
+TEST(KestConfigIniTest, SavesOfSeveralProcessesTakeTurns) {
+    kest::test::TempSysroot sysroot;
+    sysroot.MakeDirectory("/etc/korvane/share");
+    int ready[2];
+    ASSERT_EQ(0, pipe(ready));
+    const pid_t holder = fork();
+    if (holder == 0) {
+        vq::dsc::osdep::ExclusiveFileLock turn(sysroot.PathOf(kWebServicePath) + ".lock");
+        char byte = 'r';
+        (void)!write(ready[1], &byte, 1);
+        usleep(200000);  // a save that does not wait for the turn finishes meanwhile
+        ReplaceSettings(sysroot, "[Other]\nKey = x\n");
+        _exit(0);
+    }
+    char byte = 0;
+    ASSERT_EQ(1, read(ready[0], &byte, 1));
+    KestConfigIni settings;
+    settings.SetWebServiceEnabled(true);
+    int status = 0;
+    ASSERT_EQ(holder, waitpid(holder, &status, 0));
+    close(ready[0]);
+    close(ready[1]);
+    EXPECT_EQ("[Other]\nKey = x\n\n[WebService]\nEnable = 1\n\n",
+              sysroot.ReadFile(kWebServicePath));
+}
+
+// Processes switching the web service at the same moment, starting with no file: every save
+// succeeds, and a reader sampling the file never sees it empty, partial or gone once it exists.
+TEST(KestConfigIniTest, ParallelSavesLeaveAWholeFileAtEveryMoment) {
+    constexpr int kProcesses = 6;
+    constexpr int kSaves = 30;
+    kest::test::TempSysroot sysroot;
+    sysroot.MakeDirectory("/etc/korvane/share");
+    std::vector<pid_t> savers;
+    for (int p = 0; p < kProcesses; ++p) {
+        const pid_t child = fork();
+        if (child == 0) {
+            KestConfigIni settings;
+            int failures = 0;
+            for (int save = 0; save < kSaves; ++save) {
+                try {
+                    settings.SetWebServiceEnabled((save + p) % 2 == 0);
+                } catch (long) {
+                    ++failures;
+                }
+            }
+            _exit(failures);
+        }
+        savers.push_back(child);
+    }
+    int wholeSamples = 0;
+    int badSamples = 0;
+    std::string bad;
+    size_t finished = 0;
+    std::vector<int> statuses;
+    while (finished < savers.size()) {
+        FILE* file = std::fopen(sysroot.PathOf(kWebServicePath).c_str(), "rb");
+        if (file != nullptr) {
+            char buffer[256];
+            const std::string content(buffer, std::fread(buffer, 1, sizeof buffer, file));
+            std::fclose(file);
+            const bool whole = content == kEnabledFile || content == kDisabledFile;
+            wholeSamples += whole;
+            badSamples += !whole;
+            bad = whole ? bad : content;
+        } else {
+            badSamples += wholeSamples > 0;
+        }
+        int status = 0;
+        if (waitpid(-1, &status, WNOHANG) > 0) {
+            ++finished;
+            statuses.push_back(WIFEXITED(status) ? WEXITSTATUS(status) : -1);
+        }
+    }
+    EXPECT_EQ(std::vector<int>(kProcesses, 0), statuses) << "failed saves per process";
+    EXPECT_EQ(0, badSamples) << "of " << wholeSamples << " whole samples; last bad: '" << bad
+                             << "'";
 }
 
 }  // namespace

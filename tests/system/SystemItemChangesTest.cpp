@@ -88,11 +88,23 @@ TEST_F(SystemItemChangesTest, StopsAtTheFirstRejectionWithItsStatusAndMessage) {
          L"Timezone not supported."},
         {"Olson zone", SystemTag::kOlsonTimeZone, L"Mars/Olympus", ConvertStatusCode(-375523),
          L"(none)"},
+        {"Olson zone leading out", SystemTag::kOlsonTimeZone, L"../x", UX_E_VALUE_INVALID,
+         L"Timezone not supported."},
+        {"Olson zone from the root", SystemTag::kOlsonTimeZone, L"/usr/share/x", UX_E_VALUE_INVALID,
+         L"Timezone not supported."},
+        {"Olson zone with a line break", SystemTag::kOlsonTimeZone, L"Europe/Berlin\n",
+         UX_E_VALUE_INVALID, L"Timezone not supported."},
+        {"legacy zone with a parent part", SystemTag::kLegacyTimeZone, L"PST8PDT/..",
+         UX_E_VALUE_INVALID, L"Timezone not supported."},
+        {"comment with a control character", SystemTag::kComment, L"rack\x1b[2J",
+         UX_E_VALUE_INVALID, L"Comment cannot contain control characters."},
         {"time before 1970", SystemTag::kCurrentTime, nullptr, UX_E_VALUE_INVALID,
          L"Timestamps older than 1970 are not supported."},
         {"web switch of another type", SystemTag::kWebServiceEnabled, L"1",
          UX_E_PROPERTY_TYPE_MISMATCH, L"(none)"},
     };
+    // Names that lead out of the zone directory would find a zone file there.
+    sysroot_.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
         changes_ = CreatePropertyBag();
         changes_->SetString(SystemTag::kHostName, L"kest-02");
@@ -130,6 +142,7 @@ TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
         std::vector<std::string> setters;
         int32_t persistFlag;
         HRESULT result = S_OK;
+        const char* faults = "";
     };
     const Case cases[] = {
         {"host name and comment",
@@ -139,18 +152,37 @@ TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
         {"comment only", {{SystemTag::kComment, L"spare"}}, {"SetUserComment\t0\tspare"}, 0},
         {"locale", {{SystemTag::kLocaleCode, L"fr"}}, {"SetLanguageName\t0\tfr"}, 1},
         {"failing locale after host name",
-         {{SystemTag::kHostName, L"kest-02"}, {SystemTag::kLocaleCode, L"xx"}},
-         {"SetHostName\t0\tkest-02", "SetLanguageName\t-375523\txx"},
+         {{SystemTag::kHostName, L"kest-02"}, {SystemTag::kLocaleCode, L"fr"}},
+         {"SetHostName\t0\tkest-02", "SetLanguageName\t-375523\tfr"},
          1,
-         ConvertStatusCode(-375523)},
+         ConvertStatusCode(-375523),
+         "[Faults]\nSetLanguageName = -375523\n"},
+        // Persisting without validating first: a rejected value stops everything.
+        {"host name with a line break",
+         {{SystemTag::kHostName, L"kest\n02; reboot"}},
+         {},
+         0,
+         UX_E_HOSTNAME_INVALID},
+        {"Olson zone leading out",
+         {{SystemTag::kOlsonTimeZone, L"../x"}},
+         {},
+         0,
+         UX_E_VALUE_INVALID},
+        {"comment with a control character after a good host name",
+         {{SystemTag::kHostName, L"kest-02"}, {SystemTag::kComment, L"rack\x7f"}},
+         {},
+         0,
+         UX_E_VALUE_INVALID},
+        {"unsupported locale", {{SystemTag::kLocaleCode, L"xx"}}, {}, 0, UX_E_VALUE_INVALID},
         {"Olson zone",
          {{SystemTag::kOlsonTimeZone, L"Europe/Berlin"}},
          {"SetTimeZone\t0\tEurope/Berlin"},
          0},
         {"unchanged legacy zone", {{SystemTag::kLegacyTimeZone, L"CST6CDT"}}, {}, 0},
     };
+    sysroot_.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
-        WriteState(test::SystemState());
+        WriteState(test::SystemState({}, c.faults));
         sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
         changes_ = CreatePropertyBag();
         for (const auto& [tag, text] : c.texts) {
@@ -193,6 +225,10 @@ TEST_F(SystemItemChangesTest, CorrectsTheClockByTheLegacyOffsetDifference) {
         {"America/Chicago", L"PST8PDT", "1700028800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
         {"EST5EDT", L"PST8PDT", "1700010800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
         {"PST8PDT", L"EST5EDT", "1699989200 0\n", "SetTimeZone\t0\tAmerica/New_York"},
+        // Spellings the time-zone table accepts get the same correction.
+        {"America/Chicago", L"pst8pdt", "1700028800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
+        {"America/Chicago", L" PST8PDT  ", "1700028800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
+        {"EST5EDT", L"  Pst8Pdt ", "1700010800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
     };
     for (const Case& c : cases) {
         WriteState(test::SystemState({{"TimeZone", c.currentZone}}));

@@ -60,12 +60,16 @@ TEST(HostNameRule, JudgesLengthEndsCharactersAndDigitsInThatOrder) {
     }
 }
 
-TEST(CommentRule, CountsBytesOfTheNarrowText) {
+TEST(CommentRule, CountsBytesOfTheNarrowTextAndRefusesControlCharacters) {
     const wchar_t* message = L"Comment length cannot exceed 64 characters.";
+    const wchar_t* control = L"Comment cannot contain control characters.";
     const Case cases[] = {
         {"64 bytes", std::string(64, 'c'), S_OK, nullptr},
         {"65 bytes", std::string(65, 'c'), UX_E_VALUE_INVALID, message},
         {"empty", "", S_OK, nullptr},
+        {"line break", "rack\n4", UX_E_VALUE_INVALID, control},
+        {"delete", "rack 4\x7F", UX_E_VALUE_INVALID, control},
+        {"multi-byte character", "rack \xC3\xA9", S_OK, nullptr},
     };
     for (const Case& c : cases) {
         ExpectVerdict(CheckComment(c.value), c);

@@ -37,8 +37,10 @@ TEST_F(SystemTimeAssistantTest, FindsBuiltInOffsetsOfStandardAndDaylightTexts) {
         {"CUT0GDT", S_OK, 0},
         {"MART9:30MARDT", S_OK, -34200},
         {"TOT-13TDT", S_OK, 46800},
+        {"pst8pdt", S_OK, -28800},
+        {" Nst3:30ndt\t", S_OK, -12600},
         {"America/Chicago", S_FALSE, 99},
-        {"pst8pdt", S_FALSE, 99},
+        {"PST 8", S_FALSE, 99},
         {"", S_FALSE, 99},
     };
     for (const Case& c : cases) {
