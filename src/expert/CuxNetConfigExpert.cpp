@@ -24,7 +24,8 @@ namespace {
 constexpr CLSID kFrameworkExpertClassId = {
     0x722d1d51, 0x1c1d, 0x42fe, {0xae, 0xef, 0x5c, 0xf6, 0xc7, 0x11, 0xff, 0xa7}};
 
-constexpr mode_t kLogDirectoryMode = 0777;
+// Other programs log there too; the sticky bit keeps each one's files its own.
+constexpr mode_t kLogDirectoryMode = 01777;
 
 // The expert lock: held by Initialize, Uninitialize and PersistPropertyChanges of every expert of
 // the process. Recursive, because a failing Initialize calls Uninitialize while holding it.
@@ -34,10 +35,13 @@ vq::dsc::Mutex& ExpertLock() {
 }
 
 // Creates the log directory if needed, reads the diagnostics settings and starts the tracer.
+// A log directory that cannot be created or trusted leaves tracing without the log file.
 void StartDiagnostics(IniFileManager& iniCache) {
-    const std::string logDirectory = ChooseLogDirectory();
-    if (!vq::dsc::osdep::IsDirectory(logDirectory)) {
+    std::string logDirectory = ChooseLogDirectory();
+    try {
         vq::dsc::osdep::CreateDirectories(logDirectory, kLogDirectoryMode);
+    } catch (const vq::dsc::exception::Exception&) {
+        logDirectory.clear();
     }
     const DiagnosticsSettings settings =
         ReadDiagnosticsSettings(iniCache, kest::paths::DiagnosticsSettingsFile());

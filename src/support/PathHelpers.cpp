@@ -1,7 +1,10 @@
 #include "support/PathHelpers.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 
 #include "support/Exceptions.h"
@@ -29,22 +32,108 @@ int StatRetryingInterrupts(const std::string& path, struct stat& status) {
     throw PosixError(errorNumber);
 }
 
-// mkdir of one component; an existing entry is left for the caller's final check.
-void MakeDirectory(const std::string& directory, mode_t mode, const std::string& requestedPath) {
-    while (mkdir(directory.c_str(), mode) != 0) {
-        if (errno == EEXIST) {
-            return;
+// A directory descriptor closed when it goes out of scope.
+class DirectoryDescriptor {
+  public:
+    explicit DirectoryDescriptor(int descriptor) : descriptor_(descriptor) {}
+    ~DirectoryDescriptor() {
+        if (descriptor_ >= 0) {
+            close(descriptor_);
         }
-        if (errno != EINTR) {
+    }
+    DirectoryDescriptor(const DirectoryDescriptor&) = delete;
+    DirectoryDescriptor& operator=(const DirectoryDescriptor&) = delete;
+    int Get() const { return descriptor_; }
+    int Release() {
+        const int descriptor = descriptor_;
+        descriptor_ = -1;
+        return descriptor;
+    }
+    void Reset(int descriptor) {
+        if (descriptor_ >= 0) {
+            close(descriptor_);
+        }
+        descriptor_ = descriptor;
+    }
+
+  private:
+    int descriptor_;
+};
+
+constexpr int kDirectoryOpenFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
+constexpr int kCreateAttempts = 8;
+
+int OpenAtRetryingInterrupts(int parent, const std::string& name, int flags) {
+    int descriptor;
+    do {
+        descriptor = openat(parent, name.c_str(), flags);
+    } while (descriptor < 0 && errno == EINTR);
+    return descriptor;
+}
+
+bool OwnedByRootOrUs(const struct stat& status) {
+    return status.st_uid == 0 || status.st_uid == geteuid();
+}
+
+// Opens the entry `name` of `parent` when it is a symbolic link that only root or this user
+// could have placed: the link is theirs and nobody else may write its directory. Otherwise -1,
+// with errno ELOOP for another link and `openError` (why the entry did not open) for the rest.
+int OpenTrustedLink(int parent, const std::string& name, int openError) {
+    struct stat link {};
+    struct stat directory {};
+    if (fstatat(parent, name.c_str(), &link, AT_SYMLINK_NOFOLLOW) != 0 || !S_ISLNK(link.st_mode)) {
+        errno = openError;
+        return -1;
+    }
+    if (!OwnedByRootOrUs(link) || fstat(parent, &directory) != 0 ||
+        (directory.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
+        errno = ELOOP;
+        return -1;
+    }
+    return OpenAtRetryingInterrupts(parent, name, kDirectoryOpenFlags);
+}
+
+// Opens the directory `name` below `parent`, creating it with `mode` when it is missing. An
+// existing entry must be a directory owned by root or this user; a symbolic link counts only as
+// OpenTrustedLink allows. Returns the descriptor or raises the failure.
+int OpenOrCreateLevel(int parent, const std::string& name, mode_t mode,
+                      const std::string& requestedPath) {
+    bool created = false;
+    int descriptor = -1;
+    // Someone who keeps removing the new directory before it is opened gets a failure, not a
+    // loop without end.
+    for (int attempt = 0; attempt < kCreateAttempts; ++attempt) {
+        descriptor = OpenAtRetryingInterrupts(parent, name, kDirectoryOpenFlags | O_NOFOLLOW);
+        // With O_DIRECTORY a link gives ENOTDIR rather than ELOOP.
+        if (descriptor < 0 && (errno == ELOOP || errno == ENOTDIR)) {
+            descriptor = OpenTrustedLink(parent, name, errno);
+        }
+        if (descriptor >= 0 || errno != ENOENT) {
+            break;
+        }
+        if (mkdirat(parent, name.c_str(), mode & 0777) == 0) {
+            created = true;
+        } else if (errno != EEXIST && errno != EINTR) {
             ThrowPathFailure(errno, requestedPath);
         }
     }
-    // mkdir applies the process's umask; chmod gives the directory exactly the requested mode.
-    while (chmod(directory.c_str(), mode) != 0) {
-        if (errno != EINTR) {
-            ThrowPathFailure(errno, requestedPath);
-        }
+    if (descriptor < 0) {
+        ThrowPathFailure(errno, requestedPath);
     }
+    DirectoryDescriptor level(descriptor);
+    struct stat status {};
+    if (fstat(level.Get(), &status) != 0) {
+        ThrowPathFailure(errno, requestedPath);
+    }
+    if (!OwnedByRootOrUs(status)) {
+        throw PosixError("Directory belongs to another user: " + requestedPath, EPERM);
+    }
+    // mkdirat applies the umask and cannot set the sticky bit: the mode is set exactly on the
+    // descriptor, never by name, so a swapped entry cannot redirect it.
+    if (created && status.st_uid == geteuid() && fchmod(level.Get(), mode) != 0) {
+        ThrowPathFailure(errno, requestedPath);
+    }
+    return level.Release();
 }
 
 }  // namespace
@@ -92,23 +181,29 @@ void CreateDirectories(const std::string& path, mode_t mode) {
     if (!IsAbsolutePath(path)) {
         throw exception::InvalidArgument();
     }
-    std::string::size_type end = 0;
-    while (end != std::string::npos) {
-        end = path.find('/', end + 1);
-        const std::string directory = path.substr(0, end);
-        if (directory.back() != '/') {
-            MakeDirectory(directory, mode, path);
+    DirectoryDescriptor current(OpenAtRetryingInterrupts(AT_FDCWD, "/", kDirectoryOpenFlags));
+    if (current.Get() < 0) {
+        ThrowPathFailure(errno, path);
+    }
+    std::string::size_type start = 1;
+    std::string::size_type lastStart = std::string::npos;
+    while (start < path.size()) {
+        const std::string::size_type end = std::min(path.find('/', start), path.size());
+        if (end > start) {
+            const std::string name = path.substr(start, end - start);
+            current.Reset(OpenOrCreateLevel(current.Get(), name, mode, path));
+            lastStart = start;
         }
+        start = end + 1;
     }
-    // An existing entry that is no directory (a regular file at the end) is a failure, not a
-    // success: the caller asked for a directory there.
+    // A shared directory left world-writable without the sticky bit lets anyone remove or
+    // rename the entries of others: add the bit when the directory is ours.
     struct stat status {};
-    const int errorNumber = StatRetryingInterrupts(path, status);
-    if (errorNumber != 0) {
-        ThrowPathFailure(errorNumber, path);
-    }
-    if (!S_ISDIR(status.st_mode)) {
-        throw PosixError(ENOTDIR);
+    if (lastStart != std::string::npos && (mode & S_ISVTX) != 0 &&
+        fstat(current.Get(), &status) == 0 && status.st_uid == geteuid() &&
+        (status.st_mode & S_IWOTH) != 0 && (status.st_mode & S_ISVTX) == 0 &&
+        fchmod(current.Get(), (status.st_mode & 07777) | S_ISVTX) != 0) {
+        ThrowPathFailure(errno, path);
     }
 }
 

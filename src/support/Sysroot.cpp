@@ -5,6 +5,9 @@
 namespace kest {
 namespace {
 
+// Set by the build: without the seam, KEST_SYSROOT is never read.
+constexpr bool kSysrootSeam = KEST_SYSROOT_SEAM != 0;
+
 // The value of an environment variable when it holds an absolute path, else empty. Uses
 // secure_getenv so that a privileged process ignores a caller's redirection.
 std::string AbsolutePathFromEnvironment(const char* name) {
@@ -18,10 +21,13 @@ std::string AbsolutePathFromEnvironment(const char* name) {
 }  // namespace
 
 bool HasSysroot() {
-    return !AbsolutePathFromEnvironment("KEST_SYSROOT").empty();
+    return kSysrootSeam && !AbsolutePathFromEnvironment("KEST_SYSROOT").empty();
 }
 
 std::string SysrootDirectory() {
+    if (!kSysrootSeam) {
+        return std::string();
+    }
     std::string directory = AbsolutePathFromEnvironment("KEST_SYSROOT");
     while (!directory.empty() && directory.back() == '/') {
         directory.pop_back();

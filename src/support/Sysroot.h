@@ -1,7 +1,8 @@
 // Every fixed absolute path of the system, declared once. When the environment variable
 // KEST_SYSROOT holds an absolute path, each one is resolved under that directory, so tests and
 // demonstrations run against a private tree instead of the machine. The environment is read at
-// every call, so a change takes effect at once.
+// every call, so a change takes effect at once. A build with the CMake option KEST_SYSROOT_SEAM
+// off never reads KEST_SYSROOT: every path is used as it stands.
 #pragma once
 
 #include <string>

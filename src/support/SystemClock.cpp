@@ -1,5 +1,6 @@
 #include "support/SystemClock.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/time.h>
 #include <unistd.h>
@@ -18,7 +19,7 @@ namespace {
 class TemporaryFile {
   public:
     explicit TemporaryFile(std::string pathTemplate) : path_(std::move(pathTemplate)) {
-        descriptor_ = mkstemp(&path_[0]);
+        descriptor_ = mkostemp(&path_[0], O_CLOEXEC);
         if (descriptor_ < 0) {
             throw vq::dsc::osdep::PosixError();
         }

@@ -37,7 +37,7 @@ struct FileCloser {
 // The first line of the firmware version file, without its line end; E_FAIL (a long) when the
 // file cannot be opened or read.
 std::wstring ReadFirmwareVersion() {
-    std::unique_ptr<FILE, FileCloser> file(std::fopen(kest::paths::VersionFile().c_str(), "r"));
+    std::unique_ptr<FILE, FileCloser> file(std::fopen(kest::paths::VersionFile().c_str(), "re"));
     if (!file) {
         throw static_cast<long>(E_FAIL);
     }

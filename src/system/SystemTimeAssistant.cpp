@@ -17,6 +17,7 @@
 #include "support/SystemClock.h"
 #include "support/TextConversion.h"
 #include "support/TraceGate.h"
+#include "support/TrustedTool.h"
 #include "system/PropertyBag2.h"
 #include "system/SystemItemTags.h"
 #include "system/SystemItemValidation.h"
@@ -56,7 +57,7 @@ void CopySystemTimeToHardwareClock() {
     vq::dsc::osdep::ExternalApplication tool;
     tool.SetEnvironment({kHardwareClockSearchPath});
     tool.StartCommandLine(
-        vq::dsc::WideFromNarrow(kest::paths::HardwareClockTool()),
+        vq::dsc::WideFromNarrow(kest::TrustedToolPath(kest::paths::HardwareClockTool())),
         adjtimeUsable ? kHardwareClockArguments : kHardwareClockArgumentsWithoutAdjtime);
     tool.Wait(static_cast<int32_t>(HardwareClockTimeLimitMs().load()), true);
     if (tool.ExitResult() != 0) {

@@ -5,6 +5,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <cerrno>
 #include <map>
 #include <mutex>
@@ -19,39 +20,41 @@ namespace vq {
 namespace dsc {
 namespace {
 
-constexpr mode_t kLockDirectoryMode = 0777;
-constexpr mode_t kLockFileMode = 0666;
-constexpr int kOpenAttempts = 3;
+constexpr mode_t kLockDirectoryMode = 01777;
+constexpr mode_t kLockFileMode = 0600;
+// The file lock is tried this often, kFileLockRetryMs apart, before the mutex gives it up.
+constexpr int kFileLockAttempts = 200;
+constexpr uint32_t kFileLockRetryMs = 5;
 
-// Opens the lock file without following a symbolic link and accepts only a regular file with
-// one link: the directory is writable by everyone, so anything else may have been planted to
-// make this process lock, or change the mode of, a file of someone else's choosing.
-int OpenLockFile(const std::string& path) {
-    int descriptor = -1;
-    for (int attempt = 1;;) {
-        descriptor = open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC,
-                          kLockFileMode);
-        if (descriptor >= 0) {
-            break;
-        }
-        if (errno == EINTR) {
-            continue;
-        }
-        if (errno != EACCES || attempt == kOpenAttempts) {
-            throw osdep::PosixError();
-        }
-        ++attempt;
-        osdep::SleepMs(1);
+int OpenRetryingInterrupts(const std::string& path, int flags, mode_t mode = 0) {
+    int descriptor;
+    do {
+        descriptor = open(path.c_str(), flags, mode);
+    } while (descriptor < 0 && errno == EINTR);
+    return descriptor;
+}
+
+// A lock file this process may use: -1, or a descriptor with `created` telling whether this
+// call created the file.
+int OpenLockFile(const std::string& path, bool& created) {
+    constexpr int kFlags = O_RDWR | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
+    created = false;
+    int descriptor = OpenRetryingInterrupts(path, kFlags | O_CREAT | O_EXCL, kLockFileMode);
+    if (descriptor >= 0) {
+        created = true;
+        return descriptor;
     }
-    struct stat status;
-    if (fstat(descriptor, &status) != 0 || !S_ISREG(status.st_mode) || status.st_nlink != 1) {
-        close(descriptor);
-        throw osdep::PosixError("Lock file is not a regular file with one link: " + path, EPERM);
+    if (errno != EEXIST) {
+        return -1;
     }
-    if (fchmod(descriptor, kLockFileMode) != 0 && errno != EPERM && errno != EACCES) {
-        int error = errno;
+    // Someone else's file, a link or anything but a plain file could let them hold the lock
+    // for ever or make this process lock a file of their choosing.
+    descriptor = OpenRetryingInterrupts(path, kFlags);
+    struct stat status {};
+    if (descriptor >= 0 && (fstat(descriptor, &status) != 0 || !S_ISREG(status.st_mode) ||
+                            status.st_nlink != 1 || status.st_uid != geteuid())) {
         close(descriptor);
-        throw osdep::PosixError(error);
+        return -1;
     }
     return descriptor;
 }
@@ -63,32 +66,85 @@ int OpenLockFile(const std::string& path) {
 // shares its file lock with the parent.
 class NamedLockState {
   public:
-    explicit NamedLockState(std::string lockFilePath)
-        : path(std::move(lockFilePath)), descriptor_(OpenLockFile(path)), openedBy_(getpid()) {}
-    ~NamedLockState() { close(descriptor_); }
+    // Without `directoryTrusted` no lock file is opened at all.
+    NamedLockState(std::string lockFilePath, bool directoryTrusted)
+        : path(std::move(lockFilePath)), openedBy_(getpid()) {
+        if (directoryTrusted) {
+            descriptor_ = OpenLockFile(path, created_);
+        }
+        usable_.store(descriptor_ >= 0);
+    }
+    ~NamedLockState() { CloseLockFile(); }
     NamedLockState(const NamedLockState&) = delete;
     NamedLockState& operator=(const NamedLockState&) = delete;
 
     // The lock file descriptor of this process, reopened first after a fork (the mutex must be
-    // held).
+    // held); -1 without a usable lock file.
     int DescriptorOfThisProcess() {
         if (openedBy_ != getpid()) {
-            int reopened = OpenLockFile(path);
-            close(descriptor_);
-            descriptor_ = reopened;
+            CloseLockFile();  // the parent's file: closed, never removed here
+            descriptor_ = OpenLockFile(path, created_);
             openedBy_ = getpid();
         }
         return descriptor_;
     }
 
-    // The descriptor the outermost Lock of this process locked.
-    int LockedDescriptor() const { return descriptor_; }
+    // Takes the file lock within the bound; false (and no file lock from then on) otherwise.
+    bool LockFile() {
+        const int descriptor = DescriptorOfThisProcess();
+        for (int attempt = 0; descriptor >= 0 && attempt < kFileLockAttempts; ++attempt) {
+            if (flock(descriptor, LOCK_EX | LOCK_NB) == 0) {
+                fileLocked_ = true;
+                return true;
+            }
+            if (errno != EWOULDBLOCK && errno != EINTR) {
+                break;
+            }
+            osdep::SleepMs(kFileLockRetryMs);
+        }
+        GiveUpFileLock();
+        return false;
+    }
+
+    void UnlockFile() {
+        if (fileLocked_) {
+            flock(descriptor_, LOCK_UN);
+            fileLocked_ = false;
+        }
+    }
+
+    bool HasFileLock() const { return usable_.load(); }
 
     const std::string path;
     Mutex mutex;
 
   private:
-    int descriptor_;
+    void GiveUpFileLock() {
+        usable_.store(false);
+        CloseLockFile();
+    }
+
+    // Closes the lock file, removing it when this very process created it and the name still
+    // is that file.
+    void CloseLockFile() {
+        if (descriptor_ < 0) {
+            return;
+        }
+        struct stat named {};
+        struct stat held {};
+        if (created_ && openedBy_ == getpid() && lstat(path.c_str(), &named) == 0 &&
+            fstat(descriptor_, &held) == 0 && named.st_dev == held.st_dev &&
+            named.st_ino == held.st_ino) {
+            unlink(path.c_str());
+        }
+        close(descriptor_);
+        descriptor_ = -1;
+    }
+
+    int descriptor_ = -1;
+    bool created_ = false;
+    bool fileLocked_ = false;
+    std::atomic<bool> usable_{true};
     pid_t openedBy_;
 };
 
@@ -101,9 +157,14 @@ class NamedLockRegistry {
         std::lock_guard<std::mutex> guard(mutex_);
         std::shared_ptr<NamedLockState> state = states_[name].lock();
         if (!state) {
-            std::string directory = kest::paths::NamedMutexDirectory();
-            osdep::CreateDirectories(directory, kLockDirectoryMode);
-            state = std::make_shared<NamedLockState>(directory + "/" + name);
+            const std::string directory = kest::paths::NamedMutexDirectory();
+            bool directoryTrusted = true;
+            try {
+                osdep::CreateDirectories(directory, kLockDirectoryMode);
+            } catch (const exception::Exception&) {
+                directoryTrusted = false;  // the state goes on without a lock file
+            }
+            state = std::make_shared<NamedLockState>(directory + "/" + name, directoryTrusted);
             states_[name] = state;
         }
         return state;
@@ -132,27 +193,20 @@ NamedMutex::~NamedMutex() = default;
 
 void NamedMutex::Lock() {
     state_->mutex.Lock();
-    if (state_->mutex.RecursionCount() > 1) {
-        return;
-    }
-    try {
-        int descriptor = state_->DescriptorOfThisProcess();
-        while (flock(descriptor, LOCK_EX) != 0) {
-            if (errno != EINTR) {
-                throw osdep::PosixError();
-            }
-        }
-    } catch (...) {
-        state_->mutex.Unlock();
-        throw;
+    if (state_->mutex.RecursionCount() == 1 && state_->HasFileLock()) {
+        state_->LockFile();
     }
 }
 
 void NamedMutex::Unlock() {
     if (state_->mutex.RecursionCount() == 1) {
-        flock(state_->LockedDescriptor(), LOCK_UN);
+        state_->UnlockFile();
     }
     state_->mutex.Unlock();
+}
+
+bool NamedMutex::HasFileLock() const {
+    return state_->HasFileLock();
 }
 
 const std::string& NamedMutex::LockFilePath() const {

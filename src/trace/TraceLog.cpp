@@ -16,16 +16,30 @@ const char* const kAbortMessage =
 
 namespace {
 
-// Opens the log for appending without following a symbolic link, and keeps it only when it is a
-// regular file with one link: the log directory may be writable by everyone, and a planted link
-// would make this process append to a file of someone else's choosing.
+constexpr mode_t kLogFileMode = 0644;
+
+// Opens the log for appending without following a symbolic link. The log directory may be
+// writable by everyone: the file is created exclusively, and an existing one is kept only when
+// it is a regular file with one link, or else a planted link would make this process append to a
+// file of someone else's choosing. Returns the descriptor, -1 when the attempt costs only the
+// line, or kRefused when the file belongs to another user (file output then stays off).
+constexpr int kRefused = -2;
+
 int OpenLogFile(const std::string& path) {
-    int descriptor;
-    do {
-        descriptor =
-            open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC,
-                 0666);
-    } while (descriptor < 0 && errno == EINTR);
+    constexpr int kFlags = O_WRONLY | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
+    constexpr int kAttempts = 3;  // an existing file may vanish before it is opened
+    int descriptor = -1;
+    for (int attempt = 0; descriptor < 0 && attempt < kAttempts; ++attempt) {
+        do {
+            descriptor = open(path.c_str(), kFlags | O_CREAT | O_EXCL, kLogFileMode);
+        } while (descriptor < 0 && errno == EINTR);
+        if (descriptor >= 0 || errno != EEXIST) {
+            break;
+        }
+        do {
+            descriptor = open(path.c_str(), kFlags);
+        } while (descriptor < 0 && errno == EINTR);
+    }
     if (descriptor < 0) {
         return -1;
     }
@@ -33,6 +47,10 @@ int OpenLogFile(const std::string& path) {
     if (fstat(descriptor, &status) != 0 || !S_ISREG(status.st_mode) || status.st_nlink != 1) {
         close(descriptor);
         return -1;
+    }
+    if (status.st_uid != geteuid()) {
+        close(descriptor);
+        return kRefused;
     }
     return descriptor;
 }
@@ -87,7 +105,7 @@ const char* TraceLog::Append(const char* line, uint32_t threshold) {
         if (threshold != 0 && SpaceIsShort(threshold)) {
             aborted_ = true;
         } else {
-            descriptor_ = OpenLogFile(path_);
+            Open();
         }
     }
     if (descriptor_ < 0) {
@@ -109,7 +127,7 @@ void TraceLog::AppendTwoLines(const char* first, const char* second) {
         return;
     }
     if (descriptor_ < 0 && !aborted_) {
-        descriptor_ = OpenLogFile(path_);
+        Open();
     }
     if (descriptor_ < 0) {
         return;
@@ -119,6 +137,14 @@ void TraceLog::AppendTwoLines(const char* first, const char* second) {
     record += second;
     record += '\n';
     WriteRecord(descriptor_, record);
+}
+
+void TraceLog::Open() {
+    descriptor_ = OpenLogFile(path_);
+    if (descriptor_ == kRefused) {
+        descriptor_ = -1;
+        aborted_ = true;
+    }
 }
 
 void TraceLog::Close() {

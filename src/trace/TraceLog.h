@@ -1,5 +1,6 @@
 // The per-process trace log file: opened by the first line written to it, closed for good when
-// the free space of its file system falls below the low-disk threshold.
+// the free space of its file system falls below the low-disk threshold or when the file at its
+// path belongs to another user.
 #pragma once
 
 #include <cstdint>
@@ -31,7 +32,8 @@ class TraceLog {
     // threshold the free space is measured before opening and before each line; when it is
     // short the log is stopped for good, with the abort message as its last line when the file
     // was open. Returns what the other outputs should write: the line, or the abort message
-    // that replaced it. A file that cannot be opened costs only the line.
+    // that replaced it. A file that cannot be opened costs only the line; one that belongs to
+    // another user stops the log for good.
     const char* Append(const char* line, uint32_t threshold);
     // Appends two lines with one write, as two Appends without a threshold would: nothing when
     // the log has no location, was stopped or cannot be opened.
@@ -41,6 +43,8 @@ class TraceLog {
     void Close();
 
   private:
+    // Opens the file, stopping the log when it belongs to another user.
+    void Open();
     bool SpaceIsShort(uint32_t threshold) const;
 
     std::string directory_;  // where free space is measured: the directory part of the path

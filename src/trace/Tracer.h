@@ -16,20 +16,20 @@ constexpr uint32_t kTraceToStandardError = 0x04;
 // creates the trace lock; with the log-file output and a non-empty directory the log path is
 // fixed once, the first time it can be: a later call changes outputs, not the path. A directory
 // or path longer than 255 bytes leaves file output off. Installs TraceLine behind
-// TraceIfEnabled and TraceStatus. Raises the runtime library's exceptions when the trace lock
-// cannot be created.
+// TraceIfEnabled and TraceStatus. A trace lock file that cannot be used leaves tracing without
+// the cross-process lock; it never fails or hangs the call.
 void InitializeTracing(uint32_t mask, uint32_t outputs, const std::wstring& directory,
                        uint32_t lowDiskThreshold);
 
 // Writes one record under the trace lock: "<kind> <text>" (cut to 2047 characters) and, with
 // `withStamp`, "  Thread = 0x<thread>, Time = <YYYYMMDD HHMMSS.mmm>". Does nothing before
-// InitializeTracing or after ShutdownTracing. Raises vq::dsc::osdep::PosixError when the trace
-// lock fails.
+// InitializeTracing or after ShutdownTracing.
 void TraceLine(char kind, const char* text, bool withStamp);
 
 // The trace mask set by the last InitializeTracing (0 before).
 uint32_t GetTraceMask();
 
-// Closes the log file and drops the trace lock; mask, outputs, threshold, log path and a stopped
-// log stay as they are, and the next InitializeTracing traces to the same path again.
+// Closes the log file and drops the trace lock, removing its lock file; mask, outputs, threshold,
+// log path and a stopped log stay as they are, and the next InitializeTracing traces to the same
+// path again.
 void ShutdownTracing();

@@ -39,6 +39,7 @@ TEST(KestcfgSimTest, InitCreatesTheControllerFilesWithTheShippedTimeZoneTable) {
     EXPECT_EQ("22.5.0\n", ReadWhole(root + "/etc/korvane/version"));
     EXPECT_EQ(ReadWhole(KESTCFG_SOURCE_DATA_DIR "/timezone.ini"),
               ReadWhole(root + "/usr/share/vqsysapi/timezone.ini"));
+    EXPECT_EQ(0700u, PermissionsOf(root));
     EXPECT_EQ(0755u, PermissionsOf(root + "/sbin/hwclock"));
     EXPECT_EQ(0755u, PermissionsOf(root + "/usr/local/korvane/bin/fwupdate"));
     const std::string state = ReadWhole(root + "/var/lib/vqtargetcfg/state.ini");
@@ -51,8 +52,17 @@ TEST(KestcfgSimTest, InitCreatesTheControllerFilesWithTheShippedTimeZoneTable) {
 TEST(KestcfgSimTest, InitNeedsANewOrEmptyDirectory) {
     kest::test::TempSysroot sysroot;
     sysroot.WriteFile("/existing", "keep me\n");
+    // Empty, but others could replace the tool stand-ins in it.
+    for (const char* open : {"/shared", "/group", "/theirs"}) {
+        sysroot.MakeDirectory(open);
+    }
+    chmod(sysroot.PathOf("/shared").c_str(), 01777);
+    chmod(sysroot.PathOf("/group").c_str(), 0770);
+    ASSERT_EQ(0, chown(sysroot.PathOf("/theirs").c_str(), 65534, 65534));
+    ASSERT_EQ(0, symlink(sysroot.PathOf("/group").c_str(), sysroot.PathOf("/link").c_str()));
     for (const std::string& directory :
-         {sysroot.Root(), sysroot.PathOf("/existing"), std::string("/")}) {
+         {sysroot.Root(), sysroot.PathOf("/existing"), std::string("/"), sysroot.PathOf("/shared"),
+          sysroot.PathOf("/group"), sysroot.PathOf("/theirs"), sysroot.PathOf("/link")}) {
         SCOPED_TRACE(directory);
         const RunResult result = RunKestcfg({"sim", "init", directory});
         EXPECT_EQ(3, result.exitCode);
@@ -60,6 +70,9 @@ TEST(KestcfgSimTest, InitNeedsANewOrEmptyDirectory) {
     }
     EXPECT_EQ("keep me\n", sysroot.ReadFile("/existing"));
     EXPECT_FALSE(sysroot.Exists("/sbin"));
+    for (const char* open : {"/shared", "/group", "/theirs"}) {
+        EXPECT_FALSE(sysroot.Exists(std::string(open) + "/sbin")) << open;
+    }
 }
 
 TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {

@@ -237,7 +237,8 @@ TEST_F(HostStateTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSig
         char exe[PATH_MAX] = {};
         for (int attempt = 0; attempt < 2000 && std::strstr(exe, "sleep") == nullptr; ++attempt) {
             std::fill(std::begin(exe), std::end(exe), '\0');
-            readlink(("/proc/" + std::to_string(pid) + "/exe").c_str(), exe, sizeof exe - 1);
+            static_cast<void>(
+                readlink(("/proc/" + std::to_string(pid) + "/exe").c_str(), exe, sizeof exe - 1));
             usleep(5000);
         }
         ASSERT_NE(std::strstr(exe, "sleep"), nullptr) << "the program never ran";

@@ -89,12 +89,35 @@ TEST_F(PathHelpersTest, CreateDirectoriesGivesEveryNewComponentTheMode) {
     chmod(At("/dir").c_str(), 0750);
     EXPECT_NO_THROW(CreateDirectories(At("/dir/new")));
     EXPECT_EQ(ModeOf(At("/dir")), 0750u) << "an existing directory keeps its mode";
+    CreateDirectories(At("/shared/tree"), 01777);
+    EXPECT_EQ(ModeOf(At("/shared")), 01777u);
+    chmod(At("/dir").c_str(), 0777);
+    CreateDirectories(At("/dir"), 01777);
+    EXPECT_EQ(ModeOf(At("/dir")), 01777u) << "a shared directory of ours gets the sticky bit";
+    // A link root placed in a directory only root may write is followed.
+    ASSERT_EQ(symlink(At("/dir").c_str(), At("/w/trusted").c_str()), 0);
+    EXPECT_NO_THROW(CreateDirectories(At("/w/trusted/below")));
+    EXPECT_TRUE(IsDirectory(At("/dir/below")));
 }
 
 TEST_F(PathHelpersTest, CreateDirectoriesFailures) {
     EXPECT_THROW(CreateDirectories(std::string("relative/dir")), exception::InvalidArgument);
     EXPECT_EQ(PosixErrorOf([&] { CreateDirectories(At("/file/below")); }), ENOTDIR);
     EXPECT_EQ(PosixErrorOf([&] { CreateDirectories(At("/file")); }), ENOTDIR);
+    // What another user may have placed in a directory everyone can write.
+    tree_.MakeDirectory("/open/theirs");
+    chmod(At("/open").c_str(), 01777);
+    ASSERT_EQ(chown(At("/open/theirs").c_str(), 65534, 65534), 0);
+    ASSERT_EQ(symlink(At("/dir").c_str(), At("/open/link").c_str()), 0);
+    ASSERT_EQ(symlink(At("/dir").c_str(), At("/open/theirlink").c_str()), 0);
+    ASSERT_EQ(lchown(At("/open/theirlink").c_str(), 65534, 65534), 0);
+    const std::pair<const char*, int> refused[] = {
+        {"/open/theirs/below", EPERM}, {"/open/link/below", ELOOP}, {"/open/theirlink", ELOOP}};
+    for (const auto& entry : refused) {
+        const std::string path = At(entry.first);
+        EXPECT_EQ(PosixErrorOf([&] { CreateDirectories(path); }), entry.second) << path;
+    }
+    EXPECT_FALSE(IsDirectory(At("/dir/below")));
 
     // Root may write anywhere, so an unprivileged child makes the attempt.
     chmod(tree_.Root().c_str(), 0755);

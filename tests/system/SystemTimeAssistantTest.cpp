@@ -245,6 +245,34 @@ TEST_F(ClockTest, HardwareClockGetsOnlyTheSearchPathAndATimeLimit) {
     SystemTimeAssistant::SetHardwareClockTimeLimit(std::chrono::seconds(60));
 }
 
+TEST_F(ClockTest, AToolOthersCouldChangeIsNotStarted) {
+    sysroot_.WriteFile("/dev/rtc", "");
+    sysroot_.WriteScript("/sbin/hwclock", "touch '" + sysroot_.PathOf("/ran") + "'\n");
+    const std::string tool = sysroot_.PathOf("/sbin/hwclock");
+    const std::string directory = sysroot_.PathOf("/sbin");
+    struct Case {
+        const std::string& path;
+        mode_t mode;
+        uid_t owner;
+    };
+    const Case cases[] = {{tool, 0775, 0},       {tool, 0757, 0},     {directory, 0777, 0},
+                          {directory, 01777, 0}, {tool, 0755, 65534}, {tool, 0755, 0}};
+    CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
+    bag->SetTimestamp(SystemTag::kCurrentTime, {0, kEpoch + 100});
+    for (const Case& c : cases) {
+        chmod(tool.c_str(), 0755);
+        chmod(directory.c_str(), 0755);
+        ASSERT_EQ(0, chown(tool.c_str(), 0, 0));
+        chmod(c.path.c_str(), c.mode);
+        ASSERT_EQ(0, chown(c.path.c_str(), c.owner, c.owner));
+        const bool trusted = c.mode == 0755 && c.owner == 0;
+        EXPECT_EQ(trusted ? S_OK : E_FAIL,
+                  assistant_.PersistSystemPropertyCurrentTime(bag.Get(), 0))
+            << c.path << " " << std::oct << c.mode;
+        EXPECT_EQ(trusted, sysroot_.Exists("/ran")) << c.path << " " << std::oct << c.mode;
+    }
+}
+
 TEST_F(ClockTest, TimesTheClockCannotHoldBecomeEFail) {
     CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
     bag->SetTimestamp(SystemTag::kCurrentTime, {uint64_t(1) << 63, kEpoch - 2});

@@ -1,7 +1,11 @@
+#include <fcntl.h>
+#include <signal.h>
 #include <sys/file.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
+#include <functional>
 #include <string>
 
 #include "TraceTestSupport.h"
@@ -11,6 +15,7 @@
 
 using kest::test::TempSysroot;
 using vq::dsc::NamedMutex;
+using vq::dsc::ScopedNamedLock;
 
 namespace {
 
@@ -28,16 +33,53 @@ bool FileLockIsFree(const std::string& path) {
     return free;
 }
 
-TEST(NamedMutexTest, LockFileLivesInTheSharedDirectoryWithOpenModes) {
+// Starts `body` in a child that has given up root for nobody; its exit code is body's result.
+pid_t StartAsNobody(const std::function<int()>& body) {
+    const pid_t child = fork();
+    if (child == 0) {
+        if (setgid(65534) != 0 || setuid(65534) != 0) {
+            _exit(100);
+        }
+        _exit(body());
+    }
+    return child;
+}
+
+int ExitCodeOf(pid_t child) {
+    int status = 0;
+    return waitpid(child, &status, 0) == child && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+// A sysroot whose shared temporary directory others may write, as on the controller.
+class SharedSysroot : public TempSysroot {
+  public:
+    SharedSysroot() {
+        chmod(Root().c_str(), 0755);
+        MakeDirectory("/var/tmp");
+        chmod(PathOf("/var/tmp").c_str(), 01777);
+        WriteFile("/victim", "secret");
+        chmod(PathOf("/victim").c_str(), 0600);
+    }
+};
+
+TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLastMutex) {
     TempSysroot sysroot;
     mode_t previousMask = umask(022);
+    std::string path;
     {
         NamedMutex mutex("modes.lock");
-        EXPECT_EQ(mutex.LockFilePath(), sysroot.PathOf("/var/tmp/korvane/shared/mutex/modes.lock"));
-        EXPECT_EQ(ModeOf(mutex.LockFilePath()), 0666u);
-        EXPECT_EQ(ModeOf(sysroot.PathOf("/var/tmp/korvane/shared/mutex")), 0777u);
+        NamedMutex sameName("modes.lock");
+        path = mutex.LockFilePath();
+        EXPECT_EQ(path, sysroot.PathOf("/var/tmp/korvane/shared/mutex/modes.lock"));
+        EXPECT_EQ(ModeOf(path), 0600u);
+        EXPECT_TRUE(mutex.HasFileLock());
+        for (const char* directory :
+             {"/var/tmp/korvane", "/var/tmp/korvane/shared", "/var/tmp/korvane/shared/mutex"}) {
+            EXPECT_EQ(ModeOf(sysroot.PathOf(directory)), 01777u) << directory;
+        }
     }
     umask(previousMask);
+    EXPECT_FALSE(sysroot.Exists("/var/tmp/korvane/shared/mutex/modes.lock"));
     TempSysroot shared;
     setenv("VQDSCTMPSHAREDFILEDIR", shared.Root().c_str(), 1);
     NamedMutex elsewhere("elsewhere.lock");
@@ -45,25 +87,89 @@ TEST(NamedMutexTest, LockFileLivesInTheSharedDirectoryWithOpenModes) {
     EXPECT_EQ(elsewhere.LockFilePath(), shared.Root() + "/mutex/elsewhere.lock");
 }
 
-TEST(NamedMutexTest, AnythingButAPlainRegularFileIsRefused) {
-    TempSysroot sysroot;
+TEST(NamedMutexTest, AnythingButOurOwnPlainFileLeavesTheMutexWithoutFileLock) {
+    SharedSysroot sysroot;
     std::string directory = sysroot.PathOf("/var/tmp/korvane/shared/mutex");
-    sysroot.MakeDirectory("/var/tmp/korvane/shared/mutex");
     std::string victim = sysroot.PathOf("/victim");
-    sysroot.WriteFile("/victim", "secret");
-    ASSERT_EQ(chmod(victim.c_str(), 0600), 0);
+    { NamedMutex create("create.lock"); }
     ASSERT_EQ(symlink(victim.c_str(), (directory + "/symlink.lock").c_str()), 0);
     ASSERT_EQ(link(victim.c_str(), (directory + "/hardlink.lock").c_str()), 0);
     ASSERT_EQ(mkfifo((directory + "/fifo.lock").c_str(), 0666), 0);
     ASSERT_EQ(mkdir((directory + "/directory.lock").c_str(), 0777), 0);
-    for (const char* name : {"symlink.lock", "hardlink.lock", "fifo.lock", "directory.lock"}) {
-        EXPECT_THROW(NamedMutex mutex(name), vq::dsc::osdep::PosixError) << name;
+    ASSERT_EQ(0, ExitCodeOf(StartAsNobody(
+                     [&] { return close(creat((directory + "/foreign.lock").c_str(), 0666)); })));
+    for (const char* name :
+         {"symlink.lock", "hardlink.lock", "fifo.lock", "directory.lock", "foreign.lock"}) {
+        NamedMutex mutex(name);
+        EXPECT_FALSE(mutex.HasFileLock()) << name;
+        ScopedNamedLock stillOrdersThreads(mutex);
     }
     EXPECT_EQ(ModeOf(victim), 0600u);
+    EXPECT_TRUE(sysroot.Exists("/var/tmp/korvane/shared/mutex/foreign.lock"));
     EXPECT_THROW(NamedMutex mutex("../escape"), vq::dsc::exception::InvalidArgument);
     TempSysroot blocked;
     blocked.WriteFile("/var/tmp/korvane/shared/mutex", "a file where the directory belongs");
-    EXPECT_THROW(NamedMutex mutex("blocked.lock"), vq::dsc::osdep::PosixError);
+    EXPECT_FALSE(NamedMutex("blocked.lock").HasFileLock());
+}
+
+// Another user renames the shared directory away and puts a link to a root file in its place,
+// again and again, while the mutex directories are created over and over.
+TEST(NamedMutexTest, DirectorySwapsOfAnotherUserNeverReachTheirTarget) {
+    SharedSysroot sysroot;
+    sysroot.MakeDirectory("/var/tmp/korvane/shared");
+    // As an earlier installation left it: writable by everyone, without the sticky bit.
+    chmod(sysroot.PathOf("/var/tmp/korvane").c_str(), 0777);
+    const std::string shared = sysroot.PathOf("/var/tmp/korvane/shared");
+    const std::string victim = sysroot.PathOf("/victim");
+    const pid_t attacker = StartAsNobody([&] {
+        for (int round = 0;; ++round) {
+            rename(shared.c_str(), (shared + std::to_string(round)).c_str());
+            unlink(shared.c_str());
+            symlink(victim.c_str(), shared.c_str());
+            unlink(shared.c_str());
+            mkdir(shared.c_str(), 0777);
+            rename(shared.c_str(), (shared + std::to_string(round)).c_str());
+            symlink(victim.c_str(), shared.c_str());
+        }
+        return 0;
+    });
+    for (int start = 0; start < 200; ++start) {
+        NamedMutex mutex("race" + std::to_string(start) + ".lock");
+        ScopedNamedLock lock(mutex);
+    }
+    kill(attacker, SIGKILL);
+    waitpid(attacker, nullptr, 0);
+    EXPECT_EQ(ModeOf(victim), 0600u);
+    EXPECT_EQ(sysroot.ReadFile("/victim"), "secret");
+}
+
+// A lock file left readable by an earlier installation, locked by another user for good: no
+// Lock waits beyond the bound, and the mutex goes on without the file lock.
+TEST(NamedMutexTest, AFileLockHeldByAnotherUserCostsOneBoundedWait) {
+    SharedSysroot sysroot;
+    NamedMutex mutex("held.lock");
+    ASSERT_EQ(chmod(mutex.LockFilePath().c_str(), 0666), 0);
+    int ready[2];
+    ASSERT_EQ(pipe(ready), 0);
+    const pid_t holder = StartAsNobody([&] {
+        const int descriptor = open(mutex.LockFilePath().c_str(), O_RDONLY);
+        const char taken = flock(descriptor, LOCK_EX) == 0 ? 'y' : 'n';
+        (void)!write(ready[1], &taken, 1);
+        pause();
+        return 0;
+    });
+    char taken = 0;
+    ASSERT_EQ(read(ready[0], &taken, 1), 1);
+    ASSERT_EQ(taken, 'y');
+    mutex.Lock();
+    mutex.Unlock();
+    EXPECT_FALSE(mutex.HasFileLock());
+    mutex.Lock();
+    mutex.Unlock();
+    kill(holder, SIGKILL);
+    waitpid(holder, nullptr, 0);
+    close(ready[0]);
+    close(ready[1]);
 }
 
 TEST(NamedMutexTest, FileLockIsHeldUntilTheOutermostUnlock) {

@@ -246,6 +246,26 @@ TEST(TracerTest, PlantedLinksAtTheLogPathAreNeverFollowed) {
     });
 }
 
+TEST(TracerTest, ALogFileOfAnotherUserTurnsFileOutputOffForGood) {
+    RunInChild([] {
+        TracerFixture fixture;
+        InitializeTracing(kTraceErrors, kTraceToStandardError, L"", 0);
+        std::vector<std::string> locks =
+            EntriesOf(fixture.Sysroot().PathOf("/var/tmp/korvane/shared/mutex"));
+        ASSERT_EQ(locks.size(), 1u);
+        fixture.Sysroot().WriteFile("/log/" + locks[0], "theirs\n");
+        const std::string logPath = fixture.LogDirectory() + "/" + locks[0];
+        ASSERT_EQ(chown(logPath.c_str(), 65534, 65534), 0);
+        InitializeTracing(kTraceErrors, kTraceToLogFile | kTraceToStandardError,
+                          Wide(fixture.LogDirectory()), 0);
+        TraceLine(' ', "refused", false);
+        ASSERT_EQ(unlink(logPath.c_str()), 0);
+        TraceLine(' ', "still off", false);
+        EXPECT_EQ(fixture.Errors().Text(), "  refused\n  still off\n");
+        EXPECT_TRUE(fixture.LogFiles().empty());
+    });
+}
+
 TEST(TracerTest, ProcessesTracingToOneLogNeverInterleaveInsideARecord) {
     RunInChild([] {
         TracerFixture fixture;

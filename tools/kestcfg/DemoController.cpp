@@ -98,10 +98,14 @@ bool Exists(const std::string& path) {
     return stat(path.c_str(), &status) == 0;
 }
 
-// True when the directory has no entries; false when it cannot be read.
-bool IsEmptyDirectory(const std::string& path) {
-    DIR* directory = opendir(path.c_str());
+// True when the directory open at `descriptor` has no entries; false when it cannot be read.
+bool IsEmptyDirectory(int descriptor) {
+    const int listed = fcntl(descriptor, F_DUPFD_CLOEXEC, 0);
+    DIR* directory = listed >= 0 ? fdopendir(listed) : nullptr;
     if (directory == nullptr) {
+        if (listed >= 0) {
+            close(listed);
+        }
         return false;
     }
     bool empty = true;
@@ -113,6 +117,34 @@ bool IsEmptyDirectory(const std::string& path) {
     }
     closedir(directory);
     return empty;
+}
+
+// Makes `root` the demo controller's directory: creates it with mode 0700, or accepts an
+// existing one only when it is an empty directory of the caller that neither group nor others
+// may write. Anyone else able to change the tree could replace the tool stand-ins, which run as
+// the plug-in's user.
+void PrepareRootDirectory(const std::string& root) {
+    const std::string::size_type slash = root.find_last_of('/');
+    if (slash != std::string::npos && slash > 0) {
+        MakeDirectories(root.substr(0, slash));
+    }
+    const bool created = mkdir(root.c_str(), 0700) == 0;
+    if (!created && errno != EEXIST) {
+        throw Failure(SystemError("cannot create the directory", root));
+    }
+    const int descriptor = open(root.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    struct stat status {};
+    const bool usable = descriptor >= 0 && fstat(descriptor, &status) == 0 &&
+                        status.st_uid == geteuid() && (status.st_mode & (S_IWGRP | S_IWOTH)) == 0 &&
+                        IsEmptyDirectory(descriptor);
+    if (descriptor >= 0) {
+        close(descriptor);
+    }
+    if (!usable) {
+        throw Failure(root +
+                      " is not a new or empty directory of yours that only you may write; sim "
+                      "init needs one (mktemp -d makes one)");
+    }
 }
 
 std::string ReadWhole(const std::string& path) {
@@ -227,10 +259,7 @@ std::vector<std::string> CreateDemoController(const std::string& root,
                                               const std::string& timeZoneTable) {
     // Only a new or empty directory: the tree holds stand-ins for system tools, which must
     // never land on a machine's own paths or mix with other files.
-    MakeDirectories(root);
-    if (!IsEmptyDirectory(root)) {
-        throw Failure(root + " is not an empty directory; sim init needs a new or empty one");
-    }
+    PrepareRootDirectory(root);
     const std::string zones = ReadWhole(timeZoneTable);
 
     TreeWriter tree(root);

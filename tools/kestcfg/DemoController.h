@@ -10,8 +10,9 @@
 // searched.
 std::string FindTimeZoneTable();
 
-// Creates the demo controller under `root`, creating the directory when missing, and returns
-// the system paths of the files written. Throws a failure when `root` is not a new or empty
-// directory or a file cannot be written. `root` must be absolute.
+// Creates the demo controller under `root`, creating the directory (mode 0700) when missing,
+// and returns the system paths of the files written. Throws a failure when `root` is not a new
+// directory or an empty one of the caller that neither group nor others may write, or when a
+// file cannot be written. `root` must be absolute.
 std::vector<std::string> CreateDemoController(const std::string& root,
                                               const std::string& timeZoneTable);
