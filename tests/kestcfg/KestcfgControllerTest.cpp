@@ -214,6 +214,19 @@ TEST_F(KestcfgControllerTest, APersistFailingPartWayReportsWhatWasStoredWithStat
     }
 }
 
+TEST_F(KestcfgControllerTest, AChangeTheControllerDoesNotStoreIsReportedWithStatus5) {
+    // The controller keeps its TCP/IP mode when asked to switch to another TCP/IP mode.
+    sysroot_.WriteFile(kStatePath, std::regex_replace(State(), std::regex("SupportedModes = 0x0B"),
+                                                      "SupportedModes = 0x6B"));
+    const RunResult result = RunKestcfg({"set", "eth0", "adapter-mode=0x20"});
+    EXPECT_EQ(5, result.exitCode);
+    EXPECT_EQ("", result.out);
+    EXPECT_NE(std::string::npos,
+              result.err.find("kestcfg: eth0: adapter-mode was not stored (it is still 0x02 "
+                              "tcpip; asked for 0x20)\n"))
+        << result.err;
+}
+
 TEST_F(KestcfgControllerTest, SetChangesTheTimeZoneInEitherNotation) {
     for (const char* zone : {"America/Chicago", "America/Los_Angeles"}) {
         sysroot_.WriteFile(std::string("/usr/share/zoneinfo/") + zone, "TZif");
@@ -383,15 +396,18 @@ TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStan
 }
 
 TEST_F(KestcfgControllerTest, ControlCharactersAreEscapedInTablesAndKeptInJson) {
-    ASSERT_EQ(0, RunKestcfg({"set", "chassis", "comment=red\x1b[31m\x07 \xc2\x9b!"}).exitCode);
-    const RunResult table = RunKestcfg({"get", "chassis", "comment"});
-    EXPECT_TRUE(
-        HasRow(table.out, "0x0103D000", "comment", "text", "red\\\\x1B\\[31m\\\\x07 \\\\u009B!"))
+    // The controller reports text that kestcfg did not write: the device description.
+    sysroot_.WriteFile(kStatePath,
+                       std::regex_replace(State(), std::regex("DeviceDescription = KEST 9100"),
+                                          "DeviceDescription = red\x1b[31m\x07 \xc2\x9b!"));
+    const RunResult table = RunKestcfg({"get", "chassis", "description"});
+    EXPECT_TRUE(HasRow(table.out, "0x01006000", "description", "text",
+                       "VQ red\\\\x1B\\[31m\\\\x07 \\\\u009B!"))
         << table.out;
     EXPECT_EQ(std::string::npos, table.out.find('\x1b'));
     EXPECT_NE(std::string::npos,
-              FlattenJson(RunKestcfg({"get", "chassis", "comment", "--json"}).out)
-                  .find("value=\"red\\u001b[31m\\u0007 \xc2\x9b!\""));
+              FlattenJson(RunKestcfg({"get", "chassis", "description", "--json"}).out)
+                  .find("value=\"VQ red\\u001b[31m\\u0007 \xc2\x9b!\""));
 }
 
 TEST_F(KestcfgControllerTest, SetCommandLineMistakesAreUsageErrorsThatChangeNothing) {
