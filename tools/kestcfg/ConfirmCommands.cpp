@@ -94,7 +94,7 @@ Json ApplySaved(const CommandOptions& options, const Json& saved) {
 // turn), restores its settings once and records the outcome; false when a confirm came first.
 bool RollBack(const CommandOptions& options, int file, std::ostream& err) {
     const std::string path = PendingRollbackPath();
-    const Json pending = ReadRecordFrom(file, path);
+    Json pending = ReadRecordFrom(file, path);
     if (!StillAt(file, path) || rename(path.c_str(), RunningRollbackPath().c_str()) != 0) {
         return false;
     }
@@ -104,8 +104,8 @@ bool RollBack(const CommandOptions& options, int file, std::ostream& err) {
     record["at"] = UtcText(time(nullptr));
     record["items"] = pending["items"];
     const std::string result = record["result"].get<std::string>();
-    LogLine("rollback of the change pending until " + pending["deadline"].get<std::string>() +
-            ": " + result +
+    LogLine("rollback of the change pending until " + pending.value("deadline", "?") + ": " +
+            result +
             (record.contains("reason") ? " (" + record["reason"].get<std::string>() + ")" : ""));
     try {
         WriteRecord(LastRollbackPath(), record);
@@ -182,14 +182,13 @@ void RunPending(CommandContext& context) {
     const OpenRecordFile file{OpenRecord(path)};
     context.document = Json::object();
     if (file.descriptor >= 0) {
-        const Json pending = ReadRecordFrom(file.descriptor, path);
+        Json pending = ReadRecordFrom(file.descriptor, path);
         const bool watched = HeldByAnother(file.descriptor);
         context.document["pending"] = {{"deadline", pending["deadline"]},
                                        {"watcher", watched},
                                        {"restores", pending["items"]}};
         if (!context.options.json) {
-            context.out << "A change is pending until " << pending["deadline"].get<std::string>()
-                        << ".\n"
+            context.out << "A change is pending until " << pending.value("deadline", "?") << ".\n"
                         << (watched ? "Its watcher restores these settings then unless "
                                       "'kestcfg confirm' is run first:\n"
                                     : "Its watcher has died: 'kestcfg rollback' restores these "

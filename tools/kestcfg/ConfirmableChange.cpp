@@ -140,11 +140,10 @@ ConfirmWatch PrepareConfirmableChange(CommandContext& context,
         }
         for (const ItemRequest& request : requests) {
             const std::string item = ItemText(request.item);
-            if (pending && (*pending)["items"].contains(item)) {
+            if (pending && pending->value("items", Json::object()).contains(item)) {
                 context.err << "kestcfg: warning: " << PrintableText(item)
                             << " has a pending change; unless it is confirmed, its rollback at "
-                            << (*pending)["deadline"].get<std::string>()
-                            << " undoes this change too\n";
+                            << pending->value("deadline", "?") << " undoes this change too\n";
             }
         }
         return ConfirmWatch();
@@ -152,7 +151,7 @@ ConfirmWatch PrepareConfirmableChange(CommandContext& context,
     RefuseWhatCannotBeRolledBack(requests);
     if (std::optional<Json> pending = ReadRecord(PendingRollbackPath())) {
         throw CommandFailure(kExitBusy, "a change is already pending until " +
-                                            (*pending)["deadline"].get<std::string>() +
+                                            pending->value("deadline", "?") +
                                             ": confirm it first (kestcfg confirm), or roll it "
                                             "back (kestcfg rollback)");
     }
