@@ -90,6 +90,8 @@ TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {
         {"--sysroot", root, "get", "chassis", "comment"},
         {"--sysroot", root, "set", "chassis", "comment=mine", "web-service=true"},
         {"--sysroot", root, "set", "eth0", "polling-interval=250"},
+        {"--sysroot", root, "set", "eth0", "polling-interval=260", "--confirm-within", "60"},
+        {"--sysroot", root, "confirm"},
         {"--sysroot", root, "firmware", "eth0", root + "/etc/korvane/version"},
         {"--sysroot", root, "firmware-status"},
     };
