@@ -127,6 +127,9 @@ TEST(KestcfgTest, EveryCommandHasItsOwnHelp) {
         {{"set"}, "set [OPTIONS] ITEM NAME=VALUE..."},
         {{"firmware"}, "firmware [OPTIONS] ITEM IMAGE"},
         {{"sim", "init"}, "sim init [OPTIONS] DIR"},
+        {{"confirm"}, "confirm"},
+        {{"pending"}, "pending"},
+        {{"rollback"}, "rollback"},
     };
     for (const auto& [words, usage] : commands) {
         SCOPED_TRACE(usage);
