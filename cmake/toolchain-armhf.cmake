@@ -2,8 +2,9 @@
 # toolchain (crossbuild-essential-armhf); the built programs and tests run under qemu-arm.
 #
 # KEST_ARMHF_SYSROOT (environment, or the default below) is a folder that holds the ARM Boost
-# and inih libraries unpacked from Debian's armhf packages, an ARM build of GoogleTest and a link
-# to the host's architecture-independent Boost headers. scripts/test-armhf prepares it.
+# and inih libraries and the CLI11 and nlohmann-json headers unpacked from Debian's packages,
+# an ARM build of GoogleTest and a link to the host's architecture-independent Boost headers.
+# scripts/test-armhf prepares it.
 set(CMAKE_SYSTEM_NAME Linux)
 set(CMAKE_SYSTEM_PROCESSOR arm)
 set(CMAKE_LIBRARY_ARCHITECTURE arm-linux-gnueabihf)

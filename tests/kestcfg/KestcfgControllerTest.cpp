@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <regex>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -12,7 +13,7 @@
 
 namespace {
 
-using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::FlattenJson;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
@@ -34,7 +35,7 @@ TEST_F(KestcfgControllerTest, ItemsListsTheChassisAndItsAdapter) {
 
     const RunResult json = RunKestcfg({"--sysroot", sysroot_.Root(), "--json", "items"});
     EXPECT_EQ(0, json.exitCode) << json.err;
-    EXPECT_EQ("0/item=\"VQ KEST Chassis\"\n1/item=\"eth0\"\n", FlattenJsonLines(json.out));
+    EXPECT_EQ("items/0=\"VQ KEST Chassis\"\nitems/1=\"eth0\"\n", FlattenJson(json.out));
 }
 
 TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
@@ -53,8 +54,9 @@ TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
         {"0x01003000", "fixed-01003", "unsigned", "0x1092"},
         {"0x0D107000", "ip-address", "text", "192\\.168\\.10\\.20"},
         {"0x0D126000", "primary-adapter", "boolean", "true"},
-        {"0x0D102000", "adapter-mode", "unsigned", "0x02"},
-        {"0x0D103000", "supported-adapter-modes", "unsigned", "0x0B"},
+        {"0x0D102000", "adapter-mode", "unsigned", "0x02 tcpip"},
+        {"0x0D103000", "supported-adapter-modes", "unsigned", "0x0B disabled,tcpip,ethercat"},
+        {"0x0D10F000", "preferred-media-mode", "unsigned", "0x01 auto"},
         {"0x0D11B000", "polling-interval", "unsigned", "100"},
     };
     for (const std::vector<std::string>& row : rows) {
@@ -73,25 +75,25 @@ TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
     EXPECT_EQ(std::string::npos, adapter.out.find("host-name  text  kest-demo"));
 }
 
-TEST_F(KestcfgControllerTest, GetAsJsonHasOneObjectPerItemWithTypedValues) {
+TEST_F(KestcfgControllerTest, GetAsJsonHasOneDocumentWithAnEntryPerItemWithTypedValues) {
     const RunResult result = RunKestcfg({"--json", "get"});
     ASSERT_EQ(0, result.exitCode) << result.err;
-    const std::string flat = FlattenJsonLines(result.out);
+    const std::string flat = FlattenJson(result.out);
     for (const char* expected : {
-             "0/item=\"VQ KEST Chassis\"\n",
-             "0/properties/host-name/tag=\"0x0101F000\"\n",
-             "0/properties/host-name/type=\"text\"\n",
-             "0/properties/host-name/value=\"kest-demo\"\n",
-             "0/properties/web-service/value=false\n",
-             "0/properties/time-zone-offset/value=60\n",
-             "1/item=\"eth0\"\n",
-             "1/properties/polling-interval/value=100\n",
-             "1/properties/supported-adapter-modes/value=11\n",
-             "1/properties/primary-adapter/value=true\n",
+             "items/0/item=\"VQ KEST Chassis\"\n",
+             "items/0/properties/host-name/tag=\"0x0101F000\"\n",
+             "items/0/properties/host-name/type=\"text\"\n",
+             "items/0/properties/host-name/value=\"kest-demo\"\n",
+             "items/0/properties/web-service/value=false\n",
+             "items/0/properties/time-zone-offset/value=60\n",
+             "items/1/item=\"eth0\"\n",
+             "items/1/properties/polling-interval/value=100\n",
+             "items/1/properties/supported-adapter-modes/value=11\n",
+             "items/1/properties/primary-adapter/value=true\n",
          }) {
         EXPECT_NE(std::string::npos, flat.find(expected)) << expected;
     }
-    EXPECT_EQ(std::string::npos, flat.find("\n2/"));
+    EXPECT_EQ(std::string::npos, flat.find("\nitems/2/"));
 }
 
 TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
@@ -106,11 +108,12 @@ TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
                                                       "LanguageName = Klingon"));
     const RunResult unreadable = RunKestcfg({"--json", "get"});
     EXPECT_EQ(3, unreadable.exitCode);
-    const std::string flat = FlattenJsonLines(unreadable.out);
+    const std::string flat = FlattenJson(unreadable.out);
     EXPECT_NE(std::string::npos,
-              flat.find("0/error/status=\"E_FAIL\"\n0/error/code=\"0x80004005\""))
+              flat.find("items/0/error/status=\"E_FAIL\"\nitems/0/error/code=\"0x80004005\""))
         << flat;
-    EXPECT_NE(std::string::npos, flat.find("1/item=\"eth0\"")) << "the adapter is still shown";
+    EXPECT_NE(std::string::npos, flat.find("items/1/item=\"eth0\""))
+        << "the adapter is still shown";
 
     // The chassis judges only the changed properties, so a change can still repair it.
     const RunResult repaired = RunKestcfg({"set", kChassis, "locale=de"});
@@ -132,10 +135,10 @@ TEST_F(KestcfgControllerTest, RefreshReadsTheRequestedPropertiesByNameOrNumber) 
     const RunResult partly = RunKestcfg({"--json", "refresh", "eth0", "gateway", "0x0ABCD000"});
     EXPECT_EQ(0, partly.exitCode) << partly.err;
     EXPECT_EQ(
-        "0/item=\"eth0\"\n0/properties/gateway/tag=\"0x0D10A000\"\n"
-        "0/properties/gateway/type=\"text\"\n0/properties/gateway/value=\"192.168.10.1\"\n"
-        "0/missing/0=\"0x0ABCD000\"\n",
-        FlattenJsonLines(partly.out));
+        "item=\"eth0\"\nproperties/gateway/tag=\"0x0D10A000\"\n"
+        "properties/gateway/type=\"text\"\nproperties/gateway/value=\"192.168.10.1\"\n"
+        "missing/0=\"0x0ABCD000\"\n",
+        FlattenJson(partly.out));
     EXPECT_NE(std::string::npos, partly.err.find("eth0 did not provide 0x0ABCD000"));
 
     EXPECT_EQ(3, RunKestcfg({"refresh", "eth0", "0x0ABCD000"}).exitCode);
@@ -154,9 +157,11 @@ TEST_F(KestcfgControllerTest, SetPersistsAValidatedChangeThatTheNextReadShows) {
         RunKestcfg({"--json", "set", kChassis, "host-name=line-4", "0x0103D000=Bay 4, Line 4"});
     EXPECT_EQ(0, renamed.exitCode) << renamed.err;
     EXPECT_EQ(
-        "0/item=\"VQ KEST Chassis\"\n0/accepted=true\n0/changed/host-name=\"line-4\"\n"
-        "0/changed/comment=\"Bay 4, Line 4\"\n0/restartRequired=true\n",
-        FlattenJsonLines(renamed.out));
+        "item=\"VQ KEST Chassis\"\naccepted=true\nchanges/host-name/requested=\"line-4\"\n"
+        "changes/host-name/stored=\"line-4\"\nchanges/host-name/result=\"stored\"\n"
+        "changes/comment/requested=\"Bay 4, Line 4\"\nchanges/comment/stored=\"Bay 4, Line 4\"\n"
+        "changes/comment/result=\"stored\"\nrestartRequired=true\n",
+        FlattenJson(renamed.out));
     EXPECT_NE(std::string::npos, State().find("HostName=line-4"));
     EXPECT_NE(std::string::npos, State().find("UserComment=Bay 4, Line 4"));
 
@@ -173,6 +178,53 @@ TEST_F(KestcfgControllerTest, SetOfTheClockWritesTheTimeAndRunsTheHardwareClockS
     EXPECT_EQ(0, result.exitCode) << result.err;
     EXPECT_EQ("1893553445 0\n", sysroot_.ReadFile("/run/kest/system-clock"));
     EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot_.ReadFile("/var/log/hwclock.log"));
+}
+
+TEST_F(KestcfgControllerTest, SetStoresTextAsTypedWhateverTheEnvironmentsLocale) {
+    for (const char* locale : {"LANG=C", "LC_ALL=C.UTF-8", "LC_CTYPE=en_US.ISO-8859-1"}) {
+        SCOPED_TRACE(locale);
+        const std::string root = "KEST_SYSROOT=" + sysroot_.Root();
+        char* environment[] = {const_cast<char*>(root.c_str()), const_cast<char*>(locale), nullptr};
+        const RunResult set = RunKestcfg({"set", "chassis", "comment=café 北京"}, environment);
+        EXPECT_EQ(0, set.exitCode) << set.err;
+        EXPECT_EQ("VQ KEST Chassis: comment set to café 北京\n", set.out);
+        EXPECT_NE(std::string::npos, State().find("UserComment=café 北京\n"));
+        sysroot_.WriteFile(kStatePath, std::regex_replace(State(), std::regex("UserComment=.*\n"),
+                                                          "UserComment=old\n"));
+    }
+}
+
+TEST_F(KestcfgControllerTest, APersistFailingPartWayReportsWhatWasStoredWithStatus5) {
+    sysroot_.WriteScript("/sbin/hwclock", "exit 1\n");
+    const RunResult people = RunKestcfg({"set", "chassis", "comment=kept", "current-time=now"});
+    EXPECT_EQ(5, people.exitCode);
+    EXPECT_EQ("VQ KEST Chassis: comment set to kept\n", people.out);
+    EXPECT_NE(std::string::npos, people.err.find("kestcfg: VQ KEST Chassis: current-time was not "
+                                                 "stored"))
+        << people.err;
+    EXPECT_NE(std::string::npos, people.err.find("failed part-way with E_FAIL")) << people.err;
+    EXPECT_NE(std::string::npos, State().find("UserComment=kept\n"));
+
+    const std::string flat = FlattenJson(
+        RunKestcfg({"--json", "set", "chassis", "comment=again", "current-time=now"}).out);
+    for (const char* expected :
+         {"changes/comment/result=\"stored\"\n", "changes/current-time/result=\"not stored\"\n",
+          "error/exitStatus=5\n", "error/status=\"E_FAIL\"\n"}) {
+        EXPECT_NE(std::string::npos, flat.find(expected)) << expected << flat;
+    }
+}
+
+TEST_F(KestcfgControllerTest, AChangeTheControllerDoesNotStoreIsReportedWithStatus5) {
+    // The controller keeps its TCP/IP mode when asked to switch to another TCP/IP mode.
+    sysroot_.WriteFile(kStatePath, std::regex_replace(State(), std::regex("SupportedModes = 0x0B"),
+                                                      "SupportedModes = 0x6B"));
+    const RunResult result = RunKestcfg({"set", "eth0", "adapter-mode=0x20"});
+    EXPECT_EQ(5, result.exitCode);
+    EXPECT_EQ("", result.out);
+    EXPECT_NE(std::string::npos,
+              result.err.find("kestcfg: eth0: adapter-mode was not stored (it is still 0x02 "
+                              "tcpip; asked for 0x20)\n"))
+        << result.err;
 }
 
 TEST_F(KestcfgControllerTest, SetChangesTheTimeZoneInEitherNotation) {
@@ -237,9 +289,125 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
     const RunResult json = RunKestcfg({"--json", "set", "eth0", "polling-interval=0"});
     EXPECT_EQ(1, json.exitCode);
     EXPECT_EQ(
-        "0/item=\"eth0\"\n0/accepted=false\n0/status=\"UX_E_VALUE_INVALID\"\n"
-        "0/code=\"0x8004037F\"\n0/message=\"Polling interval must be between 1 and 10000 ms.\"\n",
-        FlattenJsonLines(json.out));
+        "item=\"eth0\"\naccepted=false\nmessage=\"Polling interval must be between 1 and 10000 "
+        "ms.\"\nerror/exitStatus=1\nerror/message=\"eth0 rejected the change with "
+        "UX_E_VALUE_INVALID (0x8004037F): Polling interval must be between 1 and 10000 ms.\"\n"
+        "error/status=\"UX_E_VALUE_INVALID\"\nerror/code=\"0x8004037F\"\n",
+        FlattenJson(json.out));
+}
+
+// The names of the properties a JSON document lists under items/N/properties, one per line, as
+// "ITEM NAME", where N is the item's place; "NAME" is a member name (get) or a "name" (describe).
+std::string PropertyNames(const std::string& flat) {
+    std::string names;
+    std::smatch match;
+    static const std::regex kGet("items/([0-9])/properties/([a-z0-9-]+)/tag=");
+    static const std::regex kDescribe("items/([0-9])/properties/[0-9]+/name=\"([a-z0-9-]+)\"");
+    for (const std::regex* pattern : {&kGet, &kDescribe}) {
+        for (auto it = std::sregex_iterator(flat.begin(), flat.end(), *pattern);
+             it != std::sregex_iterator(); ++it) {
+            names += (*it)[1].str() + " " + (*it)[2].str() + "\n";
+        }
+    }
+    return names;
+}
+
+TEST_F(KestcfgControllerTest, DescribeCoversEveryPropertyThatGetShows) {
+    const RunResult described = RunKestcfg({"--json", "describe"});
+    ASSERT_EQ(0, described.exitCode) << described.err;
+    const std::string description = FlattenJson(described.out);
+    const std::string shown = PropertyNames(FlattenJson(RunKestcfg({"--json", "get"}).out));
+    std::istringstream lines(shown);
+    size_t count = 0;
+    for (std::string line; std::getline(lines, line); ++count) {
+        EXPECT_NE(std::string::npos, PropertyNames(description).find(line + "\n")) << line;
+    }
+    EXPECT_GT(count, 50u);
+    for (const char* fact : {
+             "items/0/properties/3/name=\"host-name\"\nitems/0/properties/3/tag=\"0x0101F000\"\n"
+             "items/0/properties/3/type=\"text\"\nitems/0/properties/3/changeable=true\n"
+             "items/0/properties/3/restartRequired=true\n",
+             "/name=\"current-time\"\n",
+             "/values/0=\"one of en,de,fr,zh,kr,ja\"",
+             "/values/0=\"0x01 disabled\"\n",
+             "/values/2=\"0x08 ethercat\"\n",
+         }) {
+        EXPECT_NE(std::string::npos, description.find(fact)) << fact << description;
+    }
+    const RunResult people = RunKestcfg({"describe", "chassis"});
+    EXPECT_EQ(0u, people.out.find("VQ KEST Chassis\n  NAME ")) << people.out;
+    EXPECT_NE(std::string::npos, people.out.find("web-service ")) << people.out;
+    EXPECT_EQ(2, RunKestcfg({"describe", "eth7"}).exitCode);
+}
+
+TEST_F(KestcfgControllerTest, ModesAreShownAndTakenByNameOrNumber) {
+    // Polling needs an interval in the same change.
+    for (const auto& [typed, stored] : std::vector<std::pair<std::string, std::string>>{
+             {"polling-mode=off", "0x01 off"},
+             {"polling-mode=2", "0x02 polling"},
+             {"polling-mode=0x01", "0x01 off"},
+             {"polling-mode=POLLING", "0x02 polling"}}) {
+        SCOPED_TRACE(typed);
+        const bool polling = stored == "0x02 polling";
+        std::vector<std::string> arguments = {"set", "eth0", typed};
+        if (polling) {
+            arguments.push_back("polling-interval=40");
+        }
+        const RunResult set = RunKestcfg(arguments);
+        EXPECT_EQ(0, set.exitCode) << set.err;
+        EXPECT_EQ(0u, set.out.find("eth0: polling-mode set to " + stored + "\n")) << set.out;
+        EXPECT_TRUE(HasRow(RunKestcfg({"get", "eth0", "polling-mode"}).out, "0x0D11A000",
+                           "polling-mode", "unsigned", stored));
+    }
+    EXPECT_TRUE(HasRow(RunKestcfg({"get", "eth0"}).out, "0x0D103000", "supported-adapter-modes",
+                       "unsigned", "0x0B disabled,tcpip,ethercat"));
+    EXPECT_NE(std::string::npos,
+              FlattenJson(RunKestcfg({"--json", "get", "eth0", "adapter-mode"}).out)
+                  .find("adapter-mode/value=2\n"));
+    const RunResult unknown = RunKestcfg({"set", "eth0", "polling-mode=sometimes"});
+    EXPECT_EQ(2, unknown.exitCode);
+    EXPECT_NE(std::string::npos, unknown.err.find("a mode name (off, polling) or number"));
+}
+
+TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStandardOutput) {
+    sysroot_.WriteFile("/etc/korvane/share/vqsysdiag.ini",
+                       "[AllComponents]\nSeverity = 255\nTarget = 2\nLowDiskThreshold = 0\n");
+    const std::vector<std::pair<std::vector<std::string>, std::string>> runs = {
+        {{"items"}, "items/1=\"eth0\"\n"},
+        {{"describe", "eth0"}, "items/0/properties/0/name=\"fixed-0101c\"\n"},
+        {{"export"}, "items/eth0/polling-interval=100\n"},
+        {{"get"}, "items/1/properties/polling-interval/value=100\n"},
+        {{"get", "chassis", "comment"}, "/value=\"Demo controller on a desk\"\n"},
+        {{"refresh", "eth0", "gateway"}, "properties/gateway/value=\"192.168.10.1\"\n"},
+        {{"set", "eth0", "polling-interval=200"}, "polling-interval/result=\"stored\"\n"},
+        {{"set", "eth0", "polling-interval=0"}, "error/exitStatus=1\n"},
+        {{"get", "eth7"}, "error/exitStatus=3\n"},
+        {{"get", "eth0", "no-such-name"}, "error/exitStatus=2\n"},
+    };
+    for (const auto& [arguments, expected] : runs) {
+        SCOPED_TRACE(testing::PrintToString(arguments));
+        std::vector<std::string> withJson = arguments;
+        withJson.insert(withJson.begin() + 1, "--json");
+        const RunResult result = RunKestcfg(withJson);
+        EXPECT_NE(std::string::npos, FlattenJson(result.out).find(expected)) << result.out;
+        EXPECT_NE(std::string::npos, result.err.find("CuxNetConfigExpert::Initialize()"))
+            << "traced";
+    }
+}
+
+TEST_F(KestcfgControllerTest, ControlCharactersAreEscapedInTablesAndKeptInJson) {
+    // The controller reports text that kestcfg did not write: the device description.
+    sysroot_.WriteFile(kStatePath,
+                       std::regex_replace(State(), std::regex("DeviceDescription = KEST 9100"),
+                                          "DeviceDescription = red\x1b[31m\x07 \xc2\x9b!"));
+    const RunResult table = RunKestcfg({"get", "chassis", "description"});
+    EXPECT_TRUE(HasRow(table.out, "0x01006000", "description", "text",
+                       "VQ red\\\\x1B\\[31m\\\\x07 \\\\u009B!"))
+        << table.out;
+    EXPECT_EQ(std::string::npos, table.out.find('\x1b'));
+    EXPECT_NE(std::string::npos,
+              FlattenJson(RunKestcfg({"get", "chassis", "description", "--json"}).out)
+                  .find("value=\"VQ red\\u001b[31m\\u0007 \xc2\x9b!\""));
 }
 
 TEST_F(KestcfgControllerTest, SetCommandLineMistakesAreUsageErrorsThatChangeNothing) {

@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "common/TempSysroot.h"
@@ -13,7 +14,7 @@
 namespace {
 
 using kestcfg_test::FinishProgram;
-using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::FlattenJson;
 using kestcfg_test::PollUntil;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunningProgram;
@@ -83,8 +84,10 @@ TEST_F(KestcfgFirmwareTest, InstallsTheImageWithTheDemoToolAndShowsProgress) {
     ASSERT_EQ(0, result.exitCode) << result.err;
     EXPECT_EQ(0u, result.out.find("firmware update {")) << result.out;
     EXPECT_NE(std::string::npos, result.out.find("} of eth0: installed\n")) << result.out;
-    EXPECT_NE(std::string::npos, result.err.find("% running")) << result.err;
-    EXPECT_NE(std::string::npos, result.err.find("]  90% installed\n")) << result.err;
+    EXPECT_NE(std::string::npos, result.out.find("Restart the controller")) << result.out;
+    // Not a terminal: plain progress lines, no bar and no carriage returns.
+    EXPECT_NE(std::string::npos, result.err.find("kestcfg: 5% running\n")) << result.err;
+    EXPECT_EQ(std::string::npos, result.err.find('\r'));
     EXPECT_EQ(sysroot.PathOf("/var/volatile/tmp/kestsysxp.fwupdate.cfg") + " 3\n",
               sysroot.ReadFile("/var/log/fwupdate.log"));
     EXPECT_EQ(kImage, sysroot.ReadFile("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
@@ -94,21 +97,54 @@ TEST_F(KestcfgFirmwareTest, ReportsAFailingToolAsJsonAndExitsWithFailure) {
     sysroot.WriteScript("/usr/local/korvane/bin/fwupdate", "exit 1\n");
     const RunResult result = Install({"--json"}, "VQ KEST Chassis");
     EXPECT_EQ(3, result.exitCode);
-    const std::string flat = FlattenJsonLines(result.out);
-    EXPECT_NE(std::string::npos, flat.find("0/item=\"VQ KEST Chassis\"\n")) << flat;
-    EXPECT_NE(std::string::npos, flat.find("0/state=\"failed\"\n0/percent=-1\n")) << flat;
+    const std::string flat = FlattenJson(result.out);
+    EXPECT_NE(std::string::npos, flat.find("item=\"VQ KEST Chassis\"\n")) << flat;
+    EXPECT_NE(std::string::npos, flat.find("state=\"failed\"\npercent=-1\n")) << flat;
     EXPECT_FALSE(sysroot.Exists("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
 }
 
-TEST_F(KestcfgFirmwareTest, RefusesAnUnknownItemOrAMissingImage) {
+TEST_F(KestcfgFirmwareTest, UnusableImagesAreRefusedWithTheirPathBeforeAnythingStarts) {
     RunResult result = Install({}, "eth9");
     EXPECT_EQ(3, result.exitCode);
     EXPECT_NE(std::string::npos, result.err.find("there is no item eth9")) << result.err;
-    result = RunKestcfg(
-        {"--sysroot", sysroot.Root(), "firmware", "eth0", sysroot.PathOf("/images/missing.bin")});
-    EXPECT_EQ(3, result.exitCode);
-    EXPECT_NE(std::string::npos, result.err.find("cannot open the firmware image")) << result.err;
+    sysroot.WriteFile("/images/empty.bin", "");
+    ASSERT_EQ(0, mkfifo(sysroot.PathOf("/images/fifo").c_str(), 0600));
+    const std::vector<std::pair<std::string, std::string>> images = {
+        {sysroot.PathOf("/images/missing.bin"), ": No such file or directory"},
+        {sysroot.PathOf("/images"), " is a directory, not a regular file"},
+        {sysroot.PathOf("/images/fifo"), " is a FIFO, not a regular file"},
+        {sysroot.PathOf("/images/empty.bin"), " is empty"},
+        {"/dev/zero", " is a device, not a regular file"},
+    };
+    for (const auto& [image, problem] : images) {
+        SCOPED_TRACE(image);
+        result = RunKestcfg({"--sysroot", sysroot.Root(), "firmware", "eth0", image, "--json"});
+        EXPECT_EQ(2, result.exitCode);
+        EXPECT_NE(std::string::npos, result.err.find(image + problem)) << result.err;
+        EXPECT_NE(std::string::npos, FlattenJson(result.out).find("error/exitStatus=2\n"));
+    }
     EXPECT_FALSE(sysroot.Exists("/var/log/fwupdate.log"));
+}
+
+TEST_F(KestcfgFirmwareTest, FirmwareStatusShowsTheLockHolderAndTheStage) {
+    const RunResult idle = RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"});
+    EXPECT_EQ(0, idle.exitCode) << idle.err;
+    EXPECT_EQ("No firmware update is running.\nStatus file: none\n", idle.out);
+
+    // An update whose kestcfg is gone: the lock is held by the tool, which keeps the stage.
+    sysroot.WriteFile("/var/run/firmware_update/status", "3\n");
+    sysroot.WriteFile("/var/run/firmware_update/update.lock", "4242\n");
+    const int lock = open(sysroot.PathOf("/var/run/firmware_update/update.lock").c_str(), O_RDONLY);
+    ASSERT_EQ(0, flock(lock, LOCK_EX | LOCK_NB));
+    const RunResult running = RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"});
+    EXPECT_EQ(
+        "A firmware update is running (started by process 4242).\n"
+        "Status file: 3, stage 3 of 5\n",
+        running.out);
+    EXPECT_EQ("running=true\npid=4242\nstatusCode=\"3\"\nstage=\"stage 3 of 5\"\n",
+              FlattenJson(RunKestcfg({"firmware-status", "--json"}).out));
+    close(lock);
+    EXPECT_EQ(0u, RunKestcfg({"firmware-status"}).out.find("No firmware update is running."));
 }
 
 }  // namespace

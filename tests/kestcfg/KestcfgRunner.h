@@ -109,24 +109,33 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
     return FinishProgram(running);
 }
 
-// Starts the built kestcfg in the background; when the tests run under an emulator (a cross
-// build), through the same emulator command.
-inline RunningProgram StartKestcfg(const std::vector<std::string>& arguments,
-                                   bool ownProcessGroup = false) {
+// Starts the kestcfg at `program` in the background; when the tests run under an emulator (a
+// cross build), through the same emulator command.
+inline RunningProgram StartKestcfgAt(const std::string& program,
+                                     const std::vector<std::string>& arguments,
+                                     char* const* environment = environ,
+                                     bool ownProcessGroup = false) {
     std::vector<std::string> command = {KEST_TEST_EMULATOR};
     if (command.empty()) {
-        return StartProgram(KESTCFG_PATH, arguments, environ, ownProcessGroup);
+        return StartProgram(program, arguments, environment, ownProcessGroup);
     }
     const std::string launcher = command.front();
     command.erase(command.begin());
-    command.push_back(KESTCFG_PATH);
+    command.push_back(program);
     command.insert(command.end(), arguments.begin(), arguments.end());
-    return StartProgram(launcher, command, environ, ownProcessGroup);
+    return StartProgram(launcher, command, environment, ownProcessGroup);
 }
 
-// Runs the built kestcfg and waits for it.
-inline RunResult RunKestcfg(const std::vector<std::string>& arguments) {
-    RunningProgram running = StartKestcfg(arguments);
+// Starts the built kestcfg in the background.
+inline RunningProgram StartKestcfg(const std::vector<std::string>& arguments,
+                                   bool ownProcessGroup = false) {
+    return StartKestcfgAt(KESTCFG_PATH, arguments, environ, ownProcessGroup);
+}
+
+// Runs the kestcfg at `program` with `environment` (the test's own by default) and waits for it.
+inline RunResult RunKestcfgAt(const std::string& program, const std::vector<std::string>& arguments,
+                              char* const* environment = environ) {
+    RunningProgram running = StartKestcfgAt(program, arguments, environment);
     return FinishProgram(running);
 }
 
@@ -142,15 +151,20 @@ bool PollUntil(Condition condition, int limitMs = 60000) {
     return condition();
 }
 
-// Parses `jsonLines` (one JSON document per line) with python3 and returns every scalar as a
-// line "LINE/KEY/KEY=JSON", for example 0/properties/host-name/value="kest-demo". A document
-// that does not parse fails the test.
-inline std::string FlattenJsonLines(const std::string& jsonLines) {
+// Runs the built kestcfg.
+inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
+                            char* const* environment = environ) {
+    return RunKestcfgAt(KESTCFG_PATH, arguments, environment);
+}
+
+// Parses `json` with python3 as exactly one JSON document and returns every scalar as a line
+// "KEY/KEY=JSON", for example items/0/properties/host-name/value="kest-demo". Text that is not
+// one JSON document fails the test.
+inline std::string FlattenJson(const std::string& json) {
     char path[] = "/tmp/kestcfg-json-XXXXXX";
     const int fd = mkstemp(path);
     EXPECT_GE(fd, 0);
-    EXPECT_EQ(static_cast<ssize_t>(jsonLines.size()),
-              write(fd, jsonLines.data(), jsonLines.size()));
+    EXPECT_EQ(static_cast<ssize_t>(json.size()), write(fd, json.data(), json.size()));
     close(fd);
     static const char kFlatten[] =
         "import json, sys\n"
@@ -161,11 +175,10 @@ inline std::string FlattenJsonLines(const std::string& jsonLines) {
         "        for index, item in enumerate(value): walk(path + [str(index)], item)\n"
         "    else:\n"
         "        print('/'.join(path) + '=' + json.dumps(value, ensure_ascii=False))\n"
-        "for number, line in enumerate(open(sys.argv[1], encoding='utf-8')):\n"
-        "    walk([str(number)], json.loads(line))\n";
+        "walk([], json.load(open(sys.argv[1], encoding='utf-8')))\n";
     const RunResult parsed = RunProgram("/usr/bin/python3", {"-c", kFlatten, path});
     unlink(path);
-    EXPECT_EQ(0, parsed.exitCode) << "not JSON lines:\n" << jsonLines << parsed.err;
+    EXPECT_EQ(0, parsed.exitCode) << "not one JSON document:\n" << json << parsed.err;
     return parsed.out;
 }
 

@@ -1,6 +1,10 @@
 // kestcfg sim init: the demo controller's files, and its firmware-tool stand-in.
+#include <grp.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 #include <unistd.h>
+
+#include <cstdio>
 
 #include <gtest/gtest.h>
 
@@ -9,7 +13,7 @@
 
 namespace {
 
-using kestcfg_test::FlattenJsonLines;
+using kestcfg_test::FlattenJson;
 using kestcfg_test::ReadWhole;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunProgram;
@@ -25,13 +29,13 @@ TEST(KestcfgSimTest, InitCreatesTheControllerFilesWithTheShippedTimeZoneTable) {
     const std::string root = sysroot.Root() + "/controller";
     const RunResult result = RunKestcfg({"--json", "sim", "init", root});
     ASSERT_EQ(0, result.exitCode) << result.err;
-    EXPECT_EQ("0/sysroot=\"" + root +
-                  "\"\n0/files/0=\"/etc/korvane/version\"\n"
-                  "0/files/1=\"/etc/korvane/share/vqsysdiag.ini\"\n"
-                  "0/files/2=\"/usr/share/vqsysapi/timezone.ini\"\n0/files/3=\"/sbin/hwclock\"\n"
-                  "0/files/4=\"/usr/local/korvane/bin/fwupdate\"\n0/files/5=\"/dev/rtc0\"\n"
-                  "0/files/6=\"/var/lib/vqtargetcfg/state.ini\"\n",
-              FlattenJsonLines(result.out));
+    EXPECT_EQ("sysroot=\"" + root +
+                  "\"\nfiles/0=\"/etc/korvane/version\"\n"
+                  "files/1=\"/etc/korvane/share/vqsysdiag.ini\"\n"
+                  "files/2=\"/usr/share/vqsysapi/timezone.ini\"\nfiles/3=\"/sbin/hwclock\"\n"
+                  "files/4=\"/usr/local/korvane/bin/fwupdate\"\nfiles/5=\"/dev/rtc0\"\n"
+                  "files/6=\"/var/lib/vqtargetcfg/state.ini\"\n",
+              FlattenJson(result.out));
     EXPECT_EQ("22.5.0\n", ReadWhole(root + "/etc/korvane/version"));
     EXPECT_EQ(ReadWhole(KESTCFG_SOURCE_DATA_DIR "/timezone.ini"),
               ReadWhole(root + "/usr/share/vqsysapi/timezone.ini"));
@@ -69,6 +73,48 @@ TEST(KestcfgSimTest, InitNeedsANewOrEmptyDirectory) {
     for (const char* open : {"/shared", "/group", "/theirs"}) {
         EXPECT_FALSE(sysroot.Exists(std::string(open) + "/sbin")) << open;
     }
+}
+
+TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {
+    if (getuid() != 0) {
+        GTEST_SKIP() << "dropping privileges needs root";
+    }
+    kest::test::TempSysroot sysroot;
+    ASSERT_EQ(0, chmod(sysroot.Root().c_str(), 0755));
+    const std::string home = sysroot.Root() + "/home";
+    ASSERT_EQ(0, mkdir(home.c_str(), 0700));
+    ASSERT_EQ(0, chown(home.c_str(), 65534, 65534));
+    const std::string root = home + "/controller";
+    const std::vector<std::vector<std::string>> steps = {
+        {"sim", "init", root},
+        {"--sysroot", root, "get", "chassis", "comment"},
+        {"--sysroot", root, "set", "chassis", "comment=mine", "web-service=true"},
+        {"--sysroot", root, "set", "eth0", "polling-interval=250"},
+        {"--sysroot", root, "firmware", "eth0", root + "/etc/korvane/version"},
+        {"--sysroot", root, "firmware-status"},
+    };
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        if (setgroups(0, nullptr) != 0 || setgid(65534) != 0 || setuid(65534) != 0) {
+            _exit(100);
+        }
+        for (size_t i = 0; i < steps.size(); ++i) {
+            const RunResult result = RunKestcfg(steps[i]);
+            if (result.exitCode != 0) {
+                fprintf(stderr, "step %zu: %s", i, result.err.c_str());
+                _exit(static_cast<int>(i) + 1);
+            }
+        }
+        _exit(0);
+    }
+    int status = 0;
+    ASSERT_EQ(child, waitpid(child, &status, 0));
+    ASSERT_TRUE(WIFEXITED(status));
+    EXPECT_EQ(0, WEXITSTATUS(status)) << "the step that failed, counting from 1";
+    EXPECT_NE(std::string::npos,
+              ReadWhole(root + "/var/lib/vqtargetcfg/state.ini").find("UserComment=mine\n"));
+    EXPECT_NE(std::string::npos, ReadWhole(root + "/var/log/fwupdate.log").find(" 3\n"));
 }
 
 TEST(KestcfgSimTest, FirmwareToolStandInLogsItsArgumentsAndEndsAtTheLastStage) {

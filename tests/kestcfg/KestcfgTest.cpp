@@ -6,6 +6,7 @@
 
 namespace {
 
+using kestcfg_test::FlattenJson;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
@@ -19,7 +20,8 @@ TEST(KestcfgTest, InfoPrintsTheExpertsIdentity) {
          {std::vector<std::string>{"info"},
           std::vector<std::string>{"--plugin", KEST_PLUGIN_PATH, "info"},
           std::vector<std::string>{std::string("--plugin=") + KEST_PLUGIN_PATH, "info"},
-          std::vector<std::string>{"--sysroot", "/tmp", "info"}}) {
+          std::vector<std::string>{"--sysroot", "/tmp", "info"},
+          std::vector<std::string>{"info", "--sysroot=/tmp", "--plugin", KEST_PLUGIN_PATH}}) {
         SCOPED_TRACE(testing::PrintToString(arguments));
         const RunResult result = RunKestcfg(arguments);
         EXPECT_EQ(0, result.exitCode) << result.err;
@@ -35,6 +37,15 @@ TEST(KestcfgTest, InfoAsJson) {
         "{\"classId\":\"999d9aa4-5475-4ca7-a560-93c51b5bfceb\",\"displayName\":\"KEST "
         "Configuration\",\"version\":\"22.5\",\"programmaticName\":\"vqsyscfg\"}\n",
         result.out);
+    EXPECT_EQ(result.out, RunKestcfg({"info", "--json"}).out) << "the option after the command";
+}
+
+TEST(KestcfgTest, VersionNamesTheToolAndThePlugin) {
+    const RunResult result = RunKestcfg({"--version"});
+    EXPECT_EQ(0, result.exitCode) << result.err;
+    EXPECT_EQ(std::string("kestcfg 22.5\nplug-in 22.5 (") + KEST_PLUGIN_PATH + ")\n", result.out);
+    EXPECT_EQ("kestcfg=\"22.5\"\nplugin=\"22.5\"\npluginPath=\"" KEST_PLUGIN_PATH "\"\n",
+              FlattenJson(RunKestcfg({"--json", "--version"}).out));
 }
 
 TEST(KestcfgTest, UnloadablePluginIsNamedWithTheLoadersReason) {
@@ -55,31 +66,37 @@ TEST(KestcfgTest, UnloadablePluginIsNamedWithTheLoadersReason) {
         << noFactory.err;
 }
 
-TEST(KestcfgTest, CommandLineMistakesAreUsageErrors) {
-    const std::vector<std::vector<std::string>> mistakes = {
-        {},
-        {"--json"},
-        {"frobnicate"},
-        {"--frobnicate", "info"},
-        {"--plugin"},
-        {"--plugin="},
-        {"info", "extra"},
-        {"--sysroot", "/nonexistent/sysroot", "info"},
-        {"--sysroot", KESTCFG_PATH, "info"},
-        {"get", "a", "b"},
-        {"refresh", "eth0"},
-        {"set", "eth0"},
-        {"sim"},
-        {"sim", "init"},
-        {"sim", "start", "/tmp/x"},
-        {"sim", "init", ""},
+TEST(KestcfgTest, CommandLineMistakesAreUsageErrorsWithAHint) {
+    const std::vector<std::pair<std::vector<std::string>, std::string>> mistakes = {
+        {{}, "kestcfg"},
+        {{"frobnicate"}, "kestcfg"},
+        {{"--frobnicate", "info"}, "kestcfg info"},
+        {{"--plugin"}, "kestcfg"},
+        {{"--plugin="}, "kestcfg"},
+        {{"info", "extra"}, "kestcfg info"},
+        {{"--sysroot", "/nonexistent/sysroot", "info"}, "kestcfg info"},
+        {{"--sysroot", KESTCFG_PATH, "info"}, "kestcfg info"},
+        {{"get", "--frobnicate"}, "kestcfg get"},
+        {{"refresh", "eth0"}, "kestcfg refresh"},
+        {{"set", "eth0"}, "kestcfg set"},
+        {{"sim"}, "kestcfg sim"},
+        {{"sim", "init"}, "kestcfg sim init"},
+        {{"sim", "start", "/tmp/x"}, "kestcfg sim"},
+        {{"sim", "init", ""}, "kestcfg sim init"},
     };
-    for (const std::vector<std::string>& arguments : mistakes) {
+    for (const auto& [arguments, topic] : mistakes) {
         SCOPED_TRACE(testing::PrintToString(arguments));
         const RunResult result = RunKestcfg(arguments);
         EXPECT_EQ(2, result.exitCode);
         EXPECT_EQ("", result.out);
         EXPECT_EQ(0u, result.err.rfind("kestcfg: ", 0)) << result.err;
+        EXPECT_NE(std::string::npos,
+                  result.err.find("\nTry '" + topic + " --help' for more information.\n"))
+            << result.err;
+        std::vector<std::string> withJson = arguments;
+        withJson.push_back("--json");
+        const std::string flat = FlattenJson(RunKestcfg(withJson).out);
+        EXPECT_EQ(0u, flat.find("error/exitStatus=2\nerror/message=\"")) << flat;
     }
 }
 
@@ -94,16 +111,32 @@ TEST(KestcfgTest, ASysrootWithoutAControllerHasNoItemsToShow) {
     }
 }
 
-TEST(KestcfgTest, HelpListsTheCommands) {
-    const RunResult result = RunKestcfg({"--help"});
-    EXPECT_EQ(0, result.exitCode);
-    EXPECT_EQ(0u, result.out.rfind("usage: kestcfg [--sysroot DIR] [--plugin PATH] [--json] "
-                                   "[--no-wait] COMMAND",
-                                   0));
-    for (const char* command : {"info", "items", "get [ITEM]", "refresh ITEM TAG...",
-                                "set ITEM NAME=VALUE...", "sim init DIR"}) {
-        EXPECT_NE(std::string::npos, result.out.find(std::string("\n  ") + command + " "))
-            << command;
+TEST(KestcfgTest, EveryCommandHasItsOwnHelp) {
+    const RunResult overall = RunKestcfg({"--help"});
+    EXPECT_EQ(0, overall.exitCode);
+    EXPECT_EQ(0u, overall.out.find("Configures a KEST chassis controller")) << overall.out;
+    const std::vector<std::pair<std::vector<std::string>, std::string>> commands = {
+        {{"info"}, "info"},
+        {{"items"}, "items"},
+        {{"describe"}, "describe [OPTIONS] [ITEM]"},
+        {{"export"}, "export [OPTIONS] [ITEM...]"},
+        {{"apply"}, "apply [OPTIONS] FILE"},
+        {{"firmware-status"}, "firmware-status"},
+        {{"get"}, "get [OPTIONS] [ITEM] [NAME...]"},
+        {{"refresh"}, "refresh [OPTIONS] ITEM TAG..."},
+        {{"set"}, "set [OPTIONS] ITEM NAME=VALUE..."},
+        {{"firmware"}, "firmware [OPTIONS] ITEM IMAGE"},
+        {{"sim", "init"}, "sim init [OPTIONS] DIR"},
+    };
+    for (const auto& [words, usage] : commands) {
+        SCOPED_TRACE(usage);
+        EXPECT_NE(std::string::npos, overall.out.find("\n  " + words.front() + " "));
+        std::vector<std::string> arguments = words;
+        arguments.push_back("--help");
+        const RunResult help = RunKestcfg(arguments);
+        EXPECT_EQ(0, help.exitCode) << help.err;
+        EXPECT_NE(std::string::npos, help.out.find("Usage: kestcfg " + usage)) << help.out;
+        EXPECT_EQ("", help.err);
     }
 }
 

@@ -6,6 +6,7 @@
 #include <ostream>
 #include <string>
 
+#include "HostText.h"
 #include "PropertyCatalogue.h"
 #include "TimestampText.h"
 #include "ValueText.h"
@@ -77,7 +78,7 @@ TEST(TimestampTextTest, CountsFrom1904AndShowsNoTimeAndRoundedMilliseconds) {
     EXPECT_EQ("2030-01-02T03:04:05.123Z", TimestampToIso8601(*parsed));
     EXPECT_EQ("(no time)",
               ValueForPeople(PropertyValue(uxSysAttrTimestampUTC{0, 0}), NumberStyle::kDecimal));
-    EXPECT_EQ("null", ValueAsJson(PropertyValue(uxSysAttrTimestampUTC{0, 0})));
+    EXPECT_EQ("null", ValueAsJson(PropertyValue(uxSysAttrTimestampUTC{0, 0})).dump());
 }
 
 // 2100-01-01 round-trips where time_t has 64 bits; where it has 32 bits (ARMv7 Linux) it is
@@ -100,10 +101,25 @@ TEST(ValueTextTest, MasksShowInHexadecimalAndJsonKeepsTypes) {
     EXPECT_EQ("0x0B", ValueForPeople(PropertyValue(uint32_t{11}), NumberStyle::kHexadecimal));
     EXPECT_EQ("0x150000",
               ValueForPeople(PropertyValue(uint32_t{0x150000}), NumberStyle::kHexadecimal));
-    EXPECT_EQ("11", ValueAsJson(PropertyValue(uint32_t{11})));
-    EXPECT_EQ("-5", ValueAsJson(PropertyValue(int32_t{-5})));
-    EXPECT_EQ("true", ValueAsJson(PropertyValue(true)));
-    EXPECT_EQ("\"a\\\"b\\n\"", ValueAsJson(PropertyValue(std::wstring(L"a\"b\n"))));
+    EXPECT_EQ("11", ValueAsJson(PropertyValue(uint32_t{11})).dump());
+    EXPECT_EQ("-5", ValueAsJson(PropertyValue(int32_t{-5})).dump());
+    EXPECT_EQ("true", ValueAsJson(PropertyValue(true)).dump());
+    EXPECT_EQ("\"a\\\"b\\n\"", ValueAsJson(PropertyValue(std::wstring(L"a\"b\n"))).dump());
+}
+
+TEST(HostTextTest, PrintableTextEscapesControlCharactersOnly) {
+    const std::pair<std::string, std::string> cases[] = {
+        {"plain caf\xc3\xa9 \\ text", "plain caf\xc3\xa9 \\ text"},
+        {"a\nb\tc\rd", "a\\nb\\tc\\rd"},
+        {std::string("\x1b[2J\x00\x7f", 6), "\\x1B[2J\\x00\\x7F"},
+        {"\xc2\x9b"
+         "1m \xc2\xa0",
+         "\\u009B1m \xc2\xa0"},
+        {"\xc2", "\xc2"},
+    };
+    for (const auto& [text, shown] : cases) {
+        EXPECT_EQ(shown, PrintableText(text)) << text;
+    }
 }
 
 TEST(PropertyCatalogueTest, NamesAndNumbersBothFindTags) {

@@ -1,23 +1,21 @@
-// kestcfg's command line: [--sysroot DIR] [--plugin PATH] [--json] [--no-wait] COMMAND
-// [ARGUMENTS...]
+// kestcfg's command line: options that apply to every command, accepted before or after the
+// command, and each command with its own arguments and --help.
 #pragma once
 
+#include <optional>
 #include <string>
 #include <vector>
 
+#include "Commands.h"
+
 struct CommandLine {
-    std::string sysroot;  // empty: KEST_SYSROOT is left as it is
-    std::string plugin;   // empty: the plug-in next to the program
-    bool json = false;
-    bool noWait = false;  // fail instead of waiting while another kestcfg changes the controller
-    bool help = false;
-    std::string command;
-    std::vector<std::string> arguments;
+    CommandOptions options;
+    bool version = false;
+    const CommandDescription* command = nullptr;  // null when only --version is asked for
+    std::vector<std::string> arguments;           // the command's arguments in their order
+    std::optional<std::string> help;              // --help: the text to print instead
 };
 
-// Parses argv; options come before the command. Throws a usage error for an unknown option, an
-// option without its value, or a missing command (unless --help was given).
+// Parses argv. A mistake throws a usage error whose message ends with a hint at the help of the
+// command concerned.
 CommandLine ParseCommandLine(int argc, const char* const* argv);
-
-// The usage text, ending with a newline.
-std::string UsageText();

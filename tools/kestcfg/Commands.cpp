@@ -1,31 +1,60 @@
 #include "Commands.h"
 
-#include <cstdint>
-
 const std::vector<CommandDescription>& AllCommands() {
+    static const char kItemHelp[] = "the item: its name as 'kestcfg items' lists it, or chassis";
     static const std::vector<CommandDescription> commands = {
-        {"info", "info", "show the expert's identity", 0, 0, ExpertUse::kIdentity, &RunInfo},
-        {"items", "items", "list the configurable items", 0, 0, ExpertUse::kItems, &RunItems},
-        {"get", "get [ITEM]", "show all properties of every item, or of ITEM", 0, 1,
-         ExpertUse::kItems, &RunGet},
-        {"refresh", "refresh ITEM TAG...", "read the named properties of ITEM afresh", 2, SIZE_MAX,
-         ExpertUse::kItems, &RunRefresh},
-        {"set", "set ITEM NAME=VALUE...", "validate and persist changed properties of ITEM", 2,
-         SIZE_MAX, ExpertUse::kItems, &RunSet, true},
-        {"firmware", "firmware ITEM IMAGE",
-         "install the firmware image file IMAGE on ITEM, showing the update's progress", 2, 2,
-         ExpertUse::kItems, &RunFirmware, true},
-        {"sim", "sim init DIR", "create a demo controller under DIR (use DIR as the sysroot)", 2, 2,
-         ExpertUse::kNone, &RunSim},
+        {"info", "show the expert's identity", {}, ExpertUse::kIdentity, &RunInfo},
+        {"items", "list the configurable items", {}, ExpertUse::kItems, &RunItems},
+        {"describe",
+         "explain every property of each item, or of ITEM: type, changeable, values, meaning",
+         {{"ITEM", kItemHelp, false, false}},
+         ExpertUse::kItems,
+         &RunDescribe},
+        {"get",
+         "show the properties of every item, or of ITEM, or only the NAMEd ones",
+         {{"ITEM", kItemHelp, false, false},
+          {"NAME", "a property name or tag number", false, true}},
+         ExpertUse::kItems,
+         &RunGet},
+        {"refresh",
+         "read the named properties of ITEM afresh",
+         {{"ITEM", kItemHelp, true, false}, {"TAG", "a property name or tag number", true, true}},
+         ExpertUse::kItems,
+         &RunRefresh},
+        {"set",
+         "validate and persist changed properties of ITEM, and report what was stored",
+         {{"ITEM", kItemHelp, true, false},
+          {"NAME=VALUE", "a property and its new value", true, true}},
+         ExpertUse::kItems,
+         &RunSet,
+         true},
+        {"export",
+         "write the changeable settings of every item, or of the ITEMs, as JSON",
+         {{"ITEM", kItemHelp, false, true}},
+         ExpertUse::kItems,
+         &RunExport},
+        {"apply",
+         "make the controller's settings match FILE (written by export)",
+         {{"FILE", "the settings as JSON; - reads standard input", true, false}},
+         ExpertUse::kItems,
+         &RunApply,
+         true},
+        {"firmware",
+         "install the firmware image file IMAGE on ITEM, showing the update's progress",
+         {{"ITEM", kItemHelp, true, false}, {"IMAGE", "the firmware image file", true, false}},
+         ExpertUse::kItems,
+         &RunFirmware,
+         true},
+        {"firmware-status",
+         "show whether a firmware update runs on the controller, and its last stage",
+         {},
+         ExpertUse::kSysroot,
+         &RunFirmwareStatus},
+        {"sim init",
+         "create a demo controller under DIR (use DIR as the sysroot)",
+         {{"DIR", "a new directory, or an empty one of your own", true, false}},
+         ExpertUse::kNone,
+         &RunSim},
     };
     return commands;
-}
-
-const CommandDescription* FindCommand(const std::string& name) {
-    for (const CommandDescription& command : AllCommands()) {
-        if (command.name == name) {
-            return &command;
-        }
-    }
-    return nullptr;
 }

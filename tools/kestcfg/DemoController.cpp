@@ -243,12 +243,16 @@ std::string FindTimeZoneTable() {
     if (Exists(besideProgram)) {
         return besideProgram;
     }
+    std::string installed = ProgramDirectory() + KESTCFG_DATA_DIR_FROM_PROGRAM "/timezone.ini";
+    if (Exists(installed)) {
+        return installed;
+    }
     std::string inSources = std::string(KESTCFG_SOURCE_DATA_DIR) + "/timezone.ini";
     if (Exists(inSources)) {
         return inSources;
     }
     throw Failure("cannot find the time-zone table timezone.ini: looked for " + besideProgram +
-                  " and " + inSources);
+                  ", " + installed + " and " + inSources);
 }
 
 std::vector<std::string> CreateDemoController(const std::string& root,
@@ -266,10 +270,14 @@ std::vector<std::string> CreateDemoController(const std::string& root,
     tree.Write("/usr/local/korvane/bin/fwupdate", FirmwareToolScript(root), 0755);
     // A readable clock device tells the plug-in that there is a hardware clock to set.
     tree.Write("/dev/rtc0", "", 0644);
-    tree.Directory("/etc/korvane/share/vqsyslog");
-    tree.Directory("/var/run/firmware_update");
-    tree.Directory("/var/volatile/tmp");
-    tree.Directory("/var/log");
+    // Every directory the plug-in and kestcfg use at run time, so that a user without root can
+    // work with a controller of their own: logs, the tracer's shared lock, the run directory,
+    // the firmware staging and status directories.
+    for (const char* directory :
+         {"/etc/korvane/share/vqsyslog", "/var/local/korvane/vqsyslog", "/var/tmp/korvane/shared",
+          "/run/kest", "/var/run/firmware_update", "/var/volatile/tmp", "/var/log"}) {
+        tree.Directory(directory);
+    }
     // Written last: its presence marks a complete controller.
     tree.Write(kStateFile, kState, 0644);
     return tree.Written();

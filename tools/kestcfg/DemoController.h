@@ -5,8 +5,9 @@
 #include <string>
 #include <vector>
 
-// The time-zone table shipped with kestcfg: "timezone.ini" beside the program (an installed
-// tool), else in the source tree's data directory. Throws a failure naming the places searched.
+// The time-zone table shipped with kestcfg: "timezone.ini" beside the program, in the installed
+// data directory, else in the source tree's data directory. Throws a failure naming the places
+// searched.
 std::string FindTimeZoneTable();
 
 // Creates the demo controller under `root`, creating the directory (mode 0700) when missing,

@@ -8,10 +8,12 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <optional>
 #include <string>
 
 #include "Commands.h"
 #include "ExitCodes.h"
+#include "FirmwareFiles.h"
 #include "HostFirmwareImage.h"
 #include "HostText.h"
 #include "InterfaceRef.h"
@@ -74,34 +76,55 @@ void RequireItem(IuxSysExpert3* expert, const std::wstring& item) {
     }
 }
 
-// Polls the update, drawing the progress bar on `err` unless `quiet`, until it is installed or
-// failed. A status-file failure the plug-in reports is noted once.
-UpdateStatus FollowUpdate(IuxSysExpertFirmware* firmware, const std::wstring& item, bool quiet,
-                          std::ostream& err) {
+// Polls the update until it is installed or failed, showing its progress on `err`: a bar on a
+// terminal, plain lines otherwise, nothing when `quiet`. Returns the last failure status the
+// plug-in reported while polling, if any.
+std::optional<HRESULT> FollowUpdate(IuxSysExpertFirmware* firmware, const std::wstring& item,
+                                    bool quiet, std::ostream& err) {
+    const bool terminal = isatty(STDERR_FILENO) != 0;
     UpdateStatus status;
-    std::string drawn;
+    std::optional<HRESULT> failure;
+    std::string shown;
+    bool barDrawn = false;
     for (;;) {
         UpdateStatus now = status;
         const HRESULT polled =
             firmware->GetFirmwareUpdateStatus(item.c_str(), &now.state, &now.percent);
         status = now;
         if (polled < 0) {
-            err << (drawn.empty() ? "" : "\n") << "kestcfg: the update tool reports a failure ("
+            failure = polled;
+            err << (barDrawn ? "\n" : "") << "kestcfg: the update tool reports a failure ("
                 << StatusWithName(polled) << ")\n";
-            drawn.clear();
-        } else if (!quiet && ProgressBar(status) != drawn) {
-            drawn = ProgressBar(status);
-            err << "\r" << drawn << std::flush;
+            barDrawn = false;
+        } else if (!quiet && ProgressBar(status) != shown) {
+            shown = ProgressBar(status);
+            if (terminal) {
+                err << "\r" << shown << std::flush;
+                barDrawn = true;
+            } else if (status.state != UX_FIRMWARE_STATE_INSTALLED) {
+                err << "kestcfg: " << std::clamp(status.percent, 0, 100) << "% "
+                    << StateName(status.state) << "\n";
+            }
         }
         if (IsFinal(status.state)) {
             break;
         }
         usleep(kPollInterval);
     }
-    if (!drawn.empty()) {
+    if (barDrawn) {
         err << "\n";
     }
-    return status;
+    return failure;
+}
+
+// Why the update failed, as far as kestcfg can tell.
+std::string FailureReason(std::optional<HRESULT> reported) {
+    const std::optional<char> code = StatusFileCode();
+    if (reported && code) {
+        return "the update tool reported " + StatusCodeMeaning(*code) + " in its status file (" +
+               StatusWithName(*reported) + ")";
+    }
+    return "the update tool ended with a failure (a nonzero exit status, or it could not start)";
 }
 
 // The process id recorded in the controller's firmware update lock when some process holds the
@@ -129,9 +152,8 @@ std::string UpdateLockHolder() {
 
 void RunFirmware(CommandContext& context) {
     const std::wstring item = ItemArgument(context.arguments[0]);
-    const std::string& imagePath = context.arguments[1];
+    HostFirmwareImage image(context.arguments[1]);
     RequireItem(context.expert, item);
-    HostFirmwareImage image(imagePath);
     const InterfaceRef<IuxSysExpertFirmware> firmware =
         QueryInterfaceAs<IuxSysExpertFirmware>(context.expert, IID_IuxSysExpertFirmware);
     if (!firmware) {
@@ -147,24 +169,32 @@ void RunFirmware(CommandContext& context) {
             throw CommandFailure(kExitBusy,
                                  "another firmware update of the controller is under way "
                                  "(process " +
-                                     holder + ")");
+                                     holder + "; see kestcfg firmware-status)",
+                                 prepared);
         }
-        throw Failure("the plug-in refused to prepare the update (" + StatusWithName(prepared) +
-                      "): not enough free space for twice the image, or an update is under way");
+        throw CommandFailure(kExitFailure,
+                             "the plug-in refused to prepare the update (" +
+                                 StatusWithName(prepared) +
+                                 "): not enough free space for twice the image, or an update "
+                                 "is under way",
+                             prepared);
     }
     // From here the update belongs to the tool; kestcfg only follows it.
     GuardFirmwareUpdate();
     const HRESULT started =
         firmware->StartFirmwareUpdate(item.c_str(), updateId.Get(), 0, nullptr, &image);
     if (started < 0) {
-        throw Failure("the plug-in could not start the update (" + StatusWithName(started) + ")");
+        throw CommandFailure(
+            kExitFailure,
+            "the plug-in could not start the update (" + StatusWithName(started) + ")", started);
     }
     // The plug-in's update lock now keeps other updates out; other kestcfg commands may go on.
     if (context.turn != nullptr) {
         context.turn->End();
     }
 
-    FollowUpdate(firmware.Get(), item, context.json, context.err);
+    const std::optional<HRESULT> reported =
+        FollowUpdate(firmware.Get(), item, context.options.json, context.err);
     // The tool may still run after a failure read from its status file; Uninitialize waits for
     // it, and its ending decides the final state.
     context.expert->Uninitialize();
@@ -172,16 +202,51 @@ void RunFirmware(CommandContext& context) {
     firmware->GetFirmwareUpdateStatus(item.c_str(), &final.state, &final.percent);
 
     const std::string id = TakeHostString(updateId.Release());
-    if (context.json) {
-        context.out << "{\"item\":" << JsonQuoted(ItemText(item))
-                    << ",\"update\":" << JsonQuoted(id)
-                    << ",\"state\":" << JsonQuoted(StateName(final.state))
-                    << ",\"percent\":" << final.percent << "}\n";
+    const bool installed = final.state == UX_FIRMWARE_STATE_INSTALLED;
+    context.document = {{"item", ItemText(item)},
+                        {"update", id},
+                        {"state", StateName(final.state)},
+                        {"percent", installed ? 100 : final.percent}};
+    if (installed && !reported) {
+        if (!context.options.json) {
+            context.out << "firmware update " << PrintableText(id) << " of "
+                        << PrintableText(ItemText(item)) << ": installed\n"
+                        << "Restart the controller to run the new firmware.\n";
+        }
+        return;
+    }
+    const std::string reason =
+        installed ? FailureReason(reported) +
+                        ", but then exited with status 0: the new firmware may not be installed"
+                  : FailureReason(reported);
+    context.document["reason"] = reason;
+    if (!context.options.json) {
+        context.out << "firmware update " << PrintableText(id) << " of "
+                    << PrintableText(ItemText(item)) << ": failed\n";
+    }
+    throw CommandFailure(kExitFailure, reason, reported);
+}
+
+void RunFirmwareStatus(CommandContext& context) {
+    const UpdateLock lock = ReadUpdateLock();
+    const std::optional<char> code = StatusFileCode();
+    context.document = {{"running", lock.held},
+                        {"pid", lock.pid ? Json(*lock.pid) : Json(nullptr)},
+                        {"statusCode", code ? Json(std::string(1, *code)) : Json(nullptr)},
+                        {"stage", code ? Json(StatusCodeMeaning(*code)) : Json(nullptr)}};
+    if (context.options.json) {
+        return;
+    }
+    if (lock.held) {
+        context.out << "A firmware update is running"
+                    << (lock.pid ? " (started by process " + std::to_string(*lock.pid) + ")"
+                                 : std::string())
+                    << ".\n";
     } else {
-        context.out << "firmware update " << id << " of " << ItemText(item) << ": "
-                    << StateName(final.state) << "\n";
+        context.out << "No firmware update is running.\n";
     }
-    if (final.state != UX_FIRMWARE_STATE_INSTALLED) {
-        throw CommandFailure(kExitFailure, "");
-    }
+    context.out << "Status file: "
+                << (code ? PrintableText(std::string(1, *code)) + ", " + StatusCodeMeaning(*code)
+                         : std::string("none"))
+                << "\n";
 }

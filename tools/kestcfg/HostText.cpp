@@ -102,34 +102,28 @@ std::string StatusText(HRESULT status) {
     return text;
 }
 
-std::string JsonQuoted(const std::string& text) {
-    std::string out = "\"";
-    for (const char c : text) {
-        switch (c) {
-            case '"':
-                out += "\\\"";
-                break;
-            case '\\':
-                out += "\\\\";
-                break;
-            case '\n':
-                out += "\\n";
-                break;
-            case '\t':
-                out += "\\t";
-                break;
-            case '\r':
-                out += "\\r";
-                break;
-            default:
-                if (static_cast<unsigned char>(c) < 0x20) {
-                    char escaped[7];
-                    std::snprintf(escaped, sizeof escaped, "\\u%04x", c);
-                    out += escaped;
-                } else {
-                    out += c;
-                }
+std::string PrintableText(const std::string& text) {
+    std::string out;
+    out.reserve(text.size());
+    for (size_t i = 0; i < text.size(); ++i) {
+        const unsigned char c = static_cast<unsigned char>(text[i]);
+        const bool c1Control = c == 0xC2 && i + 1 < text.size() &&
+                               static_cast<unsigned char>(text[i + 1]) >= 0x80 &&
+                               static_cast<unsigned char>(text[i + 1]) <= 0x9F;
+        if (c == '\n') {
+            out += "\\n";
+        } else if (c == '\t') {
+            out += "\\t";
+        } else if (c == '\r') {
+            out += "\\r";
+        } else if (c < 0x20 || c == 0x7F || c1Control) {
+            char escaped[8];
+            std::snprintf(escaped, sizeof escaped, "\\x%02X",
+                          c1Control ? static_cast<unsigned char>(text[++i]) : c);
+            out += c1Control ? std::string("\\u00") + (escaped + 2) : std::string(escaped);
+        } else {
+            out += static_cast<char>(c);
         }
     }
-    return out + "\"";
+    return out;
 }

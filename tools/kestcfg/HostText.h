@@ -1,5 +1,5 @@
 // Turning the plug-in's answers into printable text: host strings to UTF-8, identifiers to their
-// registry form, statuses to hexadecimal, and JSON string quoting.
+// registry form, statuses to hexadecimal, and text made safe for a terminal.
 #pragma once
 
 #include <optional>
@@ -22,5 +22,6 @@ std::string GuidText(const GUID& guid);
 // "0x" and eight upper-case hexadecimal digits.
 std::string StatusText(HRESULT status);
 
-// `text` as a quoted JSON string.
-std::string JsonQuoted(const std::string& text);
+// `text` with its control characters (C0, DEL and the UTF-8 encoded C1 range) written as
+// escapes (\n, \t, \r, \xNN, \u00NN), so that a value cannot steer the terminal.
+std::string PrintableText(const std::string& text);

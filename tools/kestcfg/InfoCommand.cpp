@@ -35,15 +35,15 @@ void RunInfo(CommandContext& context) {
     const std::string programmaticName = IdentityString(
         context.expert, &IuxSysExpert3::GetExpertProgrammaticName, "GetExpertProgrammaticName");
 
-    if (context.json) {
-        context.out << "{\"classId\":" << JsonQuoted(GuidText(classId))
-                    << ",\"displayName\":" << JsonQuoted(displayName)
-                    << ",\"version\":" << JsonQuoted(version)
-                    << ",\"programmaticName\":" << JsonQuoted(programmaticName) << "}\n";
-    } else {
-        context.out << "Class identifier:  " << GuidText(classId) << "\n"
-                    << "Display name:      " << displayName << "\n"
-                    << "Version:           " << version << "\n"
-                    << "Programmatic name: " << programmaticName << "\n";
+    if (context.options.json) {
+        context.document = {{"classId", GuidText(classId)},
+                            {"displayName", displayName},
+                            {"version", version},
+                            {"programmaticName", programmaticName}};
+        return;
     }
+    context.out << "Class identifier:  " << GuidText(classId) << "\n"
+                << "Display name:      " << PrintableText(displayName) << "\n"
+                << "Version:           " << PrintableText(version) << "\n"
+                << "Programmatic name: " << PrintableText(programmaticName) << "\n";
 }

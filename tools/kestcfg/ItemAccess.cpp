@@ -1,5 +1,8 @@
 #include "ItemAccess.h"
 
+#include <strings.h>
+
+#include "ControllerPath.h"
 #include "ExitCodes.h"
 #include "HostText.h"
 #include "StatusNames.h"
@@ -7,6 +10,9 @@
 #include "uxsys/StatusCodes.h"
 
 std::wstring ItemArgument(const std::string& text) {
+    if (strcasecmp(text.c_str(), kChassisAlias) == 0) {
+        return kChassisItem;
+    }
     std::optional<std::wstring> item = WideFromUtf8(text);
     if (!item) {
         throw UsageError("the item name is not valid UTF-8 text");
@@ -34,9 +40,14 @@ std::vector<std::wstring> ItemNames(IuxSysExpert3* expert) {
         result.emplace_back(name.Get() != nullptr ? name.Get() : L"", CvqBStrLength(name.Get()));
     }
     if (result.empty()) {
+        std::string missing;
+        for (const std::string& file : MissingControllerFiles()) {
+            missing += (missing.empty() ? "; missing: " : ", ") + file;
+        }
         throw Failure(
             "the plug-in reports no items: the chassis could not be read (is "
-            "KEST_SYSROOT or --sysroot a controller made by 'kestcfg sim init'?)");
+            "KEST_SYSROOT or --sysroot a controller made by 'kestcfg sim init'?)" +
+            missing);
     }
     return result;
 }

@@ -7,7 +7,12 @@
 #include "InterfaceRef.h"
 #include "uxsys/Expert.h"
 
-// The item name a user typed, as wide text. Throws a usage error for text that is not UTF-8.
+// The chassis item's name, and the short name users may type for it.
+inline constexpr wchar_t kChassisItem[] = L"VQ KEST Chassis";
+inline constexpr char kChassisAlias[] = "chassis";
+
+// The item name a user typed, as wide text; "chassis" (in any case) names the chassis item.
+// Throws a usage error for text that is not UTF-8.
 std::wstring ItemArgument(const std::string& text);
 
 // The names of all items in the plug-in's order. Throws a failure with the status, or when there

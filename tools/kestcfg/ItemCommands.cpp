@@ -13,57 +13,109 @@
 
 namespace {
 
-// The JSON members that report a failed status.
-std::string StatusJson(HRESULT status) {
-    const std::string name = StatusName(status);
-    return "\"status\":" + (name.empty() ? std::string("null") : JsonQuoted(name)) +
-           ",\"code\":" + JsonQuoted(StatusText(status));
+// The tags the user named, each once, in the order given. Throws a usage error for a name that
+// is neither a catalogue name nor a tag number.
+std::vector<uint32_t> NamedTags(const std::vector<std::string>& words) {
+    std::vector<uint32_t> tags;
+    for (const std::string& word : words) {
+        const std::optional<uint32_t> tag = TagFromWord(word);
+        if (!tag) {
+            throw UsageError("unknown property " + word +
+                             "; give a name that kestcfg describe shows or a tag number");
+        }
+        if (std::find(tags.begin(), tags.end(), *tag) == tags.end()) {
+            tags.push_back(*tag);
+        }
+    }
+    return tags;
 }
 
-// Prints one item's properties; returns false when they could not be read (reported already).
-bool ShowItemProperties(CommandContext& context, const std::wstring& item, bool headed) {
+// Splits `requested` into the tags the bag holds and those it lacks.
+void SplitByPresence(IuxSysPropertyBag* bag, const std::vector<uint32_t>& requested,
+                     std::vector<uint32_t>* present, std::vector<uint32_t>* missing) {
+    for (const uint32_t tag : requested) {
+        (bag->HasTag(tag) == S_OK ? present : missing)->push_back(tag);
+    }
+}
+
+Json MissingAsJson(const std::vector<uint32_t>& missing) {
+    Json names = Json::array();
+    for (const uint32_t tag : missing) {
+        names.push_back(TagDisplayName(tag));
+    }
+    return names;
+}
+
+void ReportMissing(CommandContext& context, const std::string& item,
+                   const std::vector<uint32_t>& missing, const char* verb) {
+    for (const uint32_t tag : missing) {
+        context.err << "kestcfg: " << PrintableText(item) << " " << verb << " "
+                    << TagDisplayName(tag) << "\n";
+    }
+}
+
+// Shows one item's properties, all or only `named` ones; returns false when some could not be
+// read or are missing (reported already).
+bool ShowItemProperties(CommandContext& context, const std::wstring& item,
+                        const std::vector<uint32_t>* named, bool headed, Json& items) {
     InterfaceRef<IuxSysPropertyBag2> bag;
     const HRESULT status = CurrentProperties(context.expert, item, &bag);
     const std::string name = ItemText(item);
     if (status < 0) {
-        const std::string problem =
-            "cannot read the properties of " + name + ": " + StatusWithName(status);
-        if (context.json) {
-            context.out << "{\"item\":" << JsonQuoted(name) << ",\"error\":{" << StatusJson(status)
-                        << "}}\n";
+        if (status == UX_E_ITEM_NOT_FOUND && named != nullptr) {
+            throw CommandFailure(kExitUsageError, "there is no item " + name, status);
         }
-        context.err << "kestcfg: " << problem << "\n";
+        items.push_back(
+            {{"item", name},
+             {"error", {{"status", StatusName(status)}, {"code", StatusText(status)}}}});
+        context.err << "kestcfg: cannot read the properties of " << PrintableText(name) << ": "
+                    << StatusWithName(status) << "\n";
         return false;
     }
-    const std::vector<PropertyEntry> entries = ReadProperties(bag.Get(), AllTags(bag.Get()));
-    if (context.json) {
-        context.out << "{\"item\":" << JsonQuoted(name)
-                    << ",\"properties\":" << PropertiesAsJson(entries) << "}\n";
+    std::vector<uint32_t> tags;
+    std::vector<uint32_t> missing;
+    if (named != nullptr) {
+        SplitByPresence(bag.Get(), *named, &tags, &missing);
     } else {
+        tags = AllTags(bag.Get());
+    }
+    const std::vector<PropertyEntry> entries = ReadProperties(bag.Get(), tags);
+    Json shown = {{"item", name}, {"properties", PropertiesAsJson(entries)}};
+    if (named != nullptr) {
+        shown["missing"] = MissingAsJson(missing);
+    }
+    items.push_back(std::move(shown));
+    if (!context.options.json) {
         if (headed) {
-            context.out << name << "\n";
+            context.out << PrintableText(name) << "\n";
         }
         WritePropertyTable(context.out, entries, headed ? "  " : "");
     }
-    return true;
+    ReportMissing(context, name, missing, "has no property");
+    return missing.empty();
 }
 
 }  // namespace
 
 void RunItems(CommandContext& context) {
+    Json items = Json::array();
     for (const std::wstring& item : ItemNames(context.expert)) {
-        if (context.json) {
-            context.out << "{\"item\":" << JsonQuoted(ItemText(item)) << "}\n";
-        } else {
-            context.out << ItemText(item) << "\n";
+        items.push_back(ItemText(item));
+        if (!context.options.json) {
+            context.out << PrintableText(ItemText(item)) << "\n";
         }
     }
+    context.document["items"] = std::move(items);
 }
 
 void RunGet(CommandContext& context) {
+    Json& items = context.document["items"] = Json::array();
     if (!context.arguments.empty()) {
         const std::wstring item = ItemArgument(context.arguments[0]);
-        if (!ShowItemProperties(context, item, false)) {
+        const std::vector<std::string> words(context.arguments.begin() + 1,
+                                             context.arguments.end());
+        const std::vector<uint32_t> named = NamedTags(words);
+        if (!ShowItemProperties(context, item, words.empty() ? nullptr : &named, false, items)) {
             throw CommandFailure(kExitFailure, "");
         }
         return;
@@ -71,11 +123,11 @@ void RunGet(CommandContext& context) {
     bool allShown = true;
     bool first = true;
     for (const std::wstring& item : ItemNames(context.expert)) {
-        if (!first && !context.json) {
+        if (!first && !context.options.json) {
             context.out << "\n";
         }
         first = false;
-        allShown = ShowItemProperties(context, item, true) && allShown;
+        allShown = ShowItemProperties(context, item, nullptr, true, items) && allShown;
     }
     if (!allShown) {
         throw CommandFailure(kExitFailure, "");
@@ -84,25 +136,18 @@ void RunGet(CommandContext& context) {
 
 void RunRefresh(CommandContext& context) {
     const std::wstring item = ItemArgument(context.arguments[0]);
-    std::vector<uint32_t> requested;
-    for (size_t i = 1; i < context.arguments.size(); ++i) {
-        const std::optional<uint32_t> tag = TagFromWord(context.arguments[i]);
-        if (!tag) {
-            throw UsageError("unknown property " + context.arguments[i] +
-                             "; give a name that kestcfg get shows or a tag number");
-        }
-        if (std::find(requested.begin(), requested.end(), *tag) == requested.end()) {
-            requested.push_back(*tag);
-        }
-    }
+    const std::vector<uint32_t> requested =
+        NamedTags(std::vector<std::string>(context.arguments.begin() + 1, context.arguments.end()));
 
     InterfaceRef<IuxSysPropertyBag> refreshed;
     const HRESULT status = context.expert->PopulateOrRefreshProperties(
         item.c_str(), static_cast<uint32_t>(requested.size()), requested.data(),
         refreshed.Receive());
     if (status < 0) {
-        throw Failure("refreshing properties of " + ItemText(item) + " failed with " +
-                      StatusWithName(status));
+        throw CommandFailure(
+            kExitFailure,
+            "refreshing properties of " + ItemText(item) + " failed with " + StatusWithName(status),
+            status);
     }
     const InterfaceRef<IuxSysPropertyBag2> bag =
         QueryInterfaceAs<IuxSysPropertyBag2>(refreshed.Get(), IID_IuxSysPropertyBag2);
@@ -111,22 +156,13 @@ void RunRefresh(CommandContext& context) {
     }
     std::vector<uint32_t> present;
     std::vector<uint32_t> missing;
-    for (const uint32_t tag : requested) {
-        (bag->HasTag(tag) == S_OK ? present : missing).push_back(tag);
-    }
+    SplitByPresence(bag.Get(), requested, &present, &missing);
     const std::vector<PropertyEntry> entries = ReadProperties(bag.Get(), present);
-    if (context.json) {
-        context.out << "{\"item\":" << JsonQuoted(ItemText(item))
-                    << ",\"properties\":" << PropertiesAsJson(entries) << ",\"missing\":[";
-        for (size_t i = 0; i < missing.size(); ++i) {
-            context.out << (i == 0 ? "" : ",") << JsonQuoted(TagDisplayName(missing[i]));
-        }
-        context.out << "]}\n";
-    } else {
+    context.document = {{"item", ItemText(item)},
+                        {"properties", PropertiesAsJson(entries)},
+                        {"missing", MissingAsJson(missing)}};
+    if (!context.options.json) {
         WritePropertyTable(context.out, entries, "");
     }
-    for (const uint32_t tag : missing) {
-        context.err << "kestcfg: " << ItemText(item) << " did not provide " << TagDisplayName(tag)
-                    << "\n";
-    }
+    ReportMissing(context, ItemText(item), missing, "did not provide");
 }

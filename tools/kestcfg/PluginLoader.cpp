@@ -1,6 +1,8 @@
 #include "PluginLoader.h"
 
 #include <dlfcn.h>
+#include <stdlib.h>
+#include <unistd.h>
 
 #include "ExitCodes.h"
 #include "HostText.h"
@@ -16,7 +18,40 @@ std::string LoaderError() {
 }  // namespace
 
 std::string DefaultPluginPath() {
-    return ProgramDirectory() + kPluginFileName;
+    const std::string besideProgram = ProgramDirectory() + kPluginFileName;
+    if (access(besideProgram.c_str(), F_OK) == 0) {
+        return besideProgram;
+    }
+    return ProgramDirectory() + KESTCFG_PLUGIN_DIR_FROM_PROGRAM "/" + kPluginFileName;
+}
+
+SimulatorLibrary::SimulatorLibrary(bool asked) {
+    const std::string path =
+        ProgramDirectory() + KESTCFG_SIMULATOR_DIR_FROM_PROGRAM "/" + kSimulatorFileName;
+    const char* root = getenv("KEST_SYSROOT");
+    const bool simulatedSysroot =
+        root != nullptr && access((std::string(root) + kSimulatedStateFile).c_str(), F_OK) == 0;
+    if (access(path.c_str(), F_OK) != 0) {
+        if (asked) {
+            throw Failure("--simulator: the simulated controller library is not installed at " +
+                          path);
+        }
+        return;
+    }
+    if (!asked && !simulatedSysroot) {
+        return;
+    }
+    handle_ = dlopen(path.c_str(), RTLD_NOW | RTLD_GLOBAL);
+    if (handle_ == nullptr) {
+        throw Failure("cannot load the simulated controller library " + path + ": " +
+                      LoaderError());
+    }
+}
+
+SimulatorLibrary::~SimulatorLibrary() {
+    if (handle_ != nullptr) {
+        dlclose(handle_);
+    }
 }
 
 Plugin::Plugin(const std::string& path) : path_(path) {

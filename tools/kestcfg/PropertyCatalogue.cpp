@@ -20,66 +20,123 @@ constexpr NumberStyle kDec = NumberStyle::kDecimal;
 constexpr NumberStyle kHex = NumberStyle::kHexadecimal;
 
 // Rows whose value is a fixed fact the plug-in reports and never reads back carry the name
-// "fixed-" and the tag's leading hexadecimal digits: their meaning belongs to the host.
+// "fixed-" and the tag's leading hexadecimal digits: their meaning belongs to the host. The
+// values of mode properties are listed by their names (ModeNames), not here.
 constexpr PropertyDescription kCatalogue[] = {
     // Rows every item reports.
-    {0x0101C000, "fixed-0101c", kLong, kDec},
-    {0x0101D000, "item-name", kText, kDec},
-    {0x0102A000, "numeric-attribute", kLong, kDec},
-    {0x0101F000, "host-name", kText, kDec},
-    {0x01037000, "fixed-01037", kULong, kHex},
-    {0x01038000, "fixed-01038", kBool, kDec},
-    {0x01039000, "fixed-01039", kLong, kDec},
-    {0x0103A000, "fixed-0103a", kULong, kDec},
+    {0x0101C000, "fixed-0101c", kLong, kDec, ItemKind::kAny, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0101D000, "item-name", kText, kDec, ItemKind::kAny, Change::kNo, "", "the item's name"},
+    {0x0102A000, "numeric-attribute", kLong, kDec, ItemKind::kAny, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0101F000, "host-name", kText, kDec, ItemKind::kAny, Change::kAfterRestart,
+     "1 to 63 letters, digits and hyphens, starting and ending with a letter or digit, not only "
+     "digits",
+     "the controller's host name (the chassis item); the item name (adapters)"},
+    {0x01037000, "fixed-01037", kULong, kHex, ItemKind::kAny, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01038000, "fixed-01038", kBool, kDec, ItemKind::kAny, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01039000, "fixed-01039", kLong, kDec, ItemKind::kAny, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0103A000, "fixed-0103a", kULong, kDec, ItemKind::kAny, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
     // The chassis item.
-    {0x01001000, "fixed-01001", kBool, kDec},
-    {0x01024000, "fixed-01024", kLong, kDec},
-    {0x01002000, "fixed-01002", kULong, kDec},
-    {0x01006000, "description", kText, kDec},
-    {0x01005000, "target-id", kULong, kDec},
-    {0x0103C000, "target-class", kText, kDec},
-    {0x01008000, "fixed-01008", kBool, kDec},
-    {0x01004000, "vendor", kText, kDec},
-    {0x01003000, "fixed-01003", kULong, kHex},
-    {0x01007000, "serial-number", kText, kDec},
-    {0x0103D000, "comment", kText, kDec},
-    {0x0D11D000, "locale", kText, kDec},
-    {0x0D11E000, "supported-locales", kText, kDec},
-    {0x0D12B000, "time-zone-offset", kLong, kDec},
-    {0x0D120000, "legacy-time-zone", kText, kDec},
-    {0x0D14E000, "time-zone", kText, kDec},
-    {0x0D129000, "fixed-0d129", kBool, kDec},
-    {0x0102F000, "firmware-version", kText, kDec},
-    {0x0104C000, "fixed-0104c", kLong, kDec},
-    {0x0104A000, "fixed-0104a", kBool, kDec},
-    {0x0104B000, "fixed-0104b", kText, kDec},
-    {0x01056000, "fixed-01056", kBool, kDec},
-    {0x01055000, "fixed-01055", kBool, kDec},
-    {0x21004000, "web-service", kBool, kDec},
-    {0x0D114000, "dns-name", kText, kDec},
-    {0x0D11F000, "current-time", kTime, kDec},
+    {0x01001000, "fixed-01001", kBool, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01024000, "fixed-01024", kLong, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01002000, "fixed-01002", kULong, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01006000, "description", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the device description"},
+    {0x01005000, "target-id", kULong, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the target identifier"},
+    {0x0103C000, "target-class", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the target class"},
+    {0x01008000, "fixed-01008", kBool, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01004000, "vendor", kText, kDec, ItemKind::kChassis, Change::kNo, "", "the vendor's name"},
+    {0x01003000, "fixed-01003", kULong, kHex, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01007000, "serial-number", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the serial number, eight hexadecimal digits"},
+    {0x0103D000, "comment", kText, kDec, ItemKind::kChassis, Change::kYes,
+     "text of up to 64 bytes (UTF-8)", "a comment for the people who look after the controller"},
+    {0x0D11D000, "locale", kText, kDec, ItemKind::kChassis, Change::kAfterRestart,
+     "one of supported-locales", "the language code of the controller's user interface"},
+    {0x0D11E000, "supported-locales", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the language codes the controller supports"},
+    {0x0D12B000, "time-zone-offset", kLong, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the time zone's offset from UTC as the controller reports it"},
+    {0x0D120000, "legacy-time-zone", kText, kDec, ItemKind::kChassis, Change::kYes,
+     "a POSIX time-zone text of the time-zone table, such as CET-1CEST",
+     "the time zone in POSIX notation"},
+    {0x0D14E000, "time-zone", kText, kDec, ItemKind::kChassis, Change::kYes,
+     "a time-zone name such as Europe/Berlin", "the time zone by name"},
+    {0x0D129000, "fixed-0d129", kBool, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0102F000, "firmware-version", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the installed firmware's version"},
+    {0x0104C000, "fixed-0104c", kLong, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0104A000, "fixed-0104a", kBool, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0104B000, "fixed-0104b", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01056000, "fixed-01056", kBool, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x01055000, "fixed-01055", kBool, kDec, ItemKind::kChassis, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x21004000, "web-service", kBool, kDec, ItemKind::kChassis, Change::kAfterRestart,
+     "true or false", "whether the controller's web service runs"},
+    {0x0D114000, "dns-name", kText, kDec, ItemKind::kChassis, Change::kNo, "",
+     "the fully qualified DNS name (refresh reads it)"},
+    {0x0D11F000, "current-time", kTime, kDec, ItemKind::kChassis, Change::kYes,
+     "an ISO 8601 UTC time from 1970 on, or now",
+     "the controller's clock (refresh reads it; never exported)"},
     // The network adapter item.
-    {0x0D104000, "mac-address", kText, kDec},
-    {0x0D126000, "primary-adapter", kBool, kDec},
-    {0x0D105000, "ip-request-mode", kULong, kHex},
-    {0x0D106000, "supported-ip-request-modes", kULong, kHex},
-    {0x0D107000, "ip-address", kText, kDec},
-    {0x0D108000, "fixed-0d108", kULong, kDec},
-    {0x0D109000, "subnet-mask", kText, kDec},
-    {0x0D10A000, "gateway", kText, kDec},
-    {0x0D10B000, "dns-server", kText, kDec},
-    {0x0D10F000, "preferred-media-mode", kULong, kHex},
-    {0x0D110000, "supported-media-modes", kULong, kHex},
-    {0x0D111000, "media-mode", kULong, kHex},
-    {0x0D118000, "ethercat-master-id", kULong, kDec},
-    {0x0D155000, "ethercat-flag", kBool, kDec},
+    {0x0D104000, "mac-address", kText, kDec, ItemKind::kAdapter, Change::kNo, "",
+     "the adapter's MAC address"},
+    {0x0D126000, "primary-adapter", kBool, kDec, ItemKind::kAdapter, Change::kYes,
+     "true makes this adapter the primary one", "whether this is the primary adapter"},
+    {0x0D105000, "ip-request-mode", kULong, kHex, ItemKind::kAdapter, Change::kYes, "",
+     "how the adapter gets its address"},
+    {0x0D106000, "supported-ip-request-modes", kULong, kHex, ItemKind::kAdapter, Change::kNo, "",
+     "the address request modes the adapter supports"},
+    {0x0D107000, "ip-address", kText, kDec, ItemKind::kAdapter, Change::kYes,
+     "a dotted IPv4 address (static request mode)", "the adapter's IPv4 address"},
+    {0x0D108000, "fixed-0d108", kULong, kDec, ItemKind::kAdapter, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0D109000, "subnet-mask", kText, kDec, ItemKind::kAdapter, Change::kYes,
+     "a dotted IPv4 mask with contiguous one-bits", "the subnet mask"},
+    {0x0D10A000, "gateway", kText, kDec, ItemKind::kAdapter, Change::kYes,
+     "a dotted IPv4 address in the adapter's subnet, or 0.0.0.0", "the default gateway"},
+    {0x0D10B000, "dns-server", kText, kDec, ItemKind::kAdapter, Change::kYes,
+     "a dotted IPv4 address", "the DNS server"},
+    {0x0D10F000, "preferred-media-mode", kULong, kHex, ItemKind::kAdapter, Change::kYes, "",
+     "the link speed and duplex the adapter prefers"},
+    {0x0D110000, "supported-media-modes", kULong, kHex, ItemKind::kAdapter, Change::kNo, "",
+     "the link modes the adapter supports"},
+    {0x0D111000, "media-mode", kULong, kHex, ItemKind::kAdapter, Change::kNo, "",
+     "the link mode in use"},
+    {0x0D118000, "ethercat-master-id", kULong, kDec, ItemKind::kAdapter, Change::kYes, "0 to 255",
+     "the EtherCAT master identifier (EtherCAT mode)"},
+    {0x0D155000, "ethercat-flag", kBool, kDec, ItemKind::kAdapter, Change::kYes, "true or false",
+     "the EtherCAT flag (EtherCAT mode)"},
     // The Ethernet adapter's own rows.
-    {0x0D12C000, "fixed-0d12c", kULong, kDec},
-    {0x0D102000, "adapter-mode", kULong, kHex},
-    {0x0D103000, "supported-adapter-modes", kULong, kHex},
-    {0x0D119000, "supported-polling-modes", kULong, kHex},
-    {0x0D11A000, "polling-mode", kULong, kHex},
-    {0x0D11B000, "polling-interval", kULong, kDec},
+    {0x0D12C000, "fixed-0d12c", kULong, kDec, ItemKind::kAdapter, Change::kNo, "",
+     "a fixed fact the controller reports to configuration hosts"},
+    {0x0D102000, "adapter-mode", kULong, kHex, ItemKind::kAdapter, Change::kAfterRestart, "",
+     "what the adapter is used for (a change to or from EtherCAT needs a restart)"},
+    {0x0D103000, "supported-adapter-modes", kULong, kHex, ItemKind::kAdapter, Change::kNo, "",
+     "the adapter modes the adapter supports"},
+    {0x0D119000, "supported-polling-modes", kULong, kHex, ItemKind::kAdapter, Change::kNo, "",
+     "the polling modes the adapter supports"},
+    {0x0D11A000, "polling-mode", kULong, kHex, ItemKind::kAdapter, Change::kYes, "",
+     "whether the adapter is polled"},
+    {0x0D11B000, "polling-interval", kULong, kDec, ItemKind::kAdapter, Change::kYes,
+     "1 to 10000 (milliseconds)", "the polling interval in milliseconds (polling mode)"},
 };
 
 // A tag number in "0x" hexadecimal or decimal, nothing else.
@@ -101,6 +158,29 @@ std::optional<uint32_t> ParseTagNumber(const std::string& word) {
 }
 
 }  // namespace
+
+const std::vector<const PropertyDescription*>& AllProperties() {
+    static const std::vector<const PropertyDescription*> all = [] {
+        std::vector<const PropertyDescription*> rows;
+        for (const PropertyDescription& description : kCatalogue) {
+            rows.push_back(&description);
+        }
+        return rows;
+    }();
+    return all;
+}
+
+Change ChangeOn(const PropertyDescription& description, bool chassis) {
+    const bool ofThisKind = description.kind == ItemKind::kAny
+                                ? chassis  // only the chassis takes a new host name
+                                : (description.kind == ItemKind::kChassis) == chassis;
+    return ofThisKind ? description.change : Change::kNo;
+}
+
+bool IsSetting(const PropertyDescription& description, bool chassis) {
+    return ChangeOn(description, chassis) != Change::kNo &&
+           description.type != UX_PROPERTY_TYPE_TIMESTAMP;
+}
 
 const PropertyDescription* FindProperty(uint32_t tag) {
     for (const PropertyDescription& description : kCatalogue) {

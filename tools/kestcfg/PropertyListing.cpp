@@ -3,19 +3,11 @@
 #include "BagValues.h"
 #include "HostText.h"
 #include "PropertyCatalogue.h"
+#include "PropertyText.h"
 #include "StatusNames.h"
 #include "TextTable.h"
 #include "ValueText.h"
 #include "uxsys/StatusCodes.h"
-
-namespace {
-
-NumberStyle StyleOf(uint32_t tag) {
-    const PropertyDescription* description = FindProperty(tag);
-    return description != nullptr ? description->style : NumberStyle::kDecimal;
-}
-
-}  // namespace
 
 std::vector<PropertyEntry> ReadProperties(IuxSysPropertyBag2* bag,
                                           const std::vector<uint32_t>& tags) {
@@ -39,27 +31,23 @@ void WritePropertyTable(std::ostream& out, const std::vector<PropertyEntry>& ent
         } else {
             table.AddRow({TagText(entry.tag), TagDisplayName(entry.tag),
                           TypeCodeName(TypeCodeOf(entry.value)),
-                          ValueForPeople(entry.value, StyleOf(entry.tag))});
+                          PropertyValueText(entry.tag, entry.value)});
         }
     }
     table.Write(out, indent);
 }
 
-std::string PropertiesAsJson(const std::vector<PropertyEntry>& entries) {
-    std::string json = "{";
+Json PropertiesAsJson(const std::vector<PropertyEntry>& entries) {
+    Json json = Json::object();
     for (const PropertyEntry& entry : entries) {
-        if (json.size() > 1) {
-            json += ",";
-        }
-        json +=
-            JsonQuoted(TagDisplayName(entry.tag)) + ":{\"tag\":" + JsonQuoted(TagText(entry.tag));
+        Json property = {{"tag", TagText(entry.tag)}};
         if (entry.status < 0) {
-            json += ",\"error\":" + JsonQuoted(StatusWithName(entry.status));
+            property["error"] = StatusWithName(entry.status);
         } else {
-            json += ",\"type\":" + JsonQuoted(TypeCodeName(TypeCodeOf(entry.value))) +
-                    ",\"value\":" + ValueAsJson(entry.value);
+            property["type"] = TypeCodeName(TypeCodeOf(entry.value));
+            property["value"] = ValueAsJson(entry.value);
         }
-        json += "}";
+        json[TagDisplayName(entry.tag)] = std::move(property);
     }
-    return json + "}";
+    return json;
 }

@@ -6,6 +6,7 @@
 #include <string>
 #include <vector>
 
+#include "JsonOutput.h"
 #include "PropertyValue.h"
 #include "uxsys/PropertyBag.h"
 
@@ -26,4 +27,4 @@ void WritePropertyTable(std::ostream& out, const std::vector<PropertyEntry>& ent
 // A JSON object with one member per property, named as kestcfg names the tag:
 // {"host-name":{"tag":"0x0101F000","type":"text","value":"kest-demo"},...}; a property that
 // could not be read has "error" instead of "type" and "value".
-std::string PropertiesAsJson(const std::vector<PropertyEntry>& entries);
+Json PropertiesAsJson(const std::vector<PropertyEntry>& entries);

@@ -29,28 +29,16 @@ std::string AbsoluteDirectory(const std::string& directory) {
 }  // namespace
 
 void RunSim(CommandContext& context) {
-    if (context.arguments[0] != "init") {
-        throw UsageError("unknown sim command " + context.arguments[0] +
-                         "; usage: kestcfg sim init DIR");
-    }
-    if (context.arguments[1].empty()) {
-        throw UsageError("sim init needs a directory");
-    }
-    const std::string root = AbsoluteDirectory(context.arguments[1]);
+    const std::string root = AbsoluteDirectory(context.arguments[0]);
     const std::vector<std::string> files = CreateDemoController(root, FindTimeZoneTable());
-
-    if (context.json) {
-        context.out << "{\"sysroot\":" << JsonQuoted(root) << ",\"files\":[";
-        for (size_t i = 0; i < files.size(); ++i) {
-            context.out << (i == 0 ? "" : ",") << JsonQuoted(files[i]);
-        }
-        context.out << "]}\n";
+    context.document = {{"sysroot", root}, {"files", files}};
+    if (context.options.json) {
         return;
     }
-    context.out << "Created a demo controller in " << root << ":\n";
+    context.out << "Created a demo controller in " << PrintableText(root) << ":\n";
     for (const std::string& file : files) {
-        context.out << "  " << file << "\n";
+        context.out << "  " << PrintableText(file) << "\n";
     }
-    context.out << "Use it with: kestcfg --sysroot " << root << " items\n"
-                << "         or: export KEST_SYSROOT=" << root << "\n";
+    context.out << "Use it with: kestcfg --sysroot " << PrintableText(root) << " items\n"
+                << "         or: export KEST_SYSROOT=" << PrintableText(root) << "\n";
 }

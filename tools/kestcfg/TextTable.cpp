@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <stdexcept>
 
+#include "HostText.h"
+
 namespace {
 
 // The number of characters of UTF-8 text (bytes that do not continue a character).
@@ -21,6 +23,9 @@ TextTable::TextTable(std::vector<std::string> headings) {
 void TextTable::AddRow(std::vector<std::string> cells) {
     if (cells.size() != rows_.front().size()) {
         throw std::logic_error("a table row has the wrong number of cells");
+    }
+    for (std::string& cell : cells) {
+        cell = PrintableText(cell);
     }
     rows_.push_back(std::move(cells));
 }

@@ -10,7 +10,8 @@ class TextTable {
   public:
     explicit TextTable(std::vector<std::string> headings);
 
-    // Adds a row; it must have as many cells as there are headings.
+    // Adds a row; it must have as many cells as there are headings. Control characters in the
+    // cells are shown as escapes.
     void AddRow(std::vector<std::string> cells);
 
     // Writes the headings and the rows, each line starting with `indent`.

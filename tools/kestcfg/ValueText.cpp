@@ -175,23 +175,28 @@ std::string ValueForPeople(const PropertyValue& value, NumberStyle style) {
     }
 }
 
-std::string ValueAsJson(const PropertyValue& value) {
+Json ValueAsJson(const PropertyValue& value) {
     switch (TypeCodeOf(value)) {
         case UX_PROPERTY_TYPE_BOOL:
+            return std::get<bool>(value);
         case UX_PROPERTY_TYPE_LONG:
-            return ValueForPeople(value, NumberStyle::kDecimal);
+            return std::get<int32_t>(value);
         case UX_PROPERTY_TYPE_ULONG:
-            return UnsignedText(std::get<uint32_t>(value), NumberStyle::kDecimal);
+            return std::get<uint32_t>(value);
         case UX_PROPERTY_TYPE_DOUBLE:
-            return DoubleText(std::get<double>(value));
+            return std::get<double>(value);
         case UX_PROPERTY_TYPE_TIMESTAMP: {
             const uxSysAttrTimestampUTC& time = std::get<uxSysAttrTimestampUTC>(value);
             const std::string text = IsNoTime(time) ? std::string() : TimestampToIso8601(time);
-            return text.empty() ? "null" : JsonQuoted(text);
+            return text.empty() ? Json(nullptr) : Json(text);
         }
         default:
-            return JsonQuoted(ValueForPeople(value, NumberStyle::kDecimal));
+            return ValueForPeople(value, NumberStyle::kDecimal);
     }
+}
+
+bool SameValue(const PropertyValue& a, const PropertyValue& b) {
+    return a.index() == b.index() && ValueAsJson(a) == ValueAsJson(b);
 }
 
 std::optional<PropertyValue> ParseValue(const std::string& text, uint32_t type) {

@@ -4,6 +4,7 @@
 #include <optional>
 #include <string>
 
+#include "JsonOutput.h"
 #include "PropertyCatalogue.h"
 #include "PropertyValue.h"
 
@@ -13,7 +14,10 @@ std::string ValueForPeople(const PropertyValue& value, NumberStyle style);
 
 // The value as a JSON value: booleans, numbers, strings; a timestamp as its ISO 8601 text, or
 // null for "no time".
-std::string ValueAsJson(const PropertyValue& value);
+Json ValueAsJson(const PropertyValue& value);
+
+// True when both values are of the same kind and equal.
+bool SameValue(const PropertyValue& a, const PropertyValue& b);
 
 // Parses command-line text as a value of bag type `type`. Booleans: true/false, yes/no, on/off,
 // 1/0. Integers: decimal, or hexadecimal with "0x"; out of range fails. Timestamps: ISO 8601 UTC

@@ -4,6 +4,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cstring>
 #include <exception>
 #include <iostream>
 #include <memory>
@@ -12,10 +13,15 @@
 
 #include "CommandLine.h"
 #include "Commands.h"
+#include "DocumentOutput.h"
 #include "ExitCodes.h"
 #include "ExpertSession.h"
+#include "HostText.h"
 #include "Interruption.h"
 #include "PluginLoader.h"
+#include "StatusNames.h"
+#include "TextLocale.h"
+#include "uxsys/HostString.h"
 
 namespace {
 
@@ -37,52 +43,95 @@ std::string PluginPathArgument(const std::string& path) {
     return path.find('/') == std::string::npos ? "./" + path : path;
 }
 
-int Run(int argc, const char* const* argv) {
-    const CommandLine line = ParseCommandLine(argc, argv);
-    if (line.help) {
-        std::cout << UsageText();
-        return kExitSuccess;
+// True when the arguments ask for JSON; read before parsing so that a usage error is reported
+// as a JSON document too.
+bool AsksForJson(int argc, const char* const* argv) {
+    for (int i = 1; i < argc && std::strcmp(argv[i], "--") != 0; ++i) {
+        if (std::strcmp(argv[i], "--json") == 0) {
+            return true;
+        }
     }
-    const CommandDescription* command = FindCommand(line.command);
-    if (command == nullptr) {
-        throw UsageError("unknown command " + line.command);
-    }
-    if (line.arguments.size() < command->minArguments ||
-        line.arguments.size() > command->maxArguments) {
-        throw UsageError("wrong number of arguments; usage: kestcfg [OPTIONS] " +
-                         command->synopsis);
-    }
-    CommandContext context{nullptr, line.arguments, line.json, std::cout, std::cerr};
-    if (command->expertUse == ExpertUse::kNone) {
-        command->run(context);
-        return kExitSuccess;
-    }
+    return false;
+}
 
-    if (!line.sysroot.empty()) {
-        UseSysroot(line.sysroot, "--sysroot");
-    } else if (const char* fromEnvironment = getenv("KEST_SYSROOT");
-               fromEnvironment != nullptr && *fromEnvironment != '\0') {
-        UseSysroot(fromEnvironment, "KEST_SYSROOT");
+// The plug-in's version, reported by a fresh expert.
+std::string PluginVersion(IuxSysExpert3* expert) {
+    CvqBStr text = nullptr;
+    const HRESULT status = expert->GetExpertVersion(&text);
+    std::string version = TakeHostString(text);
+    if (status < 0) {
+        throw Failure("GetExpertVersion failed with " + StatusWithName(status));
+    }
+    return version;
+}
+
+// Runs the command the line names; the plug-in is unloaded when this returns.
+void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) {
+    const ExpertUse use = line.version ? ExpertUse::kIdentity : line.command->expertUse;
+    if (use != ExpertUse::kNone) {
+        if (!line.options.sysroot.empty()) {
+            UseSysroot(line.options.sysroot, "--sysroot");
+        } else if (const char* fromEnvironment = getenv("KEST_SYSROOT");
+                   fromEnvironment != nullptr && *fromEnvironment != '\0') {
+            UseSysroot(fromEnvironment, "KEST_SYSROOT");
+        }
+    }
+    if (use == ExpertUse::kNone || use == ExpertUse::kSysroot) {
+        CommandContext context{nullptr, line.arguments, line.options, document, out, std::cerr};
+        line.command->run(context);
+        return;
+    }
+    const std::string pluginPath =
+        line.options.plugin.empty() ? DefaultPluginPath() : PluginPathArgument(line.options.plugin);
+    if (line.version) {
+        // The tool's version even when the plug-in cannot be loaded.
+        document["kestcfg"] = KESTCFG_VERSION;
+        if (!line.options.json) {
+            out << "kestcfg " << KESTCFG_VERSION << std::endl;
+        }
     }
     std::optional<ControllerTurn> turn;
-    if (command->takesTurn) {
-        turn.emplace(line.noWait, std::cerr);
-        context.turn = &*turn;
+    if (!line.version && line.command->takesTurn) {
+        turn.emplace(line.options.noWait, std::cerr);
     }
-    const Plugin plugin(line.plugin.empty() ? DefaultPluginPath()
-                                            : PluginPathArgument(line.plugin));
+    const SimulatorLibrary simulator(line.options.simulator);
+    const Plugin plugin(pluginPath);
     const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
-    context.expert = expert.Get();
+    if (line.version) {
+        const std::string version = PluginVersion(expert.Get());
+        document["plugin"] = version;
+        document["pluginPath"] = pluginPath;
+        if (!line.options.json) {
+            out << "plug-in " << version << " (" << pluginPath << ")\n";
+        }
+        return;
+    }
+    CommandContext context{expert.Get(), line.arguments, line.options, document, out, std::cerr};
+    context.turn = turn ? &*turn : nullptr;
     // Ends the handling of interruptions a command began once Uninitialize has returned.
     struct InterruptionHandlingEnd {
         ~InterruptionHandlingEnd() { EndInterruptionHandling(); }
     } interruptionHandlingEnd;
     std::unique_ptr<ExpertSession> session;
-    if (command->expertUse == ExpertUse::kItems) {
+    if (line.command->expertUse == ExpertUse::kItems) {
         session = std::make_unique<ExpertSession>(expert.Get());
     }
-    command->run(context);
-    return kExitSuccess;
+    line.command->run(context);
+}
+
+// Adds the failure to the JSON document: exit status, message and the plug-in's status.
+void RecordFailure(Json& document, int code, const std::string& message,
+                   std::optional<HRESULT> status) {
+    if (!document.is_object()) {
+        document = Json::object();
+    }
+    Json error = {{"exitStatus", code}, {"message", message}};
+    if (status) {
+        const std::string name = StatusName(*status);
+        error["status"] = name.empty() ? Json(nullptr) : Json(name);
+        error["code"] = StatusText(*status);
+    }
+    document["error"] = std::move(error);
 }
 
 // The exit code of a run that ended with `code`, unless a signal interrupted it.
@@ -94,20 +143,47 @@ int ExitCodeUnlessInterrupted(int code) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    UseTextLocale();
+    const bool json = AsksForJson(argc, argv);
+    DocumentOutput output(json);
+    Json document = Json::object();
+    int code = kExitSuccess;
+    std::string helpTopic = "kestcfg";
     try {
-        return ExitCodeUnlessInterrupted(Run(argc, argv));
+        const CommandLine line = ParseCommandLine(argc, argv);
+        if (line.command != nullptr) {
+            helpTopic += " " + line.command->name;
+        }
+        if (line.help) {
+            output.Write(*line.help);
+            return kExitSuccess;
+        }
+        RunCommandLine(line, document, std::cout);
     } catch (const CommandFailure& failure) {
         std::cout.flush();
-        if (*failure.what() != '\0') {
-            std::cerr << "kestcfg: " << failure.what() << "\n";
+        code = failure.Code();
+        std::string message = failure.what();
+        std::string hint = "Try '" + helpTopic + " --help' for more information.";
+        if (const size_t split = message.find("\nTry '"); split != std::string::npos) {
+            hint = message.substr(split + 1);
+            message.erase(split);
         }
-        if (failure.Code() == kExitUsageError) {
-            std::cerr << "Try 'kestcfg --help' for more information.\n";
+        if (!message.empty()) {
+            std::cerr << "kestcfg: " << PrintableText(message) << "\n";
         }
-        return ExitCodeUnlessInterrupted(failure.Code());
+        if (code == kExitUsageError) {
+            std::cerr << hint << "\n";
+        }
+        RecordFailure(document, code, message, failure.Status());
     } catch (const std::exception& failure) {
         std::cout.flush();
-        std::cerr << "kestcfg: " << failure.what() << "\n";
-        return ExitCodeUnlessInterrupted(kExitFailure);
+        code = kExitFailure;
+        std::cerr << "kestcfg: " << PrintableText(failure.what()) << "\n";
+        RecordFailure(document, code, failure.what(), std::nullopt);
     }
+    code = ExitCodeUnlessInterrupted(code);
+    if (json) {
+        output.Write(JsonText(document) + "\n");
+    }
+    return code;
 }
