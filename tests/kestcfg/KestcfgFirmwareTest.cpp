@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "common/TempSysroot.h"
@@ -173,8 +174,12 @@ TEST_F(KestcfgFirmwareTest, AfterKestcfgIsKilledTheOrphanedToolKeepsOtherUpdates
     FinishProgram(killed);
     const RunResult refused = RunKestcfg(FirmwareArguments("/images/firmware.bin"));
     EXPECT_EQ(4, refused.exitCode) << refused.err;
+    const RunResult followed = RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"});
+    EXPECT_EQ(0u, followed.out.find("A firmware update is running")) << followed.out;
     ReleaseTool();
     ASSERT_TRUE(PollUntil([&] { return ToolHas("finished") && !UpdateLockHeld(); }));
+    EXPECT_EQ(0u, RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"})
+                      .out.find("No firmware update is running."));
     const RunResult accepted = RunKestcfg(FirmwareArguments("/images/firmware.bin"));
     EXPECT_EQ(0, accepted.exitCode) << accepted.err;
 }

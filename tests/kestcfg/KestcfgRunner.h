@@ -109,8 +109,8 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
     return FinishProgram(running);
 }
 
-// Starts the kestcfg at `program` in the background with `environment`; when the tests run under
-// an emulator (a cross build), through the same emulator command.
+// Starts the kestcfg at `program` in the background; when the tests run under an emulator (a
+// cross build), through the same emulator command.
 inline RunningProgram StartKestcfgAt(const std::string& program,
                                      const std::vector<std::string>& arguments,
                                      char* const* environment = environ,
@@ -139,12 +139,6 @@ inline RunResult RunKestcfgAt(const std::string& program, const std::vector<std:
     return FinishProgram(running);
 }
 
-// Runs the built kestcfg and waits for it.
-inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
-                            char* const* environment = environ) {
-    return RunKestcfgAt(KESTCFG_PATH, arguments, environment);
-}
-
 // Polls `condition` every 10 ms, at most `limitMs`; true once it holds.
 template <class Condition>
 bool PollUntil(Condition condition, int limitMs = 60000) {
@@ -155,6 +149,12 @@ bool PollUntil(Condition condition, int limitMs = 60000) {
         usleep(10000);
     }
     return condition();
+}
+
+// Runs the built kestcfg.
+inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
+                            char* const* environment = environ) {
+    return RunKestcfgAt(KESTCFG_PATH, arguments, environment);
 }
 
 // Parses `json` with python3 as exactly one JSON document and returns every scalar as a line

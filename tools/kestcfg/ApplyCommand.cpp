@@ -14,7 +14,6 @@
 #include "ConfirmableChange.h"
 #include "ExitCodes.h"
 #include "HostText.h"
-#include "Interruption.h"
 #include "ItemAccess.h"
 #include "ItemChange.h"
 #include "PropertyCatalogue.h"
@@ -246,9 +245,6 @@ void ApplySettings(CommandContext& context, const Json& desired, const std::stri
         }
     }
     const ConfirmWatch watch = PrepareConfirmableChange(context, requests);
-    // From here the controller changes: an interruption waits until the plug-in has finished,
-    // so that an interface it takes down comes up again.
-    DeferInterruptions();
     Json& applied = context.document["applied"] = Json::object();
     bool restartRequired = false;
     size_t stored = 0;

@@ -26,6 +26,7 @@
 namespace {
 
 constexpr useconds_t kPollInterval = 200000;
+constexpr char kUpdateLockFile[] = "/var/run/firmware_update/update.lock";
 constexpr int kBarWidth = 20;
 
 struct UpdateStatus {
@@ -126,6 +127,27 @@ std::string FailureReason(std::optional<HRESULT> reported) {
     return "the update tool ended with a failure (a nonzero exit status, or it could not start)";
 }
 
+// The process id recorded in the controller's firmware update lock when some process holds the
+// lock; empty when it is free or cannot be examined.
+std::string UpdateLockHolder() {
+    const char* root = getenv("KEST_SYSROOT");
+    const std::string path =
+        std::string(root != nullptr && root[0] == '/' ? root : "") + kUpdateLockFile;
+    const int file = open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
+    if (file < 0) {
+        return std::string();
+    }
+    std::string holder;
+    if (flock(file, LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK) {
+        char text[32] = {};
+        const ssize_t count = pread(file, text, sizeof text - 1, 0);
+        holder = count > 0 ? std::string(text, static_cast<size_t>(count)) : "?";
+        holder.erase(holder.find_last_not_of(" \n") + 1);
+    }
+    close(file);
+    return holder;
+}
+
 }  // namespace
 
 void RunFirmware(CommandContext& context) {
@@ -142,18 +164,19 @@ void RunFirmware(CommandContext& context) {
     const HRESULT prepared =
         firmware->PrepareFirmwareUpdate(item.c_str(), 0, image.GetImageSize(), updateId.Receive());
     if (prepared < 0) {
-        if (const UpdateLock lock = ReadUpdateLock(); lock.held) {
-            throw CommandFailure(
-                kExitBusy,
-                "another firmware update of the controller is under way" +
-                    (lock.pid ? " (process " + std::to_string(*lock.pid) + ")" : std::string()),
-                prepared);
+        const std::string holder = UpdateLockHolder();
+        if (!holder.empty()) {
+            throw CommandFailure(kExitBusy,
+                                 "another firmware update of the controller is under way "
+                                 "(process " +
+                                     holder + "; see kestcfg firmware-status)",
+                                 prepared);
         }
         throw CommandFailure(kExitFailure,
                              "the plug-in refused to prepare the update (" +
                                  StatusWithName(prepared) +
-                                 "): not enough free space for twice the image, or an update is "
-                                 "under way (see kestcfg firmware-status)",
+                                 "): not enough free space for twice the image, or an update "
+                                 "is under way",
                              prepared);
     }
     // From here the update belongs to the tool; kestcfg only follows it.

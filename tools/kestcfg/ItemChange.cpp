@@ -1,5 +1,7 @@
 #include "ItemChange.h"
 
+#include "Interruption.h"
+
 #include <algorithm>
 
 #include "BagValues.h"
@@ -98,6 +100,9 @@ Validation ItemChange::Validate() {
 }
 
 HRESULT ItemChange::Persist(bool* restartRequired) {
+    // From here the controller changes: an interruption waits until the plug-in has finished,
+    // so that an interface it takes down comes up again.
+    DeferInterruptions();
     int32_t restart = 0;
     const HRESULT status = expert_->PersistPropertyChanges(item_.c_str(), bag_.Get(), &restart);
     *restartRequired = restart != 0;

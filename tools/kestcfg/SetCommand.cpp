@@ -71,9 +71,6 @@ void RunSet(CommandContext& context) {
     const Validation validation = change.Validate();
     CheckValidation(context.document, change, validation);
     const ConfirmWatch watch = PrepareConfirmableChange(context, {request});
-    // From here the controller changes: an interruption waits until the plug-in has finished,
-    // so that an interface it takes down comes up again.
-    DeferInterruptions();
     bool restartRequired = false;
     const HRESULT persisted = change.Persist(&restartRequired);
     const std::vector<ChangeOutcome> outcomes = change.ReadBack(persisted >= 0);

@@ -91,16 +91,12 @@ void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) 
         }
     }
     std::optional<ControllerTurn> turn;
-    if (line.command != nullptr && line.command->takesTurn) {
+    if (!line.version && line.command->takesTurn) {
         turn.emplace(line.options.noWait, std::cerr);
     }
     const SimulatorLibrary simulator(line.options.simulator);
     const Plugin plugin(pluginPath);
     const InterfaceRef<IuxSysExpert3> expert = plugin.CreateExpert();
-    // Ends the handling of interruptions a command began once Uninitialize has returned.
-    struct InterruptionHandlingEnd {
-        ~InterruptionHandlingEnd() { EndInterruptionHandling(); }
-    } interruptionHandlingEnd;
     if (line.version) {
         const std::string version = PluginVersion(expert.Get());
         document["plugin"] = version;
@@ -112,6 +108,10 @@ void RunCommandLine(const CommandLine& line, Json& document, std::ostream& out) 
     }
     CommandContext context{expert.Get(), line.arguments, line.options, document, out, std::cerr};
     context.turn = turn ? &*turn : nullptr;
+    // Ends the handling of interruptions a command began once Uninitialize has returned.
+    struct InterruptionHandlingEnd {
+        ~InterruptionHandlingEnd() { EndInterruptionHandling(); }
+    } interruptionHandlingEnd;
     std::unique_ptr<ExpertSession> session;
     if (line.command->expertUse == ExpertUse::kItems) {
         session = std::make_unique<ExpertSession>(expert.Get());
