@@ -139,6 +139,13 @@ inline RunResult RunKestcfgAt(const std::string& program, const std::vector<std:
     return FinishProgram(running);
 }
 
+// True when kestcfg runs natively. Under an emulator (a cross build, where the kernel does not
+// start foreign binaries by itself) a kestcfg cannot start another kestcfg, such as the watcher
+// of a change that undoes itself.
+inline bool KestcfgStartsItself() {
+    return std::vector<std::string>{KEST_TEST_EMULATOR}.empty();
+}
+
 // Polls `condition` every 10 ms, at most `limitMs`; true once it holds.
 template <class Condition>
 bool PollUntil(Condition condition, int limitMs = 60000) {

@@ -85,16 +85,19 @@ TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {
     ASSERT_EQ(0, mkdir(home.c_str(), 0700));
     ASSERT_EQ(0, chown(home.c_str(), 65534, 65534));
     const std::string root = home + "/controller";
-    const std::vector<std::vector<std::string>> steps = {
+    std::vector<std::vector<std::string>> steps = {
         {"sim", "init", root},
         {"--sysroot", root, "get", "chassis", "comment"},
         {"--sysroot", root, "set", "chassis", "comment=mine", "web-service=true"},
         {"--sysroot", root, "set", "eth0", "polling-interval=250"},
-        {"--sysroot", root, "set", "eth0", "polling-interval=260", "--confirm-within", "60"},
-        {"--sysroot", root, "confirm"},
         {"--sysroot", root, "firmware", "eth0", root + "/etc/korvane/version"},
         {"--sysroot", root, "firmware-status"},
     };
+    if (kestcfg_test::KestcfgStartsItself()) {
+        steps.push_back(
+            {"--sysroot", root, "set", "eth0", "polling-interval=260", "--confirm-within", "60"});
+        steps.push_back({"--sysroot", root, "confirm"});
+    }
     const pid_t child = fork();
     ASSERT_GE(child, 0);
     if (child == 0) {
