@@ -18,6 +18,7 @@
 
 namespace {
 
+using kestcfg_test::CountOf;
 using kestcfg_test::FinishProgram;
 using kestcfg_test::FlattenJson;
 using kestcfg_test::PollUntil;
@@ -30,14 +31,6 @@ constexpr char kCallLog[] = "/var/lib/vqtargetcfg/calls.log";
 constexpr char kPending[] = "/run/kest/pending-rollback.json";
 constexpr char kLastRollback[] = "/run/kest/last-rollback.json";
 constexpr char kInterfaceUp[] = "SetNetworkInterfaceState\t0\teth0\t1";
-
-size_t CountOf(const std::string& text, const std::string& part) {
-    size_t count = 0;
-    for (size_t at = text.find(part); at != std::string::npos; at = text.find(part, at + 1)) {
-        ++count;
-    }
-    return count;
-}
 
 class KestcfgConfirmTest : public kestcfg_test::DemoControllerTest {
   protected:

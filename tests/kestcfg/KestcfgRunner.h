@@ -139,6 +139,15 @@ inline RunResult RunKestcfgAt(const std::string& program, const std::vector<std:
     return FinishProgram(running);
 }
 
+// How many times `part` occurs in `text`, overlaps included.
+inline size_t CountOf(const std::string& text, const std::string& part) {
+    size_t count = 0;
+    for (size_t at = text.find(part); at != std::string::npos; at = text.find(part, at + 1)) {
+        ++count;
+    }
+    return count;
+}
+
 // True when kestcfg runs natively. Under an emulator (a cross build, where the kernel does not
 // start foreign binaries by itself) a kestcfg cannot start another kestcfg, such as the watcher
 // of a change that undoes itself.

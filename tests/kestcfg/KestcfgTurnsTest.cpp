@@ -15,6 +15,7 @@
 
 namespace {
 
+using kestcfg_test::CountOf;
 using kestcfg_test::FinishProgram;
 using kestcfg_test::PollUntil;
 using kestcfg_test::RunKestcfg;
@@ -30,14 +31,6 @@ struct Change {
     const char* assignment;
     const char* stored;  // "Key=value" as the controller's state holds it afterwards
 };
-
-size_t CountOf(const std::string& text, const std::string& part) {
-    size_t count = 0;
-    for (size_t at = text.find(part); at != std::string::npos; at = text.find(part, at + 1)) {
-        ++count;
-    }
-    return count;
-}
 
 class KestcfgTurnsTest : public kestcfg_test::DemoControllerTest {
   protected:
