@@ -23,7 +23,7 @@ namespace {
 
 constexpr mode_t kStagingFileMode = 0600;
 constexpr int kNameAttempts = 100;
-constexpr size_t kCopyBlockSize = 64 * 1024;
+constexpr size_t kCopyBlockSize = size_t{64} * 1024;
 
 // A name for a new temporary beside the staging file: ".NAME." and six random letters.
 std::string TemporaryName(const std::string& finalName) {

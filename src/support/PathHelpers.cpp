@@ -85,8 +85,9 @@ int OpenTrustedLink(int parent, const std::string& name, int openError) {
         errno = openError;
         return -1;
     }
-    if (!OwnedByRootOrUs(link) || fstat(parent, &directory) != 0 ||
-        (directory.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
+    // AT_FDCWD stands for the root directory, whose entries the first level is opened by.
+    const int examined = parent == AT_FDCWD ? stat("/", &directory) : fstat(parent, &directory);
+    if (!OwnedByRootOrUs(link) || examined != 0 || (directory.st_mode & (S_IWGRP | S_IWOTH)) != 0) {
         errno = ELOOP;
         return -1;
     }
@@ -181,17 +182,18 @@ void CreateDirectories(const std::string& path, mode_t mode) {
     if (!IsAbsolutePath(path)) {
         throw exception::InvalidArgument();
     }
-    DirectoryDescriptor current(OpenAtRetryingInterrupts(AT_FDCWD, "/", kDirectoryOpenFlags));
-    if (current.Get() < 0) {
-        ThrowPathFailure(errno, path);
-    }
+    // The first level is opened by its absolute name, relative to no descriptor: only root may
+    // change the entries of the root directory, and user-mode emulators map a bare "/" to their
+    // own library prefix.
+    DirectoryDescriptor current(-1);
     std::string::size_type start = 1;
     std::string::size_type lastStart = std::string::npos;
     while (start < path.size()) {
         const std::string::size_type end = std::min(path.find('/', start), path.size());
         if (end > start) {
             const std::string name = path.substr(start, end - start);
-            current.Reset(OpenOrCreateLevel(current.Get(), name, mode, path));
+            current.Reset(current.Get() < 0 ? OpenOrCreateLevel(AT_FDCWD, "/" + name, mode, path)
+                                            : OpenOrCreateLevel(current.Get(), name, mode, path));
             lastStart = start;
         }
         start = end + 1;

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <type_traits>
 
 #include "support/Exceptions.h"
 
@@ -85,7 +86,9 @@ class CachedDescriptor {
 
 // True for a code point that has an encoding: at most U+10FFFF and not a UTF-16 surrogate.
 bool IsScalarValue(wchar_t character) {
-    const uint32_t value = static_cast<uint32_t>(character);
+    // The bits as they are: a negative wchar_t is far above U+10FFFF.
+    // NOLINTNEXTLINE(bugprone-signed-char-misuse): a wide character, not a byte
+    const auto value = static_cast<std::make_unsigned_t<wchar_t>>(character);
     return value <= 0x10FFFF && (value < 0xD800 || value > 0xDFFF);
 }
 

@@ -22,7 +22,7 @@ constexpr char kLockFileName[] = "kestcfg.lock";
 std::string RunDirectory() {
     const char* root = getenv("KEST_SYSROOT");
     const std::string base = root != nullptr && root[0] == '/' ? root : "";
-    const std::string directory = base + kRunDirectory;
+    std::string directory = base + kRunDirectory;
     for (size_t slash = base.size() + 1; slash != std::string::npos;) {
         slash = directory.find('/', slash + 1);
         mkdir(directory.substr(0, slash).c_str(), 0755);

@@ -18,7 +18,7 @@ std::string LoaderError() {
 }  // namespace
 
 std::string DefaultPluginPath() {
-    const std::string besideProgram = ProgramDirectory() + kPluginFileName;
+    std::string besideProgram = ProgramDirectory() + kPluginFileName;
     if (access(besideProgram.c_str(), F_OK) == 0) {
         return besideProgram;
     }

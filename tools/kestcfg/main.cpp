@@ -142,6 +142,7 @@ int ExitCodeUnlessInterrupted(int code) {
 
 }  // namespace
 
+// NOLINTNEXTLINE(bugprone-exception-escape): only allocation failures escape, ending kestcfg
 int main(int argc, char** argv) {
     UseTextLocale();
     const bool json = AsksForJson(argc, argv);
