@@ -9,6 +9,6 @@
 // The changeable settings of `items` as {"items": {ITEM: {NAME: VALUE...}...}}.
 Json ExportSettings(IuxSysExpert3* expert, const std::vector<std::wstring>& items);
 
-// Makes the controller's settings match `desired` as apply does; `source` names the document
-// in messages. Throws CommandFailure as apply ends.
-void ApplySettings(CommandContext& context, const Json& desired, const std::string& source);
+// Makes the controller's settings match `desired` as apply does; `path` names the document in
+// messages. Throws CommandFailure as apply ends.
+void ApplySettings(CommandContext& context, const Json& desired, const std::string& path);
