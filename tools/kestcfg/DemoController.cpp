@@ -12,6 +12,7 @@
 
 #include "ExitCodes.h"
 #include "ProgramLocation.h"
+#include "WholeWrite.h"
 
 namespace {
 
@@ -207,18 +208,10 @@ class TreeWriter {
         if (fd < 0) {
             throw Failure(SystemError("cannot create", path));
         }
-        size_t done = 0;
-        while (done < content.size()) {
-            const ssize_t written = write(fd, content.data() + done, content.size() - done);
-            if (written < 0 && errno == EINTR) {
-                continue;
-            }
-            if (written <= 0) {
-                const std::string problem = SystemError("cannot write", path);
-                close(fd);
-                throw Failure(problem);
-            }
-            done += static_cast<size_t>(written);
+        if (!WriteWhole(fd, content)) {
+            const std::string problem = SystemError("cannot write", path);
+            close(fd);
+            throw Failure(problem);
         }
         if (fchmod(fd, mode) != 0 || close(fd) != 0) {
             throw Failure(SystemError("cannot finish", path));

@@ -12,6 +12,7 @@
 
 #include "ControllerPath.h"
 #include "ExitCodes.h"
+#include "WholeWrite.h"
 
 namespace {
 
@@ -83,18 +84,10 @@ void WriteRecord(const std::string& path, const Json& record) {
         throw Failure(SystemError("cannot create a temporary beside", path));
     }
     const Descriptor written{file};
-    size_t done = 0;
-    while (done < text.size()) {
-        const ssize_t count = write(file, text.data() + done, text.size() - done);
-        if (count < 0 && errno == EINTR) {
-            continue;
-        }
-        if (count <= 0) {
-            const std::string message = SystemError("cannot write", path);
-            unlinkat(directory.value, temporary.c_str(), 0);
-            throw Failure(message);
-        }
-        done += static_cast<size_t>(count);
+    if (!WriteWhole(file, text)) {
+        const std::string message = SystemError("cannot write", path);
+        unlinkat(directory.value, temporary.c_str(), 0);
+        throw Failure(message);
     }
     if (fsync(file) != 0 ||
         renameat(directory.value, temporary.c_str(), directory.value, name.c_str()) != 0) {
