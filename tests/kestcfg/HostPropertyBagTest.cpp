@@ -5,9 +5,11 @@
 #include <vector>
 
 #include "BagValues.h"
-#include "HostPropertyBag.h"
+#include "hostkit/HostPropertyBag.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -6,10 +6,12 @@
 #include <ostream>
 #include <string>
 
-#include "HostText.h"
 #include "PropertyCatalogue.h"
-#include "TimestampText.h"
 #include "ValueText.h"
+#include "hostkit/HostText.h"
+#include "hostkit/TimestampText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -13,7 +13,6 @@
 #include "Commands.h"
 #include "ConfirmableChange.h"
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "ItemAccess.h"
 #include "ItemChange.h"
 #include "PropertyCatalogue.h"
@@ -21,6 +20,9 @@
 #include "SettingsDocument.h"
 #include "StatusNames.h"
 #include "ValueText.h"
+#include "hostkit/HostText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -1,10 +1,12 @@
 #include "BagValues.h"
 
 #include "ExitCodes.h"
-#include "InterfaceRef.h"
 #include "StatusNames.h"
+#include "hostkit/InterfaceRef.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 HRESULT ReadBagValue(IuxSysPropertyBag2* bag, uint32_t tag, PropertyValue* value) {
     uint32_t type = 0;

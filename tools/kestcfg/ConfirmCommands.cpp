@@ -14,12 +14,14 @@
 #include "ControllerTurn.h"
 #include "ExitCodes.h"
 #include "ExpertSession.h"
-#include "HostText.h"
+#include "InstalledLibraries.h"
 #include "PendingChange.h"
-#include "PluginLoader.h"
 #include "SettingsDocument.h"
+#include "hostkit/HostText.h"
 #include "support/Sysroot.h"
 #include "trace/Tracer.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -9,13 +9,15 @@
 #include <iostream>
 
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "ItemAccess.h"
 #include "PendingChange.h"
 #include "ProgramLocation.h"
 #include "PropertyCatalogue.h"
 #include "SettingsDocument.h"
+#include "hostkit/HostText.h"
 #include "support/ExternalApplication.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -9,12 +9,12 @@
 #include <vector>
 
 #include "Commands.h"
-#include "PropertyValue.h"
+#include "hostkit/PropertyValue.h"
 
 // The values a command is about to persist on one item.
 struct ItemRequest {
     std::wstring item;
-    std::vector<std::pair<uint32_t, PropertyValue>> values;
+    std::vector<std::pair<uint32_t, kest::hostkit::PropertyValue>> values;
 };
 
 // Starts the watcher of a saved pending change when it goes out of scope, after the change was

@@ -4,14 +4,16 @@
 #include "BagValues.h"
 #include "Commands.h"
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "ItemAccess.h"
 #include "ModeNames.h"
 #include "PropertyCatalogue.h"
 #include "StatusNames.h"
 #include "TextTable.h"
 #include "ValueText.h"
+#include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

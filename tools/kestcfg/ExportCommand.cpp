@@ -10,6 +10,8 @@
 #include "ValueText.h"
 #include "uxsys/StatusCodes.h"
 
+using namespace kest::hostkit;
+
 Json ExportSettings(IuxSysExpert3* expert, const std::vector<std::wstring>& items) {
     Json settings = Json::object();
     for (const std::wstring& item : items) {

@@ -15,13 +15,15 @@
 #include "ExitCodes.h"
 #include "FirmwareFiles.h"
 #include "HostFirmwareImage.h"
-#include "HostText.h"
-#include "InterfaceRef.h"
 #include "Interruption.h"
 #include "ItemAccess.h"
 #include "StatusNames.h"
+#include "hostkit/HostText.h"
+#include "hostkit/InterfaceRef.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -12,9 +12,11 @@
 #include <limits>
 
 #include "ExitCodes.h"
-#include "HostText.h"
+#include "hostkit/HostText.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

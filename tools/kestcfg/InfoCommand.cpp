@@ -1,8 +1,10 @@
 // kestcfg info: the expert's class identifier, display name, version and programmatic name.
 #include "Commands.h"
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "StatusNames.h"
+#include "hostkit/HostText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -4,10 +4,12 @@
 
 #include "ControllerPath.h"
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "StatusNames.h"
+#include "hostkit/HostText.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 std::wstring ItemArgument(const std::string& text) {
     if (strcasecmp(text.c_str(), kChassisAlias) == 0) {

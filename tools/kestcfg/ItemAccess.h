@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "InterfaceRef.h"
+#include "hostkit/InterfaceRef.h"
 #include "uxsys/Expert.h"
 
 // The chassis item's name, and the short name users may type for it.
@@ -22,7 +22,7 @@ std::vector<std::wstring> ItemNames(IuxSysExpert3* expert);
 // The item's current properties (GetPropertiesOfItem) as a bag with the timestamp operations.
 // Returns the plug-in's status; the bag is set only on success.
 HRESULT CurrentProperties(IuxSysExpert3* expert, const std::wstring& item,
-                          InterfaceRef<IuxSysPropertyBag2>* bag);
+                          kest::hostkit::InterfaceRef<IuxSysPropertyBag2>* bag);
 
 // The item name as UTF-8 for output.
 std::string ItemText(const std::wstring& item);

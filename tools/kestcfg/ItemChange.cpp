@@ -6,15 +6,17 @@
 
 #include "BagValues.h"
 #include "ExitCodes.h"
-#include "HostPropertyBag.h"
-#include "HostText.h"
 #include "ItemAccess.h"
 #include "PropertyCatalogue.h"
 #include "PropertyText.h"
 #include "StatusNames.h"
 #include "ValueText.h"
+#include "hostkit/HostPropertyBag.h"
+#include "hostkit/HostText.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

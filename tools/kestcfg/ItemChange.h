@@ -9,9 +9,9 @@
 #include <string>
 #include <vector>
 
-#include "InterfaceRef.h"
 #include "JsonOutput.h"
-#include "PropertyValue.h"
+#include "hostkit/InterfaceRef.h"
+#include "hostkit/PropertyValue.h"
 #include "uxsys/Expert.h"
 
 // What became of one requested value, judged by reading the item afterwards.
@@ -24,8 +24,8 @@ enum class Outcome {
 
 struct ChangeOutcome {
     uint32_t tag;
-    PropertyValue requested;
-    std::optional<PropertyValue> now;  // what the item reports afterwards
+    kest::hostkit::PropertyValue requested;
+    std::optional<kest::hostkit::PropertyValue> now;  // what the item reports afterwards
     Outcome outcome;
 };
 
@@ -46,14 +46,14 @@ class ItemChange {
     const std::wstring& Item() const { return item_; }
 
     // The item's current value of `tag`, when it reports one.
-    std::optional<PropertyValue> Current(uint32_t tag) const;
+    std::optional<kest::hostkit::PropertyValue> Current(uint32_t tag) const;
 
     // The type a new value of `tag` takes: the type the item holds, else the catalogue's; zero
     // when neither knows it.
     uint32_t TypeOf(uint32_t tag) const;
 
     // Adds a requested value. Throws a failure when the bag refuses it.
-    void Request(uint32_t tag, const PropertyValue& value);
+    void Request(uint32_t tag, const kest::hostkit::PropertyValue& value);
 
     bool Empty() const { return requested_.empty(); }
 
@@ -70,9 +70,10 @@ class ItemChange {
   private:
     IuxSysExpert3* expert_;
     std::wstring item_;
-    InterfaceRef<IuxSysPropertyBag4> bag_;
-    std::vector<std::pair<uint32_t, PropertyValue>> before_;  // the item's values at the start
-    std::vector<std::pair<uint32_t, PropertyValue>> requested_;
+    kest::hostkit::InterfaceRef<IuxSysPropertyBag4> bag_;
+    std::vector<std::pair<uint32_t, kest::hostkit::PropertyValue>>
+        before_;  // the item's values at the start
+    std::vector<std::pair<uint32_t, kest::hostkit::PropertyValue>> requested_;
 };
 
 // "stored", "stored differently", "not stored" or "not read back".

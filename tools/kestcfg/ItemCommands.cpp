@@ -4,12 +4,14 @@
 #include "BagValues.h"
 #include "Commands.h"
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "ItemAccess.h"
 #include "PropertyCatalogue.h"
 #include "PropertyListing.h"
 #include "StatusNames.h"
+#include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -1,13 +1,15 @@
 #include "PropertyListing.h"
 
 #include "BagValues.h"
-#include "HostText.h"
 #include "PropertyCatalogue.h"
 #include "PropertyText.h"
 #include "StatusNames.h"
 #include "TextTable.h"
 #include "ValueText.h"
+#include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 std::vector<PropertyEntry> ReadProperties(IuxSysPropertyBag2* bag,
                                           const std::vector<uint32_t>& tags) {

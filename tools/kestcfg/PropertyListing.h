@@ -7,13 +7,13 @@
 #include <vector>
 
 #include "JsonOutput.h"
-#include "PropertyValue.h"
+#include "hostkit/PropertyValue.h"
 #include "uxsys/PropertyBag.h"
 
 struct PropertyEntry {
     uint32_t tag;
-    HRESULT status;       // of reading the value; S_OK when it was read
-    PropertyValue value;  // meaningful when status is not negative
+    HRESULT status;                      // of reading the value; S_OK when it was read
+    kest::hostkit::PropertyValue value;  // meaningful when status is not negative
 };
 
 // Reads `tags` from the bag in the order given; a tag that cannot be read keeps its status.

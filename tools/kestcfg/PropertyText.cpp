@@ -4,6 +4,8 @@
 #include "PropertyCatalogue.h"
 #include "ValueText.h"
 
+using namespace kest::hostkit;
+
 std::string PropertyValueText(uint32_t tag, const PropertyValue& value) {
     if (const uint32_t* number = std::get_if<uint32_t>(&value);
         number != nullptr && FindModeProperty(tag) != nullptr) {

@@ -4,13 +4,15 @@
 #include "Commands.h"
 #include "ConfirmableChange.h"
 #include "ExitCodes.h"
-#include "HostText.h"
 #include "Interruption.h"
 #include "ItemAccess.h"
 #include "ItemChange.h"
 #include "PropertyCatalogue.h"
 #include "PropertyText.h"
 #include "StatusNames.h"
+#include "hostkit/HostText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -1,11 +1,15 @@
 // kestcfg sim init DIR: creates a demo controller for the other commands to work on.
 #include <limits.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "Commands.h"
-#include "DemoController.h"
 #include "ExitCodes.h"
-#include "HostText.h"
+#include "ProgramLocation.h"
+#include "hostkit/DemoController.h"
+#include "hostkit/HostText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 
@@ -24,6 +28,31 @@ std::string AbsoluteDirectory(const std::string& directory) {
         path.pop_back();
     }
     return path;
+}
+
+bool Exists(const std::string& path) {
+    struct stat status {};
+    return stat(path.c_str(), &status) == 0;
+}
+
+// The time-zone table shipped with kestcfg: "timezone.ini" beside the program, in the installed
+// data directory, else in the source tree's data directory. Throws a failure naming the places
+// searched.
+std::string FindTimeZoneTable() {
+    std::string besideProgram = ProgramDirectory() + "timezone.ini";
+    if (Exists(besideProgram)) {
+        return besideProgram;
+    }
+    std::string installed = ProgramDirectory() + KESTCFG_DATA_DIR_FROM_PROGRAM "/timezone.ini";
+    if (Exists(installed)) {
+        return installed;
+    }
+    std::string inSources = std::string(KESTCFG_SOURCE_DATA_DIR) + "/timezone.ini";
+    if (Exists(inSources)) {
+        return inSources;
+    }
+    throw Failure("cannot find the time-zone table timezone.ini: looked for " + besideProgram +
+                  ", " + installed + " and " + inSources);
 }
 
 }  // namespace

@@ -1,7 +1,9 @@
 #include "StatusNames.h"
 
-#include "HostText.h"
+#include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -3,7 +3,9 @@
 #include <algorithm>
 #include <stdexcept>
 
-#include "HostText.h"
+#include "hostkit/HostText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

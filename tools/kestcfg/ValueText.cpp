@@ -8,8 +8,10 @@
 #include <cstdio>
 #include <cstdlib>
 
-#include "HostText.h"
-#include "TimestampText.h"
+#include "hostkit/HostText.h"
+#include "hostkit/TimestampText.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

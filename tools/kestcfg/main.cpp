@@ -16,12 +16,14 @@
 #include "DocumentOutput.h"
 #include "ExitCodes.h"
 #include "ExpertSession.h"
-#include "HostText.h"
+#include "InstalledLibraries.h"
 #include "Interruption.h"
-#include "PluginLoader.h"
 #include "StatusNames.h"
 #include "TextLocale.h"
+#include "hostkit/HostText.h"
 #include "uxsys/HostString.h"
+
+using namespace kest::hostkit;
 
 namespace {
 

@@ -10,9 +10,11 @@
 #include <set>
 #include <vector>
 
-#include "InterfaceRef.h"
-#include "PropertyValue.h"
+#include "hostkit/InterfaceRef.h"
+#include "hostkit/PropertyValue.h"
 #include "uxsys/PropertyBag.h"
+
+namespace kest::hostkit {
 
 class HostPropertyBag final : public IuxSysPropertyBag4 {
   public:
@@ -76,3 +78,5 @@ class HostPropertyBag final : public IuxSysPropertyBag4 {
     std::set<uint32_t> modified_;  // every member has a value
     uint32_t callerLocks_ = 0;
 };
+
+}  // namespace kest::hostkit

@@ -9,6 +9,8 @@
 #include "uxsys/PropertyBag.h"
 #include "uxsys/Types.h"
 
+namespace kest::hostkit {
+
 using PropertyValue =
     std::variant<bool, int32_t, uint32_t, double, GUID, std::wstring, uxSysAttrTimestampUTC>;
 
@@ -25,5 +27,4 @@ inline bool IsKnownTypeCode(uint32_t type) {
     return type >= UX_PROPERTY_TYPE_BOOL && type <= UX_PROPERTY_TYPE_TIMESTAMP;
 }
 
-// A short word for a type code ("boolean", "text", ...); "type N" for an unknown code.
-std::string TypeCodeName(uint32_t type);
+}  // namespace kest::hostkit

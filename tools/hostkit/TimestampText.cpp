@@ -1,4 +1,4 @@
-#include "TimestampText.h"
+#include "hostkit/TimestampText.h"
 
 #include <time.h>
 
@@ -7,6 +7,8 @@
 #include <cmath>
 #include <cstdio>
 #include <limits>
+
+namespace kest::hostkit {
 
 namespace {
 
@@ -150,3 +152,5 @@ uxSysAttrTimestampUTC CurrentTimestamp() {
     return uxSysAttrTimestampUTC{FractionFromNanoseconds(static_cast<uint64_t>(now.tv_nsec)),
                                  static_cast<int64_t>(now.tv_sec) + kSecondsFrom1904To1970};
 }
+
+}  // namespace kest::hostkit

@@ -1,8 +1,10 @@
-#include "HostText.h"
+#include "hostkit/HostText.h"
 
 #include <cstdio>
 
 #include "uxsys/HostString.h"
+
+namespace kest::hostkit {
 
 namespace {
 
@@ -127,3 +129,5 @@ std::string PrintableText(const std::string& text) {
     }
     return out;
 }
+
+}  // namespace kest::hostkit

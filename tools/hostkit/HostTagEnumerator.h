@@ -6,8 +6,10 @@
 #include <memory>
 #include <vector>
 
-#include "InterfaceRef.h"
+#include "hostkit/InterfaceRef.h"
 #include "uxsys/Enumerators.h"
+
+namespace kest::hostkit {
 
 class HostTagEnumerator final : public IuxSysEnumPropertyTag {
   public:
@@ -31,3 +33,5 @@ class HostTagEnumerator final : public IuxSysEnumPropertyTag {
     std::shared_ptr<const std::vector<uint32_t>> tags_;
     size_t position_;
 };
+
+}  // namespace kest::hostkit

@@ -7,6 +7,8 @@
 
 #include "uxsys/Types.h"
 
+namespace kest::hostkit {
+
 // UTF-8 text of `count` wide characters; characters outside Unicode become U+FFFD.
 std::string Utf8FromWide(const wchar_t* text, size_t count);
 
@@ -25,3 +27,5 @@ std::string StatusText(HRESULT status);
 // `text` with its control characters (C0, DEL and the UTF-8 encoded C1 range) written as
 // escapes (\n, \t, \r, \xNN, \u00NN), so that a value cannot steer the terminal.
 std::string PrintableText(const std::string& text);
+
+}  // namespace kest::hostkit

@@ -6,6 +6,8 @@
 
 #include "uxsys/Types.h"
 
+namespace kest::hostkit {
+
 // Seconds from 1904-01-01 to 1970-01-01, both UTC.
 inline constexpr int64_t kSecondsFrom1904To1970 = 2082844800;
 
@@ -23,3 +25,5 @@ std::optional<uxSysAttrTimestampUTC> TimestampFromIso8601(const std::string& tex
 
 // The current time of the real-time clock.
 uxSysAttrTimestampUTC CurrentTimestamp();
+
+}  // namespace kest::hostkit

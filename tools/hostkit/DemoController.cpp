@@ -1,4 +1,4 @@
-#include "DemoController.h"
+#include "hostkit/DemoController.h"
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -9,14 +9,13 @@
 #include <cstring>
 #include <fstream>
 #include <sstream>
+#include <stdexcept>
 
-#include "ExitCodes.h"
-#include "ProgramLocation.h"
-#include "WholeWrite.h"
+#include "kestcfg/WholeWrite.h"
+
+namespace kest::hostkit {
 
 namespace {
-
-constexpr char kStateFile[] = "/var/lib/vqtargetcfg/state.ini";
 
 // The controller as the simulated library reads it: a chassis and one Ethernet adapter, eth0,
 // in TCP/IP mode with a static address, polling every 100 ms.
@@ -83,20 +82,16 @@ void MakeDirectories(const std::string& path) {
         const std::string prefix = path.substr(0, slash);
         struct stat status {};
         if (!prefix.empty() && mkdir(prefix.c_str(), 0755) != 0 && errno != EEXIST) {
-            throw Failure(SystemError("cannot create the directory", prefix));
+            throw std::runtime_error(SystemError("cannot create the directory", prefix));
         }
         if (!prefix.empty() && (stat(prefix.c_str(), &status) != 0 || !S_ISDIR(status.st_mode))) {
-            throw Failure("cannot create the directory " + prefix + ": something else is there");
+            throw std::runtime_error("cannot create the directory " + prefix +
+                                     ": something else is there");
         }
         if (slash == std::string::npos) {
             return;
         }
     }
-}
-
-bool Exists(const std::string& path) {
-    struct stat status {};
-    return stat(path.c_str(), &status) == 0;
 }
 
 // True when the directory open at `descriptor` has no entries; false when it cannot be read.
@@ -131,7 +126,7 @@ void PrepareRootDirectory(const std::string& root) {
     }
     const bool created = mkdir(root.c_str(), 0700) == 0;
     if (!created && errno != EEXIST) {
-        throw Failure(SystemError("cannot create the directory", root));
+        throw std::runtime_error(SystemError("cannot create the directory", root));
     }
     const int descriptor = open(root.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
     struct stat status {};
@@ -142,9 +137,10 @@ void PrepareRootDirectory(const std::string& root) {
         close(descriptor);
     }
     if (!usable) {
-        throw Failure(root +
-                      " is not a new or empty directory of yours that only you may write; sim "
-                      "init needs one (mktemp -d makes one)");
+        throw std::runtime_error(
+            root +
+            " is not a new or empty directory of yours that only you may write; sim "
+            "init needs one (mktemp -d makes one)");
     }
 }
 
@@ -153,7 +149,7 @@ std::string ReadWhole(const std::string& path) {
     std::ostringstream content;
     content << file.rdbuf();
     if (!file) {
-        throw Failure(SystemError("cannot read", path));
+        throw std::runtime_error(SystemError("cannot read", path));
     }
     return content.str();
 }
@@ -206,15 +202,15 @@ class TreeWriter {
         MakeDirectories(path.substr(0, path.rfind('/')));
         const int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, mode);
         if (fd < 0) {
-            throw Failure(SystemError("cannot create", path));
+            throw std::runtime_error(SystemError("cannot create", path));
         }
         if (!WriteWhole(fd, content)) {
             const std::string problem = SystemError("cannot write", path);
             close(fd);
-            throw Failure(problem);
+            throw std::runtime_error(problem);
         }
         if (fchmod(fd, mode) != 0 || close(fd) != 0) {
-            throw Failure(SystemError("cannot finish", path));
+            throw std::runtime_error(SystemError("cannot finish", path));
         }
         written_.push_back(systemPath);
     }
@@ -230,23 +226,6 @@ class TreeWriter {
 };
 
 }  // namespace
-
-std::string FindTimeZoneTable() {
-    std::string besideProgram = ProgramDirectory() + "timezone.ini";
-    if (Exists(besideProgram)) {
-        return besideProgram;
-    }
-    std::string installed = ProgramDirectory() + KESTCFG_DATA_DIR_FROM_PROGRAM "/timezone.ini";
-    if (Exists(installed)) {
-        return installed;
-    }
-    std::string inSources = std::string(KESTCFG_SOURCE_DATA_DIR) + "/timezone.ini";
-    if (Exists(inSources)) {
-        return inSources;
-    }
-    throw Failure("cannot find the time-zone table timezone.ini: looked for " + besideProgram +
-                  ", " + installed + " and " + inSources);
-}
 
 std::vector<std::string> CreateDemoController(const std::string& root,
                                               const std::string& timeZoneTable) {
@@ -272,6 +251,12 @@ std::vector<std::string> CreateDemoController(const std::string& root,
         tree.Directory(directory);
     }
     // Written last: its presence marks a complete controller.
-    tree.Write(kStateFile, kState, 0644);
+    tree.Write(kControllerStatePath, kState, 0644);
     return tree.Written();
 }
+
+void WriteControllerState(const std::string& root, const std::string& state) {
+    TreeWriter(root).Write(kControllerStatePath, state, 0644);
+}
+
+}  // namespace kest::hostkit

@@ -5,6 +5,8 @@
 
 #include "uxsys/IUnknown.h"
 
+namespace kest::hostkit {
+
 template <class T>
 class InterfaceRef {
   public:
@@ -51,3 +53,5 @@ InterfaceRef<T> QueryInterfaceAs(IUnknown* object, const IID& iid) {
     }
     return result;
 }
+
+}  // namespace kest::hostkit

@@ -1,8 +1,10 @@
-#include "HostTagEnumerator.h"
+#include "hostkit/HostTagEnumerator.h"
 
 #include <new>
 
 #include "uxsys/StatusCodes.h"
+
+namespace kest::hostkit {
 
 InterfaceRef<IuxSysEnumPropertyTag> HostTagEnumerator::Create(std::vector<uint32_t> tags) {
     // The object starts with the one reference handed out here and deletes itself in Release.
@@ -75,3 +77,5 @@ HRESULT HostTagEnumerator::Clone(IuxSysEnumPropertyTag** copy) {
     *copy = new (std::nothrow) HostTagEnumerator(tags_, position_);
     return *copy != nullptr ? S_OK : E_OUTOFMEMORY;
 }
+
+}  // namespace kest::hostkit

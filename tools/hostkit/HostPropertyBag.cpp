@@ -1,14 +1,16 @@
-#include "HostPropertyBag.h"
+#include "hostkit/HostPropertyBag.h"
 
 #include <time.h>
 
 #include <new>
 #include <vector>
 
-#include "HostTagEnumerator.h"
-#include "TimestampText.h"
+#include "hostkit/HostTagEnumerator.h"
+#include "hostkit/TimestampText.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
+
+namespace kest::hostkit {
 
 using Lock = std::lock_guard<std::recursive_mutex>;
 
@@ -343,3 +345,5 @@ HRESULT HostPropertyBag::MarkModified(uint32_t tag) {
         return E_OUTOFMEMORY;
     }
 }
+
+}  // namespace kest::hostkit
