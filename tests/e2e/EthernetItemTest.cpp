@@ -39,27 +39,20 @@ class EthernetItemTest : public ExpertHostTest {
                              "DNSServer = 192.168.1.2\nCurrentMediaMode = 4\n"
                              "PreferredMediaMode = 4\n");
         ExpertHostTest::SetUp();
-        IuxSysPropertyBag* properties = nullptr;
-        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kEth0, &properties));
+        InterfaceRef<IuxSysPropertyBag> properties;
+        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kEth0, properties.Receive()));
         ASSERT_EQ(S_OK, properties->QueryInterface(IID_IuxSysPropertyBag2,
-                                                   reinterpret_cast<void**>(&bag)));
-        properties->Release();
+                                                   reinterpret_cast<void**>(bag.Receive())));
         bag->ClearAllModified();
-    }
-    void TearDown() override {
-        bag->Release();
-        ExpertHostTest::TearDown();
     }
 
     // The status of validating the bag for eth0, and the message (empty when none came).
     std::pair<HRESULT, std::wstring> Validate() {
-        IuxSysEnumPropertyTag* validated = nullptr;
+        InterfaceRef<IuxSysEnumPropertyTag> validated;
         CvqBStr message = nullptr;
-        const HRESULT status = expert->ValidatePropertyChanges(kEth0, bag, &validated, &message);
-        if (validated != nullptr) {
-            validated->Release();
-        }
-        return {status, TakeHostString(message)};
+        const HRESULT status =
+            expert->ValidatePropertyChanges(kEth0, bag.Get(), validated.Receive(), &message);
+        return {status, TakeWideHostString(message)};
     }
 
     // The logged calls that change the controller, each after its time and a blank.
@@ -75,13 +68,13 @@ class EthernetItemTest : public ExpertHostTest {
         return calls;
     }
 
-    IuxSysPropertyBag2* bag = nullptr;
+    InterfaceRef<IuxSysPropertyBag2> bag;
 };
 
 TEST_F(EthernetItemTest, CatalogueShowsAndRejectedCombinationsExplainThemselves) {
     CvqBStr address = nullptr;
     ASSERT_EQ(S_OK, bag->GetString(kIPAddressTag, &address));
-    EXPECT_EQ(L"192.168.1.10", TakeHostString(address));
+    EXPECT_EQ(L"192.168.1.10", TakeWideHostString(address));
 
     ASSERT_EQ(S_OK, bag->SetString(kIPAddressTag, L"192.168.1.0"));
     EXPECT_EQ(
@@ -107,7 +100,7 @@ TEST_F(EthernetItemTest, NewAddressIsWrittenAtOnceAndTheInterfaceRestartsAfterTh
 
     const double calledMs = MonotonicMs();
     int32_t restart = -1;
-    ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag.Get(), &restart));
     const double returnedMs = MonotonicMs();
     EXPECT_EQ(0, restart);
     ASSERT_EQ(1u, ControllerChanges().size());
@@ -116,8 +109,7 @@ TEST_F(EthernetItemTest, NewAddressIsWrittenAtOnceAndTheInterfaceRestartsAfterTh
         ControllerChanges()[0].second);
 
     // Releasing the expert waits for the restart that is still running.
-    expert->Release();
-    expert = nullptr;
+    expert.Reset();
     const auto calls = ControllerChanges();
     ASSERT_EQ(4u, calls.size());
     EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[1].second);
@@ -133,23 +125,22 @@ TEST_F(EthernetItemTest, PersistsThatWriteNothingLeaveTheLinkAlone) {
     // A false primary flag on the primary adapter, then an address read otherwise than stored.
     ASSERT_EQ(S_OK, bag->SetBool(kPrimaryAdapterTag, 0));
     int32_t restart = -1;
-    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag.Get(), &restart));
     ASSERT_EQ(S_OK, bag->SetString(kGatewayTag, L"192.168.1.0255"));
-    EXPECT_EQ(UX_E_GATEWAY_INVALID, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    EXPECT_EQ(UX_E_GATEWAY_INVALID, expert->PersistPropertyChanges(kEth0, bag.Get(), &restart));
     EXPECT_EQ(std::make_pair(UX_E_GATEWAY_INVALID, std::wstring()), Validate());
 
     // Releasing the expert waits for any restart that was started.
-    expert->Release();
-    expert = nullptr;
+    expert.Reset();
     EXPECT_TRUE(ControllerChanges().empty());
 }
 
 TEST_F(EthernetItemTest, PersistingAgainWaitsForTheRunningRestart) {
     int32_t restart = -1;
     ASSERT_EQ(S_OK, bag->SetString(kIPAddressTag, L"192.168.1.20"));
-    ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag.Get(), &restart));
     ASSERT_EQ(S_OK, bag->SetString(kIPAddressTag, L"192.168.1.30"));
-    ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag, &restart));
+    ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag.Get(), &restart));
 
     std::vector<std::string> calls;
     for (const auto& call : ControllerChanges()) {

@@ -10,15 +10,21 @@
 #include <string>
 #include <vector>
 
-#include "LoadedPlugin.h"
 #include "common/TempSysroot.h"
+#include "hostkit/DemoController.h"
+#include "hostkit/HostText.h"
+#include "hostkit/Plugin.h"
 #include "uxsys/HostString.h"
 #include "uxsys/Interfaces.h"
 
 namespace e2e {
 
-constexpr char kControllerStatePath[] = "/var/lib/vqtargetcfg/state.ini";
-constexpr char kControllerCallLogPath[] = "/var/lib/vqtargetcfg/calls.log";
+using kest::hostkit::InterfaceRef;
+using kest::hostkit::kControllerCallLogPath;
+using kest::hostkit::kControllerStatePath;
+using kest::hostkit::QueryInterfaceAs;
+using kest::hostkit::TakeWideHostString;
+
 constexpr uint32_t kItemNameTag = 0x0101D000;
 constexpr wchar_t kSystemItemName[] = L"VQ KEST Chassis";
 
@@ -33,21 +39,15 @@ inline std::string StateWithDevice(int type, const std::string& interfaceName) {
                            "\nInterfaceName = " + interfaceName + "\nIndex = 3\n");
 }
 
-// The text of a host string, which is freed.
-inline std::wstring TakeHostString(CvqBStr str) {
-    CvqBStrHolder holder(str);
-    return std::wstring(str == nullptr ? L"" : str, CvqBStrLength(str));
-}
-
 // Every name an enumerator yields, which is released.
 inline std::vector<std::wstring> TakeNames(IuxSysEnumStringList* names) {
+    const InterfaceRef<IuxSysEnumStringList> held(names);
     std::vector<std::wstring> result;
     CvqBStr name = nullptr;
     uint32_t fetched = 0;
     while (names->Next(1, &name, &fetched) == S_OK && fetched == 1) {
-        result.push_back(TakeHostString(name));
+        result.push_back(TakeWideHostString(name));
     }
-    names->Release();
     return result;
 }
 
@@ -55,7 +55,7 @@ inline std::vector<std::wstring> TakeNames(IuxSysEnumStringList* names) {
 inline std::wstring ItemNameIn(IuxSysPropertyBag* bag) {
     CvqBStr name = nullptr;
     EXPECT_EQ(S_OK, bag->GetString(kItemNameTag, &name));
-    return TakeHostString(name);
+    return TakeWideHostString(name);
 }
 
 // A search sink that records the item name of every bag and answers with a fixed status.
@@ -88,18 +88,11 @@ class ExpertHostTest : public ::testing::Test {
   protected:
     void SetUp() override {
         sysroot.WriteFile("/etc/korvane/version", "22.5.0\n");
-        ASSERT_NE(nullptr, plugin.Factory());
         expert = plugin.CreateExpert();
-        ASSERT_NE(nullptr, expert);
-    }
-    void TearDown() override {
-        if (expert != nullptr) {
-            expert->Release();
-        }
     }
 
     void WriteControllerState(const std::string& state) const {
-        sysroot.WriteFile(kControllerStatePath, state);
+        kest::hostkit::WriteControllerState(sysroot.Root(), state);
     }
 
     // How often the controller library has been called with `callName`.
@@ -122,8 +115,8 @@ class ExpertHostTest : public ::testing::Test {
     }
 
     kest::test::TempSysroot sysroot;
-    LoadedPlugin plugin;
-    IuxSysExpert3* expert = nullptr;
+    kest::hostkit::Plugin plugin{KEST_PLUGIN_PATH};
+    InterfaceRef<IuxSysExpert3> expert;
 };
 
 }  // namespace e2e

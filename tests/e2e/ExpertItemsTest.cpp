@@ -22,7 +22,7 @@ class ItemDiscoveryTest : public ExpertHostTest,
 
 TEST_P(ItemDiscoveryTest, SystemItemComesFirstThenEth0InAnyCase) {
     WriteControllerState(GetParam().state);
-    EXPECT_EQ(GetParam().items, ItemNames(expert));
+    EXPECT_EQ(GetParam().items, ItemNames(expert.Get()));
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -52,11 +52,10 @@ TEST_F(ExpertItemsTest, PropertiesAreFoundByNameIgnoringCase) {
     const std::pair<const wchar_t*, const wchar_t*> lookups[] = {
         {L"ETH0", L"eth0"}, {L"eth0", L"eth0"}, {L"vq kest chassis", kSystemItemName}};
     for (const auto& [asked, itemName] : lookups) {
-        IuxSysPropertyBag* bag = nullptr;
-        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(asked, &bag)) << asked;
-        ASSERT_NE(nullptr, bag);
-        EXPECT_EQ(itemName, ItemNameIn(bag));
-        bag->Release();
+        InterfaceRef<IuxSysPropertyBag> bag;
+        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(asked, bag.Receive())) << asked;
+        ASSERT_TRUE(bag);
+        EXPECT_EQ(itemName, ItemNameIn(bag.Get()));
     }
     EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
 }
@@ -77,24 +76,22 @@ TEST_F(ExpertItemsTest, RefreshWithoutTagsFindsNothing) {
 
 TEST_F(ExpertItemsTest, RefreshFindingSomeTagsReturnsTheBagWithFalse) {
     const uint32_t tags[] = {kItemNameTag, 0x7FFFF000};
-    IuxSysPropertyBag* bag = nullptr;
-    ASSERT_EQ(S_FALSE, expert->PopulateOrRefreshProperties(L"vq kest chassis", 2, tags, &bag));
-    ASSERT_NE(nullptr, bag);
-    EXPECT_EQ(kSystemItemName, ItemNameIn(bag));
-    bag->Release();
+    InterfaceRef<IuxSysPropertyBag> bag;
+    ASSERT_EQ(S_FALSE,
+              expert->PopulateOrRefreshProperties(L"vq kest chassis", 2, tags, bag.Receive()));
+    ASSERT_TRUE(bag);
+    EXPECT_EQ(kSystemItemName, ItemNameIn(bag.Get()));
 }
 
 TEST_F(ExpertItemsTest, ValidatingNoChangeReturnsFalseAndNoEnumerator) {
-    IuxSysPropertyBag* current = nullptr;
-    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, &current));
-    IuxSysPropertyBag* unchanged = nullptr;
-    ASSERT_EQ(S_OK, current->Clone(&unchanged));
-    current->Release();
+    InterfaceRef<IuxSysPropertyBag> current;
+    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, current.Receive()));
+    InterfaceRef<IuxSysPropertyBag> unchanged;
+    ASSERT_EQ(S_OK, current->Clone(unchanged.Receive()));
     IuxSysEnumPropertyTag* validated = reinterpret_cast<IuxSysEnumPropertyTag*>(this);
-    EXPECT_EQ(S_FALSE,
-              expert->ValidatePropertyChanges(kSystemItemName, unchanged, &validated, nullptr));
+    EXPECT_EQ(S_FALSE, expert->ValidatePropertyChanges(kSystemItemName, unchanged.Get(), &validated,
+                                                       nullptr));
     EXPECT_EQ(nullptr, validated);
-    unchanged->Release();
 }
 
 TEST_F(ExpertItemsTest, SearchDeliversEveryItemToTheSink) {
@@ -114,40 +111,36 @@ TEST_F(ExpertItemsTest, SearchEndsWithTheStatusOfARefusingSink) {
 TEST_F(ExpertItemsTest, PersistingANetworkChangeRestartsTheInterfaceAfterwards) {
     WriteControllerState(StateWithDevice(1, "eth0") +
                          "Mode = 2\nRequestMode = 2\n[Network]\nPrimaryDeviceIndex = 9\n");
-    IuxSysPropertyBag* current = nullptr;
-    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(L"eth0", &current));
-    IuxSysPropertyBag* changes = nullptr;
-    ASSERT_EQ(S_OK, current->Clone(&changes));
-    current->Release();
+    InterfaceRef<IuxSysPropertyBag> current;
+    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(L"eth0", current.Receive()));
+    InterfaceRef<IuxSysPropertyBag> changes;
+    ASSERT_EQ(S_OK, current->Clone(changes.Receive()));
     ASSERT_EQ(S_OK, changes->SetBool(0x0D126000, 1));
 
     int32_t restartRequired = -1;
-    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(L"eth0", changes, &restartRequired));
-    changes->Release();
+    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(L"eth0", changes.Get(), &restartRequired));
+    changes.Reset();
     EXPECT_EQ(0, restartRequired);
     EXPECT_EQ(1, ControllerCalls("SetPrimaryDeviceByIndex"));
 
     // The last reference waits for the pending restart: down, then up again.
-    EXPECT_EQ(0u, expert->Release());
-    expert = nullptr;
+    EXPECT_EQ(0u, expert.Detach()->Release());
     EXPECT_EQ(2, ControllerCalls("SetNetworkInterfaceState"));
 }
 
 TEST_F(ExpertItemsTest, ExpertsShareOneItemManagerUntilTheLastIsReleased) {
-    IuxSysExpert3* second = plugin.CreateExpert();
-    ASSERT_NE(nullptr, second);
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert));
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second));
+    InterfaceRef<IuxSysExpert3> second = plugin.CreateExpert();
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert.Get()));
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second.Get()));
     EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
 
-    EXPECT_EQ(0u, expert->Release());
-    expert = nullptr;
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second));
+    EXPECT_EQ(0u, expert.Detach()->Release());
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second.Get()));
     EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
 
-    EXPECT_EQ(0u, second->Release());
+    EXPECT_EQ(0u, second.Detach()->Release());
     expert = plugin.CreateExpert();
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert));
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert.Get()));
     EXPECT_EQ(2, ControllerCalls("GetDeviceHandlers"));
 }
 

@@ -6,7 +6,9 @@
 #include <thread>
 #include <vector>
 
-#include "LoadedPlugin.h"
+#include "hostkit/HostText.h"
+#include "hostkit/Plugin.h"
+#include "uxsys/Interfaces.h"
 
 namespace {
 
@@ -25,10 +27,7 @@ HRESULT CallStringSlot(void* interfacePointer, int slot, CvqBStr* result) {
     return table[slot](interfacePointer, result);
 }
 
-std::wstring TakeHostString(CvqBStr str) {
-    CvqBStrHolder holder(str);
-    return str == nullptr ? std::wstring(L"<null>") : std::wstring(str, CvqBStrLength(str));
-}
+using kest::hostkit::TakeWideHostString;
 
 constexpr GUID kKestExpertClassId = {
     0x999d9aa4, 0x5475, 0x4ca7, {0xa5, 0x60, 0x93, 0xc5, 0x1b, 0x5b, 0xfc, 0xeb}};
@@ -38,8 +37,7 @@ constexpr IID kUnknownIdentifier = {
 class ExpertObjectModelTest : public ::testing::Test {
   protected:
     void SetUp() override {
-        ASSERT_NE(nullptr, plugin.Factory());
-        expert = plugin.CreateExpert();
+        ASSERT_EQ(S_OK, plugin.Factory()(&expert));
         ASSERT_NE(nullptr, expert);
     }
     void TearDown() override {
@@ -56,7 +54,7 @@ class ExpertObjectModelTest : public ::testing::Test {
         return static_cast<IUnknown*>(result);
     }
 
-    LoadedPlugin plugin;
+    kest::hostkit::Plugin plugin{KEST_PLUGIN_PATH};
     IuxSysExpert3* expert = nullptr;
 };
 
@@ -134,7 +132,7 @@ TEST_F(ExpertObjectModelTest, IdentityOperationsAnswerAtTheirSlots) {
         SCOPED_TRACE(entry.slot);
         CvqBStr text = nullptr;
         ASSERT_EQ(S_OK, CallStringSlot(expert, entry.slot, &text));
-        EXPECT_EQ(std::wstring(entry.text), TakeHostString(text));
+        EXPECT_EQ(std::wstring(entry.text), TakeWideHostString(text));
         EXPECT_EQ(E_POINTER, CallStringSlot(expert, entry.slot, nullptr));
     }
     EXPECT_EQ(E_POINTER, expert->GetExpertClassId(nullptr));

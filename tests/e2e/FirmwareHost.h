@@ -95,19 +95,15 @@ class FirmwareHostTest : public ExpertHostTest {
         InstallTool(kWaitForRelease);
         ExpertHostTest::SetUp();
         ASSERT_EQ(S_OK, expert->Initialize());
-        void* pointer = nullptr;
-        ASSERT_EQ(S_OK, expert->QueryInterface(IID_IuxSysExpertFirmware, &pointer));
-        firmware = static_cast<IuxSysExpertFirmware*>(pointer);
+        ASSERT_EQ(S_OK, expert->QueryInterface(IID_IuxSysExpertFirmware,
+                                               reinterpret_cast<void**>(firmware.Receive())));
     }
     void TearDown() override {
         ReleaseTool(1);
-        if (firmware != nullptr) {
-            firmware->Release();
-        }
-        if (expert != nullptr) {
+        firmware.Reset();
+        if (expert) {
             expert->Uninitialize();
         }
-        ExpertHostTest::TearDown();
     }
 
     // Installs the stand-in tool: it records what it was given (the staging file's checksum
@@ -143,7 +139,7 @@ class FirmwareHostTest : public ExpertHostTest {
     std::wstring Prepare(uint32_t size) const {
         CvqBStr id = nullptr;
         EXPECT_EQ(S_OK, firmware->PrepareFirmwareUpdate(kSystemItemName, 0, size, &id));
-        return TakeHostString(id);
+        return TakeWideHostString(id);
     }
 
     HRESULT Start(const std::wstring& id, HostImage& image) const {
@@ -165,11 +161,11 @@ class FirmwareHostTest : public ExpertHostTest {
     HRESULT PrepareStatus() const {
         CvqBStr id = nullptr;
         const HRESULT status = firmware->PrepareFirmwareUpdate(kSystemItemName, 0, 0, &id);
-        TakeHostString(id);
+        TakeWideHostString(id);
         return status;
     }
 
-    IuxSysExpertFirmware* firmware = nullptr;
+    InterfaceRef<IuxSysExpertFirmware> firmware;
 };
 
 }  // namespace e2e

@@ -337,17 +337,16 @@ TEST_F(FirmwareUpdateTest, AStagingFilePlantedByAnotherUserAndRewrittenLaterIsNo
 
 // A second expert of the same process stands for any other host: the controller runs one update.
 TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
-    IuxSysExpert3* other = plugin.CreateExpert();
-    ASSERT_NE(nullptr, other);
+    const InterfaceRef<IuxSysExpert3> other = plugin.CreateExpert();
     ASSERT_EQ(S_OK, other->Initialize());
-    void* pointer = nullptr;
-    ASSERT_EQ(S_OK, other->QueryInterface(IID_IuxSysExpertFirmware, &pointer));
-    auto* otherFirmware = static_cast<IuxSysExpertFirmware*>(pointer);
+    InterfaceRef<IuxSysExpertFirmware> otherFirmware;
+    ASSERT_EQ(S_OK, other->QueryInterface(IID_IuxSysExpertFirmware,
+                                          reinterpret_cast<void**>(otherFirmware.Receive())));
     const auto otherPrepare = [&]() {
         CvqBStr id = nullptr;
         const HRESULT status =
             otherFirmware->PrepareFirmwareUpdate(kSystemItemName, 0, sizeof kImage - 1, &id);
-        return std::make_pair(status, TakeHostString(id));
+        return std::make_pair(status, TakeWideHostString(id));
     };
 
     const std::wstring id = Prepare(sizeof kImage - 1);
@@ -371,8 +370,6 @@ TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
     EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
     // The tool has ended: the controller is free again, although the other expert stays busy.
     EXPECT_EQ(S_OK, PrepareStatus());
-    otherFirmware->Release();
-    other->Release();
 }
 
 TEST_F(FirmwareUpdateTest, StatusFileStagesReportTheirPercentages) {
@@ -516,11 +513,9 @@ TEST_F(FirmwareUpdateTest, DestroyingTheExpertWaitsForTheRunningTool) {
     HostImage image(kImage, sizeof kImage - 1);
     ASSERT_EQ(S_OK, Start(Prepare(sizeof kImage - 1), image));
     ExpectStopWaitsForTheTool([&] {
-        firmware->Release();
-        expert->Release();
+        firmware.Reset();
+        expert.Reset();
     });
-    firmware = nullptr;
-    expert = nullptr;
 }
 
 }  // namespace

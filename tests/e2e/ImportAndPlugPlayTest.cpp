@@ -47,26 +47,27 @@ class ImportAndPlugPlayTest : public ExpertHostTest {
     }
 
     HRESULT GetImportableTags(const wchar_t* item, IuxSysEnumPropertyTag** tags) {
-        return CallExpertSlot(expert, kGetImportableTagsSlot, item, tags);
+        return CallExpertSlot(expert.Get(), kGetImportableTagsSlot, item, tags);
     }
     HRESULT GetMatchingItems(IuxSysPropertyBag* description, CvqBStr* exactName,
                              IuxSysEnumStringList** names, void** reserved) {
-        return CallExpertSlot(expert, kGetMatchingItemsSlot, description, exactName, names,
+        return CallExpertSlot(expert.Get(), kGetMatchingItemsSlot, description, exactName, names,
                               reserved);
     }
 
     // An item description: the adapter's own properties with the item name `name`.
-    IuxSysPropertyBag* DescriptionNaming(const wchar_t* name) {
-        IuxSysPropertyBag* bag = nullptr;
-        EXPECT_EQ(S_OK, expert->GetPropertiesOfItem(L"eth0", &bag));
+    InterfaceRef<IuxSysPropertyBag> DescriptionNaming(const wchar_t* name) {
+        InterfaceRef<IuxSysPropertyBag> bag;
+        EXPECT_EQ(S_OK, expert->GetPropertiesOfItem(L"eth0", bag.Receive()));
         EXPECT_EQ(S_OK, bag->SetString(kItemNameTag, name));
         return bag;
     }
 
-    IuxSysExpertPlugPlay* PlugPlay() {
-        void* pointer = nullptr;
-        EXPECT_EQ(S_OK, expert->QueryInterface(IID_IuxSysExpertPlugPlay, &pointer));
-        return static_cast<IuxSysExpertPlugPlay*>(pointer);
+    InterfaceRef<IuxSysExpertPlugPlay> PlugPlay() {
+        InterfaceRef<IuxSysExpertPlugPlay> plugPlay;
+        EXPECT_EQ(S_OK, expert->QueryInterface(IID_IuxSysExpertPlugPlay,
+                                               reinterpret_cast<void**>(plugPlay.Receive())));
+        return plugPlay;
     }
 };
 
@@ -80,7 +81,7 @@ TEST_F(ImportAndPlugPlayTest, NoItemHasImportableTags) {
     EXPECT_EQ(UX_E_ITEM_NOT_FOUND, GetImportableTags(L"eth7", &tags));
     EXPECT_EQ(nullptr, tags);
     EXPECT_EQ(E_POINTER, GetImportableTags(L"eth0", nullptr));
-    EXPECT_EQ(E_NOTIMPL, CallExpertSlot(expert, kUnsupportedImportSlot));
+    EXPECT_EQ(E_NOTIMPL, CallExpertSlot(expert.Get(), kUnsupportedImportSlot));
 }
 
 TEST_F(ImportAndPlugPlayTest, MatchingItemsFollowTheDescribedName) {
@@ -95,41 +96,39 @@ TEST_F(ImportAndPlugPlayTest, MatchingItemsFollowTheDescribedName) {
     };
     for (const auto& entry : cases) {
         SCOPED_TRACE(testing::Message() << "described " << entry.described);
-        IuxSysPropertyBag* description = DescriptionNaming(entry.described);
+        const InterfaceRef<IuxSysPropertyBag> description = DescriptionNaming(entry.described);
         CvqBStr exactName = nullptr;
         IuxSysEnumStringList* names = nullptr;
         void* reserved = &reserved;
-        ASSERT_EQ(S_OK, GetMatchingItems(description, &exactName, &names, &reserved));
+        ASSERT_EQ(S_OK, GetMatchingItems(description.Get(), &exactName, &names, &reserved));
         EXPECT_EQ(nullptr, reserved);
         ASSERT_NE(nullptr, names);
         EXPECT_EQ(entry.names, TakeNames(names));
         EXPECT_EQ(entry.exactName != nullptr, exactName != nullptr);
         if (entry.exactName != nullptr) {
-            EXPECT_EQ(std::wstring(entry.exactName), TakeHostString(exactName));
+            EXPECT_EQ(std::wstring(entry.exactName), TakeWideHostString(exactName));
         }
-        description->Release();
     }
 }
 
 TEST_F(ImportAndPlugPlayTest, MatchingItemsRejectsMissingArgumentsAndUnnamedDescriptions) {
-    IuxSysPropertyBag* description = DescriptionNaming(L"eth0");
+    const InterfaceRef<IuxSysPropertyBag> description = DescriptionNaming(L"eth0");
     CvqBStr exactName = nullptr;
     IuxSysEnumStringList* names = nullptr;
     void* reserved = nullptr;
-    EXPECT_EQ(E_POINTER, GetMatchingItems(description, &exactName, &names, nullptr));
+    EXPECT_EQ(E_POINTER, GetMatchingItems(description.Get(), &exactName, &names, nullptr));
     EXPECT_EQ(E_POINTER, GetMatchingItems(nullptr, &exactName, &names, &reserved));
 
     ASSERT_EQ(S_OK, description->RemoveTag(kItemNameTag));
     EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND,
-              GetMatchingItems(description, &exactName, &names, &reserved));
+              GetMatchingItems(description.Get(), &exactName, &names, &reserved));
     EXPECT_EQ(nullptr, names);
     EXPECT_EQ(nullptr, exactName);
-    description->Release();
 }
 
 TEST_F(ImportAndPlugPlayTest, PlugPlayCallbackIsHeldOnceUntilReplacedOrTheExpertGoes) {
     CountingCallback callback;
-    IuxSysExpertPlugPlay* plugPlay = PlugPlay();
+    InterfaceRef<IuxSysExpertPlugPlay> plugPlay = PlugPlay();
     EXPECT_EQ(S_OK, plugPlay->SetPlugPlayCallback(&callback));
     EXPECT_EQ(S_OK, plugPlay->SetPlugPlayCallback(&callback));
     EXPECT_EQ(2u, callback.References());
@@ -138,9 +137,8 @@ TEST_F(ImportAndPlugPlayTest, PlugPlayCallbackIsHeldOnceUntilReplacedOrTheExpert
 
     EXPECT_EQ(S_OK, plugPlay->SetPlugPlayCallback(&callback));
     EXPECT_EQ(2u, callback.References());
-    plugPlay->Release();
-    expert->Release();
-    expert = nullptr;
+    plugPlay.Reset();
+    expert.Reset();
     EXPECT_EQ(1u, callback.References());
 }
 

@@ -55,40 +55,33 @@ class SystemItemTest : public ExpertHostTest {
     }
 
     // The system item's current properties.
-    IuxSysPropertyBag* Properties() {
-        IuxSysPropertyBag* bag = nullptr;
-        EXPECT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, &bag));
+    InterfaceRef<IuxSysPropertyBag> Properties() {
+        InterfaceRef<IuxSysPropertyBag> bag;
+        EXPECT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, bag.Receive()));
         return bag;
     }
 
     std::wstring Text(uint32_t tag) {
-        IuxSysPropertyBag* bag = Properties();
         CvqBStr text = nullptr;
-        EXPECT_EQ(S_OK, bag->GetString(tag, &text)) << std::hex << tag;
-        bag->Release();
-        return TakeHostString(text);
+        EXPECT_EQ(S_OK, Properties()->GetString(tag, &text)) << std::hex << tag;
+        return TakeWideHostString(text);
     }
 
     bool Bool(uint32_t tag) {
-        IuxSysPropertyBag* bag = Properties();
         int32_t value = -1;
-        EXPECT_EQ(S_OK, bag->GetBool(tag, &value)) << std::hex << tag;
-        bag->Release();
+        EXPECT_EQ(S_OK, Properties()->GetBool(tag, &value)) << std::hex << tag;
         return value != 0;
     }
 
     // A bag of changes: a copy of the current properties (nothing modified) with `write` applied.
     template <class Write>
-    IuxSysPropertyBag2* Changes(Write&& write) {
-        IuxSysPropertyBag* current = Properties();
-        IuxSysPropertyBag* copy = nullptr;
-        EXPECT_EQ(S_OK, current->Clone(&copy));
-        current->Release();
-        IuxSysPropertyBag2* changes = nullptr;
-        EXPECT_EQ(S_OK,
-                  copy->QueryInterface(IID_IuxSysPropertyBag2, reinterpret_cast<void**>(&changes)));
-        copy->Release();
-        write(changes);
+    InterfaceRef<IuxSysPropertyBag2> Changes(Write&& write) {
+        InterfaceRef<IuxSysPropertyBag> copy;
+        EXPECT_EQ(S_OK, Properties()->Clone(copy.Receive()));
+        InterfaceRef<IuxSysPropertyBag2> changes;
+        EXPECT_EQ(S_OK, copy->QueryInterface(IID_IuxSysPropertyBag2,
+                                             reinterpret_cast<void**>(changes.Receive())));
+        write(changes.Get());
         return changes;
     }
 
@@ -101,25 +94,21 @@ class SystemItemTest : public ExpertHostTest {
     };
 
     // Validates the changes and, when they pass, persists them, as a host does.
-    Outcome Apply(IuxSysPropertyBag2* changes) {
+    Outcome Apply(const InterfaceRef<IuxSysPropertyBag2>& changes) {
         Outcome outcome;
-        IuxSysEnumPropertyTag* validated = nullptr;
+        InterfaceRef<IuxSysEnumPropertyTag> validated;
         CvqBStr message = nullptr;
-        outcome.validation =
-            expert->ValidatePropertyChanges(kSystemItemName, changes, &validated, &message);
-        outcome.message = TakeHostString(message);
+        outcome.validation = expert->ValidatePropertyChanges(kSystemItemName, changes.Get(),
+                                                             validated.Receive(), &message);
+        outcome.message = TakeWideHostString(message);
         uint32_t tag = 0;
-        while (validated != nullptr && validated->Next(1, &tag, nullptr) == S_OK) {
+        while (validated && validated->Next(1, &tag, nullptr) == S_OK) {
             outcome.validated.push_back(tag);
         }
-        if (validated != nullptr) {
-            validated->Release();
-        }
         if (outcome.validation == S_OK) {
-            outcome.persistence =
-                expert->PersistPropertyChanges(kSystemItemName, changes, &outcome.restartRequired);
+            outcome.persistence = expert->PersistPropertyChanges(kSystemItemName, changes.Get(),
+                                                                 &outcome.restartRequired);
         }
-        changes->Release();
         return outcome;
     }
 
@@ -136,10 +125,10 @@ TEST_F(SystemItemTest, GetShowsTheWholeCatalogue) {
         {0x0102F000, 6}, {0x0104C000, 2}, {0x0104A000, 1}, {0x0104B000, 6}, {0x01056000, 1},
         {0x01055000, 1}, {0x21004000, 1},
     };
-    IuxSysPropertyBag* bag = Properties();
-    ASSERT_NE(nullptr, bag);
-    IuxSysEnumPropertyTag* tags = nullptr;
-    ASSERT_EQ(S_OK, bag->GetTagEnumerator(&tags));
+    const InterfaceRef<IuxSysPropertyBag> bag = Properties();
+    ASSERT_TRUE(bag);
+    InterfaceRef<IuxSysEnumPropertyTag> tags;
+    ASSERT_EQ(S_OK, bag->GetTagEnumerator(tags.Receive()));
     std::map<uint32_t, uint32_t> reported;
     uint32_t tag = 0;
     while (tags->Next(1, &tag, nullptr) == S_OK) {
@@ -147,8 +136,6 @@ TEST_F(SystemItemTest, GetShowsTheWholeCatalogue) {
         EXPECT_EQ(S_OK, bag->GetTagType(tag, &type));
         reported[tag] = type;
     }
-    tags->Release();
-    bag->Release();
     EXPECT_EQ(types, reported);
 
     EXPECT_EQ(L"kest-1", Text(kHostNameTag));
@@ -300,12 +287,12 @@ TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
         EXPECT_TRUE(outcome.validated.empty());
 
         // A host that persists without validating first gets the same status.
-        IuxSysPropertyBag2* changes =
+        const InterfaceRef<IuxSysPropertyBag2> changes =
             Changes([&](IuxSysPropertyBag2* bag) { bag->SetString(c.tag, c.value); });
         int32_t restart = -1;
-        EXPECT_EQ(c.status, expert->PersistPropertyChanges(kSystemItemName, changes, &restart))
+        EXPECT_EQ(c.status,
+                  expert->PersistPropertyChanges(kSystemItemName, changes.Get(), &restart))
             << std::hex << c.tag;
-        changes->Release();
     }
     EXPECT_EQ(std::string::npos, sysroot.ReadFile(kControllerCallLogPath).find("\tSet"))
         << "nothing reached the controller";

@@ -15,6 +15,7 @@
 
 namespace {
 
+using e2e::InterfaceRef;
 using e2e::kSystemItemName;
 
 constexpr uint32_t kHostNameTag = 0x0101F000;
@@ -52,32 +53,31 @@ class StressExpertTest : public e2e::ExpertHostTest {
 
     // The system item's string property `tag`, read through `from`; empty when a call fails.
     static std::wstring ReadText(IuxSysExpert3* from, uint32_t tag, Failures& failures) {
-        IuxSysPropertyBag* bag = nullptr;
-        const HRESULT got = from->GetPropertiesOfItem(kSystemItemName, &bag);
-        failures.Check(got == S_OK && bag != nullptr, "GetPropertiesOfItem");
-        if (bag == nullptr) {
+        InterfaceRef<IuxSysPropertyBag> bag;
+        const HRESULT got = from->GetPropertiesOfItem(kSystemItemName, bag.Receive());
+        failures.Check(got == S_OK && bag, "GetPropertiesOfItem");
+        if (!bag) {
             return std::wstring();
         }
         CvqBStr text = nullptr;
         failures.Check(bag->GetString(tag, &text) == S_OK, "GetString");
-        bag->Release();
-        return e2e::TakeHostString(text);
+        return e2e::TakeWideHostString(text);
     }
 
     // A bag of changes made from the system item's properties with `write` applied.
     template <class Write>
-    static IuxSysPropertyBag* Changes(IuxSysExpert3* from, Failures& failures, Write&& write) {
-        IuxSysPropertyBag* current = nullptr;
-        failures.Check(from->GetPropertiesOfItem(kSystemItemName, &current) == S_OK,
+    static InterfaceRef<IuxSysPropertyBag> Changes(IuxSysExpert3* from, Failures& failures,
+                                                   Write&& write) {
+        InterfaceRef<IuxSysPropertyBag> current;
+        InterfaceRef<IuxSysPropertyBag> changes;
+        failures.Check(from->GetPropertiesOfItem(kSystemItemName, current.Receive()) == S_OK,
                        "GetPropertiesOfItem");
-        if (current == nullptr) {
-            return nullptr;
+        if (!current) {
+            return changes;
         }
-        IuxSysPropertyBag* changes = nullptr;
-        failures.Check(current->Clone(&changes) == S_OK, "Clone");
-        current->Release();
-        if (changes != nullptr) {
-            write(changes);
+        failures.Check(current->Clone(changes.Receive()) == S_OK, "Clone");
+        if (changes) {
+            write(changes.Get());
         }
         return changes;
     }
@@ -102,20 +102,18 @@ TEST_F(StressExpertTest, ThreadsCreateQueryAndReleaseExperts) {
                     failures.Check(e2e::TakeNames(names) == expectedNames, "item names");
                 }
                 failures.Check(ReadText(own, kHostNameTag, failures) == L"kest-1", "host name");
-                IuxSysPropertyBag* changes = Changes(own, failures, [&](IuxSysPropertyBag* bag) {
-                    bag->SetString(kHostNameTag, (L"kest-" + std::to_wstring(t + 2)).c_str());
-                });
-                if (changes != nullptr) {
-                    IuxSysEnumPropertyTag* validated = nullptr;
+                const InterfaceRef<IuxSysPropertyBag> changes =
+                    Changes(own, failures, [&](IuxSysPropertyBag* bag) {
+                        bag->SetString(kHostNameTag, (L"kest-" + std::to_wstring(t + 2)).c_str());
+                    });
+                if (changes) {
+                    InterfaceRef<IuxSysEnumPropertyTag> validated;
                     CvqBStr message = nullptr;
-                    failures.Check(own->ValidatePropertyChanges(kSystemItemName, changes,
-                                                                &validated, &message) == S_OK,
-                                   "ValidatePropertyChanges");
+                    failures.Check(
+                        own->ValidatePropertyChanges(kSystemItemName, changes.Get(),
+                                                     validated.Receive(), &message) == S_OK,
+                        "ValidatePropertyChanges");
                     CvqBStrFree(message);
-                    if (validated != nullptr) {
-                        validated->Release();
-                    }
-                    changes->Release();
                 }
                 // Uninitialize drops the shared item handlers that other threads are using.
                 failures.Check(own->Uninitialize() == S_OK, "Uninitialize");
@@ -139,7 +137,7 @@ TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
     std::vector<std::thread> readers;
     for (int r = 0; r < kReaderThreads; ++r) {
         readers.emplace_back([&, r] {
-            IuxSysExpert3* own = plugin.CreateExpert();
+            const InterfaceRef<IuxSysExpert3> own = plugin.CreateExpert();
             int rounds = 0;
             // At least a few rounds each, however quickly the persists end.
             while (persisting || rounds < 5) {
@@ -149,23 +147,22 @@ TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
                     failures.Check(own->SearchForItemsAndProperties(&sink) == S_OK, "search");
                     failures.Check(sink.names.size() == 2, "items found");
                 }
-                failures.Check(written.count(ReadText(own, kCommentTag, failures)) == 1,
+                failures.Check(written.count(ReadText(own.Get(), kCommentTag, failures)) == 1,
                                "comment read is one that was written");
             }
-            own->Release();
         });
     }
     for (int i = 0; i < kPersists; ++i) {
-        IuxSysPropertyBag* changes = Changes(expert, failures, [&](IuxSysPropertyBag* bag) {
-            bag->SetString(kCommentTag, (L"comment " + std::to_wstring(i)).c_str());
-            bag->SetBool(kWebServiceTag, i % 2);
-        });
-        if (changes != nullptr) {
+        const InterfaceRef<IuxSysPropertyBag> changes =
+            Changes(expert.Get(), failures, [&](IuxSysPropertyBag* bag) {
+                bag->SetString(kCommentTag, (L"comment " + std::to_wstring(i)).c_str());
+                bag->SetBool(kWebServiceTag, i % 2);
+            });
+        if (changes) {
             int32_t restart = -1;
             failures.Check(
-                expert->PersistPropertyChanges(kSystemItemName, changes, &restart) == S_OK,
+                expert->PersistPropertyChanges(kSystemItemName, changes.Get(), &restart) == S_OK,
                 "PersistPropertyChanges");
-            changes->Release();
         }
     }
     persisting = false;
@@ -173,7 +170,7 @@ TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
         thread.join();
     }
     EXPECT_EQ(failures.Failed(), std::set<std::string>());
-    EXPECT_EQ(ReadText(expert, kCommentTag, failures),
+    EXPECT_EQ(ReadText(expert.Get(), kCommentTag, failures),
               L"comment " + std::to_wstring(kPersists - 1));
 }
 

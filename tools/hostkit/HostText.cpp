@@ -90,6 +90,11 @@ std::string TakeHostString(CvqBStr str) {
     return str == nullptr ? std::string() : Utf8FromWide(str, CvqBStrLength(str));
 }
 
+std::wstring TakeWideHostString(CvqBStr str) {
+    CvqBStrHolder holder(str);
+    return str == nullptr ? std::wstring() : std::wstring(str, CvqBStrLength(str));
+}
+
 std::string GuidText(const GUID& guid) {
     char text[37];
     std::snprintf(text, sizeof text, "%08x-%04x-%04x-%02x%02x-%02x%02x%02x%02x%02x%02x", guid.Data1,

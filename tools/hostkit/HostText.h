@@ -18,6 +18,10 @@ std::optional<std::wstring> WideFromUtf8(const std::string& text);
 // Takes ownership of a host string from the plug-in, frees it, and returns it as UTF-8.
 std::string TakeHostString(CvqBStr str);
 
+// Takes ownership of a host string from the plug-in, frees it, and returns its wide text (empty
+// for a null string).
+std::wstring TakeWideHostString(CvqBStr str);
+
 // Lower-case registry form, for example "999d9aa4-5475-4ca7-a560-93c51b5bfceb".
 std::string GuidText(const GUID& guid);
 

@@ -33,13 +33,17 @@ class InterfaceRef {
         return &object_;
     }
 
-  private:
+    // Releases the held reference, if any.
     void Reset() {
         if (object_ != nullptr) {
             std::exchange(object_, nullptr)->Release();
         }
     }
 
+    // Hands the held reference to the caller, who releases it, and leaves this empty.
+    [[nodiscard]] T* Detach() { return std::exchange(object_, nullptr); }
+
+  private:
     T* object_ = nullptr;
 };
 
