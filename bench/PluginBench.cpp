@@ -3,19 +3,20 @@
 // `--library=double` loads the in-memory library double first, so that the plug-in binds to it
 // through the shared soname and the figures show the plug-in's own cost.
 #include <benchmark/benchmark.h>
-#include <dlfcn.h>
 
 #include <cstdio>
 #include <cstring>
-#include <memory>
+#include <optional>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "PluginHost.h"
+#include "hostkit/DemoController.h"
 
 namespace {
 
+using kest::hostkit::InterfaceRef;
 using kest_bench::kEthernetItemName;
 using kest_bench::kSystemItemName;
 
@@ -25,49 +26,38 @@ constexpr uint32_t kLocaleTag = 0x0D11D000;
 constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
 constexpr uint32_t kIPAddressTag = 0x0D107000;
 
-// Releases a host-interface pointer.
-struct Release {
-    void operator()(IUnknown* object) const { object->Release(); }
-};
-using BagPtr = std::unique_ptr<IuxSysPropertyBag2, Release>;
-
 // The item's properties as a changes bag with nothing modified yet.
-BagPtr ChangesOf(IuxSysExpert3& expert, const wchar_t* item) {
-    IuxSysPropertyBag* properties = nullptr;
-    if (expert.GetPropertiesOfItem(item, &properties) != S_OK) {
+InterfaceRef<IuxSysPropertyBag2> ChangesOf(IuxSysExpert3& expert, const wchar_t* item) {
+    InterfaceRef<IuxSysPropertyBag> properties;
+    if (expert.GetPropertiesOfItem(item, properties.Receive()) != S_OK) {
         throw std::runtime_error("GetPropertiesOfItem failed");
     }
-    IuxSysPropertyBag2* changes = nullptr;
-    const HRESULT status =
-        properties->QueryInterface(IID_IuxSysPropertyBag2, reinterpret_cast<void**>(&changes));
-    properties->Release();
-    if (status != S_OK) {
+    auto changes = kest::hostkit::QueryInterfaceAs<IuxSysPropertyBag2>(properties.Get(),
+                                                                       IID_IuxSysPropertyBag2);
+    if (!changes) {
         throw std::runtime_error("the bag has no IuxSysPropertyBag2");
     }
     changes->ClearAllModified();
-    return BagPtr(changes);
+    return changes;
 }
 
 // Validates `changes` once; the status, with the enumerator and message given back.
 HRESULT Validate(IuxSysExpert3& expert, const wchar_t* item, IuxSysPropertyBag* changes) {
-    IuxSysEnumPropertyTag* validated = nullptr;
+    InterfaceRef<IuxSysEnumPropertyTag> validated;
     CvqBStr message = nullptr;
-    const HRESULT status = expert.ValidatePropertyChanges(item, changes, &validated, &message);
-    if (validated != nullptr) {
-        validated->Release();
-    }
+    const HRESULT status =
+        expert.ValidatePropertyChanges(item, changes, validated.Receive(), &message);
     CvqBStrFree(message);
     return status;
 }
 
 void GetProperties(benchmark::State& state, IuxSysExpert3* expert, const wchar_t* item) {
     for (auto _ : state) {
-        IuxSysPropertyBag* properties = nullptr;
-        if (expert->GetPropertiesOfItem(item, &properties) != S_OK) {
+        InterfaceRef<IuxSysPropertyBag> properties;
+        if (expert->GetPropertiesOfItem(item, properties.Receive()) != S_OK) {
             state.SkipWithError("GetPropertiesOfItem failed");
             break;
         }
-        properties->Release();
     }
 }
 
@@ -104,33 +94,29 @@ int Run(int argc, char** argv) {
         return 2;
     }
     // Loaded first and globally, the double is the libvqtargetcfg.so.1 the plug-in binds to.
-    void* libraryDouble = nullptr;
+    std::optional<kest::hostkit::GlobalLibrary> libraryDouble;
     if (library == "double") {
-        libraryDouble = dlopen(KEST_LIBRARY_DOUBLE_PATH, RTLD_NOW | RTLD_GLOBAL);
-        if (libraryDouble == nullptr) {
-            std::fprintf(stderr, "cannot load the library double: %s\n", dlerror());
-            return 1;
-        }
+        libraryDouble.emplace(KEST_LIBRARY_DOUBLE_PATH, "the library double");
     }
     kest::test::TempSysroot sysroot;
     kest_bench::WriteControllerSysroot(sysroot);
     kest_bench::LoadedExpert loaded;
     IuxSysExpert3& expert = loaded.Expert();
 
-    BagPtr systemChanges = ChangesOf(expert, kSystemItemName);
+    const InterfaceRef<IuxSysPropertyBag2> systemChanges = ChangesOf(expert, kSystemItemName);
     systemChanges->SetString(kHostNameTag, L"kest-2");
     systemChanges->SetString(kCommentTag, L"second controller");
     systemChanges->SetString(kLocaleTag, L"de");
     systemChanges->SetString(kOlsonTimeZoneTag, L"America/Chicago");
-    BagPtr ethernetChanges = ChangesOf(expert, kEthernetItemName);
-    ethernetChanges->SetString(kIPAddressTag, L"192.168.1.20");
-    if (Validate(expert, kSystemItemName, systemChanges.get()) != S_OK ||
-        Validate(expert, kEthernetItemName, ethernetChanges.get()) != S_OK) {
+    const InterfaceRef<IuxSysPropertyBag2> ethernetChanges = ChangesOf(expert, kEthernetItemName);
+    ethernetChanges->SetString(kIPAddressTag, L"192.168.10.21");
+    if (Validate(expert, kSystemItemName, systemChanges.Get()) != S_OK ||
+        Validate(expert, kEthernetItemName, ethernetChanges.Get()) != S_OK) {
         std::fprintf(stderr, "the benchmark's changes do not validate\n");
         return 1;
     }
     // The simulated library logs every call; the double must not have been bypassed.
-    const bool simulatorCalled = sysroot.Exists("/var/lib/vqtargetcfg/calls.log");
+    const bool simulatorCalled = sysroot.Exists(kest::hostkit::kControllerCallLogPath);
     if (simulatorCalled != (library == "simulated")) {
         std::fprintf(stderr, "the plug-in is not bound to the %s library\n", library.c_str());
         return 1;
@@ -142,10 +128,10 @@ int Run(int argc, char** argv) {
     benchmark::RegisterBenchmark(("Plugin_GetPropertiesOfItem/eth0" + suffix).c_str(),
                                  GetProperties, &expert, kEthernetItemName);
     benchmark::RegisterBenchmark(("Plugin_ValidatePropertyChanges/system" + suffix).c_str(),
-                                 ValidateChanges, &expert, kSystemItemName, systemChanges.get());
+                                 ValidateChanges, &expert, kSystemItemName, systemChanges.Get());
     benchmark::RegisterBenchmark(("Plugin_ValidatePropertyChanges/eth0" + suffix).c_str(),
                                  ValidateChanges, &expert, kEthernetItemName,
-                                 ethernetChanges.get());
+                                 ethernetChanges.Get());
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv)) {
         return 2;

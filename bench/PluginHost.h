@@ -1,20 +1,18 @@
-// A host of the plug-in for benchmarks: a temporary sysroot that describes one controller (the
-// system item and the Ethernet adapter eth0) to the simulated library, and the plug-in loaded
+// A host of the plug-in for benchmarks: a temporary sysroot holding the demo controller (the
+// system item and the Ethernet adapter eth0) for the simulated library, and the plug-in loaded
 // with dlopen, its expert created by the factory and initialised.
 #pragma once
 
-#include <string>
-
 #include "common/TempSysroot.h"
-#include "uxsys/Interfaces.h"
+#include "hostkit/Plugin.h"
 
 namespace kest_bench {
 
 constexpr wchar_t kSystemItemName[] = L"VQ KEST Chassis";
 constexpr wchar_t kEthernetItemName[] = L"eth0";
 
-// Writes the controller's state, the firmware version, the time-zone table, zone files and the
-// shared settings directory into `sysroot`.
+// Writes the demo controller and the zone files of the time zones the benchmarks set into
+// `sysroot`.
 void WriteControllerSysroot(const kest::test::TempSysroot& sysroot);
 
 // The loaded plug-in and one initialised expert; everything is given back on destruction.
@@ -26,11 +24,11 @@ class LoadedExpert {
     LoadedExpert(const LoadedExpert&) = delete;
     LoadedExpert& operator=(const LoadedExpert&) = delete;
 
-    IuxSysExpert3& Expert() const { return *expert_; }
+    IuxSysExpert3& Expert() const { return *expert_.Get(); }
 
   private:
-    void* handle_ = nullptr;
-    IuxSysExpert3* expert_ = nullptr;
+    kest::hostkit::Plugin plugin_{KEST_PLUGIN_PATH};
+    kest::hostkit::InterfaceRef<IuxSysExpert3> expert_;
 };
 
 }  // namespace kest_bench

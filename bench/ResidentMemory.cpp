@@ -44,11 +44,10 @@ int main() {
             afterInitialize = MeasureResident();
             for (const wchar_t* item :
                  {kest_bench::kSystemItemName, kest_bench::kEthernetItemName}) {
-                IuxSysPropertyBag* properties = nullptr;
-                if (loaded.Expert().GetPropertiesOfItem(item, &properties) != S_OK) {
+                kest::hostkit::InterfaceRef<IuxSysPropertyBag> properties;
+                if (loaded.Expert().GetPropertiesOfItem(item, properties.Receive()) != S_OK) {
                     throw std::runtime_error("GetPropertiesOfItem failed");
                 }
-                properties->Release();
             }
             afterProperties = MeasureResident();
         }

@@ -8,13 +8,15 @@
 #include <string>
 
 #include "common/TempSysroot.h"
+#include "hostkit/DemoController.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kestcfg_test {
 
 class DemoControllerTest : public testing::Test {
   protected:
-    static constexpr const char* kStatePath = "/var/lib/vqtargetcfg/state.ini";
+    static constexpr const char* kStatePath = kest::hostkit::kControllerStatePath;
+    static constexpr const char* kCallLog = kest::hostkit::kControllerCallLogPath;
 
     void SetUp() override {
         const RunResult created = RunKestcfg({"sim", "init", sysroot_.Root()});

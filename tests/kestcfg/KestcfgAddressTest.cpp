@@ -15,8 +15,6 @@ namespace {
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
-const char kCallLog[] = "/var/lib/vqtargetcfg/calls.log";
-
 class KestcfgAddressTest : public kestcfg_test::DemoControllerTest {
   protected:
     // The logged library calls that change the controller, without their times.

@@ -14,8 +14,6 @@ using kestcfg_test::FlattenJson;
 using kestcfg_test::RunKestcfg;
 using kestcfg_test::RunResult;
 
-constexpr char kCallLog[] = "/var/lib/vqtargetcfg/calls.log";
-
 class KestcfgApplyTest : public kestcfg_test::DemoControllerTest {
   protected:
     // Runs kestcfg on the second controller.

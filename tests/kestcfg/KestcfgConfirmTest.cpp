@@ -27,7 +27,6 @@ using kestcfg_test::RunningProgram;
 using kestcfg_test::RunResult;
 using kestcfg_test::StartKestcfg;
 
-constexpr char kCallLog[] = "/var/lib/vqtargetcfg/calls.log";
 constexpr char kPending[] = "/run/kest/pending-rollback.json";
 constexpr char kLastRollback[] = "/run/kest/last-rollback.json";
 constexpr char kInterfaceUp[] = "SetNetworkInterfaceState\t0\teth0\t1";

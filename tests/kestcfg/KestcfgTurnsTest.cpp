@@ -125,8 +125,8 @@ class KestcfgInterruptedSetTest : public KestcfgTurnsTest,
 TEST_P(KestcfgInterruptedSetTest, BringsTheInterfaceUpAgainAndKeepsTheNewSettings) {
     RunningProgram running = StartKestcfg({"set", "eth0", "ip-address=192.168.10.40"});
     ASSERT_TRUE(PollUntil([&] {
-        return sysroot_.ReadFile("/var/lib/vqtargetcfg/calls.log")
-                   .find("\tSetNetworkInterfaceState\t0\teth0\t0\n") != std::string::npos;
+        return sysroot_.ReadFile(kCallLog).find("\tSetNetworkInterfaceState\t0\teth0\t0\n") !=
+               std::string::npos;
     }));
     ASSERT_EQ(0, kill(running.pid, GetParam()));
     const RunResult result = FinishProgram(running);
