@@ -109,7 +109,7 @@ int Run(int argc, char** argv) {
     systemChanges->SetString(kLocaleTag, L"de");
     systemChanges->SetString(kOlsonTimeZoneTag, L"America/Chicago");
     const InterfaceRef<IuxSysPropertyBag2> ethernetChanges = ChangesOf(expert, kEthernetItemName);
-    ethernetChanges->SetString(kIPAddressTag, L"192.168.10.21");
+    ethernetChanges->SetString(kIPAddressTag, L"192.168.1.20");
     if (Validate(expert, kSystemItemName, systemChanges.Get()) != S_OK ||
         Validate(expert, kEthernetItemName, ethernetChanges.Get()) != S_OK) {
         std::fprintf(stderr, "the benchmark's changes do not validate\n");
