@@ -22,7 +22,6 @@ namespace e2e {
 using kest::hostkit::InterfaceRef;
 using kest::hostkit::kControllerCallLogPath;
 using kest::hostkit::kControllerStatePath;
-using kest::hostkit::QueryInterfaceAs;
 using kest::hostkit::TakeWideHostString;
 
 constexpr uint32_t kItemNameTag = 0x0101D000;
