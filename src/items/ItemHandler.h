@@ -48,9 +48,9 @@ class ItemHandler : public vq::dsc::RefCountedThreadSafePolicy {
     // True when `description` describes this item; `exactMatch` is set when it does so exactly.
     // The base matches nothing.
     virtual bool IsMatchingItem(IuxSysPropertyBag* description, bool& exactMatch);
-    // True when the item wants a deferred task after each persist, which restarts the network
-    // interface the persist hands back and then calls OnDeferredPersist. The base wants none.
-    // Appended after the operations above so that their slots stay where they are.
+    // True when the item wants a deferred task after each persist: the task calls
+    // OnDeferredPersist, then restarts the network interface the persist handed back. The base
+    // wants none. Appended after the operations above so that their slots stay where they are.
     virtual bool NeedsInterfaceRestart();
 
     // The name the host uses for the item.
