@@ -15,6 +15,10 @@
 namespace kest {
 namespace {
 
+// The redirected clock file is readable by everyone; its directory is searchable by everyone.
+constexpr mode_t kClockFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH;
+constexpr mode_t kClockDirectoryMode = S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH;
+
 // Closes a descriptor and, unless released, removes the temporary file it was created for.
 class TemporaryFile {
   public:
@@ -49,7 +53,7 @@ class TemporaryFile {
 
     // Makes the file readable by everyone, flushes it and moves it to `target` atomically.
     void ReplaceFile(const std::string& target) {
-        if (fchmod(descriptor_, 0644) != 0 || fsync(descriptor_) != 0) {
+        if (fchmod(descriptor_, kClockFileMode) != 0 || fsync(descriptor_) != 0) {
             throw vq::dsc::osdep::PosixError();
         }
         const int closed = CloseDescriptor();
@@ -81,7 +85,7 @@ class TemporaryFile {
 void WriteRedirectedClock(int64_t seconds, int64_t microseconds) {
     const std::string target = paths::RedirectedSystemClockFile();
     const std::string directory = target.substr(0, target.rfind('/'));
-    vq::dsc::osdep::CreateDirectories(directory, 0755);
+    vq::dsc::osdep::CreateDirectories(directory, kClockDirectoryMode);
     TemporaryFile file(target + ".XXXXXX");
     file.Write(std::to_string(seconds) + " " + std::to_string(microseconds) + "\n");
     file.ReplaceFile(target);

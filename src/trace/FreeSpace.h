@@ -1,4 +1,5 @@
 // Free space of the file system that holds the trace log, measured in 64 bits.
+// Thread safety: the measurement may be replaced while other threads trace (it is kept atomic).
 #pragma once
 
 #include <cstdint>

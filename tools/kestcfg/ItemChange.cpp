@@ -13,14 +13,13 @@
 #include "ValueText.h"
 #include "hostkit/HostPropertyBag.h"
 #include "hostkit/HostText.h"
+#include "kest/ChassisTags.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
 using namespace kest::hostkit;
 
 namespace {
-
-constexpr uint32_t kClockTag = 0x0D11F000;
 
 std::optional<PropertyValue> Lookup(const std::vector<std::pair<uint32_t, PropertyValue>>& values,
                                     uint32_t tag) {
@@ -126,7 +125,7 @@ std::vector<ChangeOutcome> ItemChange::ReadBack(bool persisted) const {
     for (const auto& [tag, value] : requested_) {
         ChangeOutcome outcome{tag, value, Lookup(now, tag), Outcome::kNotStored};
         const std::optional<PropertyValue> before = Current(tag);
-        if (tag == kClockTag) {
+        if (tag == kest::tag::kCurrentTime) {
             outcome.outcome = persisted ? Outcome::kNotReadBack : Outcome::kNotStored;
         } else if (outcome.now && SameValue(*outcome.now, value)) {
             outcome.outcome = Outcome::kStored;
