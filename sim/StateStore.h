@@ -7,6 +7,7 @@
 #include <string>
 
 #include "StateDocument.h"
+#include "support/FileDescriptor.h"
 
 namespace vqsim {
 
@@ -49,12 +50,11 @@ class StateStore {
 class FileLock {
   public:
     explicit FileLock(const std::string& path);
-    ~FileLock();
     FileLock(const FileLock&) = delete;
     FileLock& operator=(const FileLock&) = delete;
 
   private:
-    int fd_;
+    kest::FileDescriptor fd_;
 };
 
 }  // namespace vqsim
