@@ -63,9 +63,8 @@ void IniText_Destroy(IniText* ini);
 
 // Read flags used by the next IniText_Load.
 void IniText_SetReadOptions(IniText* ini, uint32_t readFlags);
-// Maximum line length (<= 0: none), split character (kIniNoSplitCharacter: none; must be below
-// 128, else -5021)
-// and write flags used by IniText_Save. Returns 1.
+// Maximum line length (<= 0: none), split character (kIniNoSplitCharacter: none; must be
+// below 128, else -5021) and write flags used by IniText_Save. Returns 1.
 int IniText_SetWriteOptions(IniText* ini, int maxLineLength, int splitCharacter,
                             uint32_t writeFlags);
 // Whether repeated names refer to the existing section or key (default true) and whether names
