@@ -13,17 +13,12 @@
 #include <vector>
 
 #include "PluginHost.h"
+#include "kest/ChassisTags.h"
 
 namespace {
 
 using kest_bench::kEthernetItemName;
 using kest_bench::kSystemItemName;
-
-constexpr uint32_t kHostNameTag = 0x0101F000;
-constexpr uint32_t kCommentTag = 0x0103D000;
-constexpr uint32_t kLocaleTag = 0x0D11D000;
-constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
-constexpr uint32_t kIPAddressTag = 0x0D107000;
 
 // Releases a host-interface pointer.
 struct Release {
@@ -118,12 +113,12 @@ int Run(int argc, char** argv) {
     IuxSysExpert3& expert = loaded.Expert();
 
     BagPtr systemChanges = ChangesOf(expert, kSystemItemName);
-    systemChanges->SetString(kHostNameTag, L"kest-2");
-    systemChanges->SetString(kCommentTag, L"second controller");
-    systemChanges->SetString(kLocaleTag, L"de");
-    systemChanges->SetString(kOlsonTimeZoneTag, L"America/Chicago");
+    systemChanges->SetString(kest::tag::kHostName, L"kest-2");
+    systemChanges->SetString(kest::tag::kComment, L"second controller");
+    systemChanges->SetString(kest::tag::kLocaleCode, L"de");
+    systemChanges->SetString(kest::tag::kOlsonTimeZone, L"America/Chicago");
     BagPtr ethernetChanges = ChangesOf(expert, kEthernetItemName);
-    ethernetChanges->SetString(kIPAddressTag, L"192.168.1.20");
+    ethernetChanges->SetString(kest::tag::kIPAddress, L"192.168.1.20");
     if (Validate(expert, kSystemItemName, systemChanges.get()) != S_OK ||
         Validate(expert, kEthernetItemName, ethernetChanges.get()) != S_OK) {
         std::fprintf(stderr, "the benchmark's changes do not validate\n");

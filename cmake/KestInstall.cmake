@@ -8,7 +8,7 @@ include(GNUInstallDirs)
 install(TARGETS kestcfg RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
 install(TARGETS vqkestSysApiChassisExpert LIBRARY DESTINATION ${KEST_PLUGIN_INSTALL_DIR})
 install(FILES data/timezone.ini DESTINATION ${KEST_DATA_INSTALL_DIR})
-install(DIRECTORY include/uxsys DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(DIRECTORY include/uxsys include/kest DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(FILES tools/kestcfg/kestcfg.bash-completion
         DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions RENAME kestcfg)
 if(KESTCFG_MANUAL_PAGE)

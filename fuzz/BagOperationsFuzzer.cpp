@@ -11,13 +11,15 @@
 
 #include "FuzzCheck.h"
 #include "com/CountedPtr.h"
+#include "kest/ChassisTags.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
 namespace {
 
-constexpr uint32_t kTags[] = {0, 1, 2, 0x0101F000, 0x7FFFFFFF, 0x80000000, 0xFFFFFFFE, 0xFFFFFFFF};
+constexpr uint32_t kTags[] = {0,          1,          2,          kest::tag::kHostName,
+                              0x7FFFFFFF, 0x80000000, 0xFFFFFFFE, 0xFFFFFFFF};
 
 // One value of the model: its type code and its bytes (text for strings).
 struct ModelValue {

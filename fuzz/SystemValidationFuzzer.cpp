@@ -14,16 +14,16 @@
 #include "FuzzCheck.h"
 #include "FuzzSysroot.h"
 #include "com/CountedPtr.h"
+#include "kest/ChassisTags.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/TextConversion.h"
 #include "system/KestDeviceItemHandler.h"
-#include "system/SystemItemTags.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
 namespace {
 
-namespace tag = nVQKESTSYSAPICHASSISEXPERT100::SystemTag;
+namespace tag = kest::tag;
 using nVQKESTSYSAPICHASSISEXPERT100::KestDeviceItemHandler;
 
 constexpr uint32_t kTags[] = {tag::kHostName,          tag::kComment,        tag::kLocaleCode,

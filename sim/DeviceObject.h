@@ -11,6 +11,7 @@ namespace vqsim {
 
 // Describes one device as it was when listed. Created with one reference (the caller's); deletes
 // itself when the last reference is released.
+// Thread safety: any thread may use it at once: its fields never change and its count is atomic.
 class DeviceObject final : public vq::targetcfg::IDeviceHandler {
   public:
     DeviceObject(uint32_t type, std::string interfaceName, std::string macAddress, uint32_t index);

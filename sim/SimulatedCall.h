@@ -1,5 +1,8 @@
 // The frame every simulated library call runs in: sysroot check, serialisation, state loading,
 // faults, saving and the call-log line.
+// Thread safety: RunCall may be called from any thread at once; the calls of a process run one at
+// a time and hold the state's file lock against other processes. A SimulatedCall, its
+// CallArguments and its ControllerState belong to the one call that runs them.
 #pragma once
 
 #include <cstdint>

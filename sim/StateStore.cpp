@@ -15,6 +15,10 @@
 namespace vqsim {
 namespace {
 
+// The state directories and files are readable by everyone, writable by their owner.
+constexpr mode_t kDirectoryMode = S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH;
+constexpr mode_t kFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH;
+
 [[noreturn]] void ThrowFailure(const char* operation, const std::string& path, int error) {
     throw StoreFailure(std::string(operation) + " " + path + ": " + std::strerror(error));
 }
@@ -46,7 +50,7 @@ StateStore::StateStore(const std::string& sysroot) : directory_(sysroot + "/var/
 void StateStore::EnsureDirectory() const {
     for (size_t slash = directory_.find('/', 1);; slash = directory_.find('/', slash + 1)) {
         const std::string prefix = directory_.substr(0, slash);
-        if (::mkdir(prefix.c_str(), 0755) != 0 && errno != EEXIST) {
+        if (::mkdir(prefix.c_str(), kDirectoryMode) != 0 && errno != EEXIST) {
             ThrowFailure("mkdir", prefix, errno);
         }
         if (slash == std::string::npos) {
@@ -86,7 +90,7 @@ void StateStore::Save(const StateDocument& document) const {
         ThrowFailure("mkostemp", temporary, errno);
     }
     const std::string text = document.Serialize();
-    const bool written = ::fchmod(fd.Get(), 0644) == 0 && kest::WriteWhole(fd.Get(), text) &&
+    const bool written = ::fchmod(fd.Get(), kFileMode) == 0 && kest::WriteWhole(fd.Get(), text) &&
                          ::fsync(fd.Get()) == 0 && ::rename(temporary.c_str(), path.c_str()) == 0;
     if (!written) {
         const int error = errno;
@@ -101,7 +105,7 @@ void StateStore::Save(const StateDocument& document) const {
 
 void StateStore::AppendCallLog(const std::string& line) const {
     const std::string path = CallLogPath();
-    const kest::FileDescriptor fd(OpenRetrying(path, O_WRONLY | O_APPEND | O_CREAT, 0644));
+    const kest::FileDescriptor fd(OpenRetrying(path, O_WRONLY | O_APPEND | O_CREAT, kFileMode));
     if (!fd.IsOpen()) {
         ThrowFailure("open", path, errno);
     }
@@ -110,7 +114,7 @@ void StateStore::AppendCallLog(const std::string& line) const {
     }
 }
 
-FileLock::FileLock(const std::string& path) : fd_(OpenRetrying(path, O_RDWR | O_CREAT, 0644)) {
+FileLock::FileLock(const std::string& path) : fd_(OpenRetrying(path, O_RDWR | O_CREAT, kFileMode)) {
     if (!fd_.IsOpen()) {
         ThrowFailure("open", path, errno);
     }

@@ -1,5 +1,7 @@
 // The simulated controller's files under one sysroot: "var/lib/vqtargetcfg/state.ini", the lock
 // file beside it and the call log "calls.log". Failures throw StoreFailure.
+// Thread safety: a StateStore and a FileLock belong to the call that made them; RunCall holds the
+// process's call mutex and the FileLock around every Load and Save.
 #pragma once
 
 #include <optional>
@@ -36,12 +38,12 @@ class StateStore {
     // Appends `line` (with its line end) to calls.log in one write.
     void AppendCallLog(const std::string& line) const;
 
-    const std::string& Directory() const { return directory_; }
-    std::string StatePath() const { return directory_ + "/state.ini"; }
     std::string LockPath() const { return directory_ + "/state.lock"; }
-    std::string CallLogPath() const { return directory_ + "/calls.log"; }
 
   private:
+    std::string StatePath() const { return directory_ + "/state.ini"; }
+    std::string CallLogPath() const { return directory_ + "/calls.log"; }
+
     std::string directory_;
 };
 

@@ -1,5 +1,6 @@
 // The thread model of every component: no lock per object; each change of any object's reference
 // count happens under one process-wide mutex, which exists from the moment the library is loaded.
+// Thread safety: Increment and Decrement may be called from any thread at once.
 #pragma once
 
 #include <cstdint>

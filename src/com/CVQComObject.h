@@ -3,6 +3,9 @@
 //
 // T derives from its interfaces and from CVQComObjectRootEx<CVQComMultiThreadModelNoCS> (a
 // virtual base when T has several interface bases) and declares `using InterfaceMap = ...;`.
+//
+// Thread safety: QueryInterface, AddRef and Release may be called from any thread at once; T's
+// own operations state their own rules.
 #pragma once
 
 #include <cstdint>

@@ -1,5 +1,6 @@
 // The reference count of a component object. A class with several interface bases derives from
 // it virtually, so the object has exactly one count however many interfaces it implements.
+// Thread safety: the count changes only through ThreadModel, which serialises the changes.
 #pragma once
 
 #include <cstdint>

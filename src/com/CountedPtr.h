@@ -1,5 +1,7 @@
 // The one owning pointer for every counted reference: component interface pointers and the
 // plug-in's own counted objects alike (anything with AddRef() and Release()).
+// Thread safety: one CountedPtr belongs to one thread at a time; CountedPtrs to the same object
+// may be copied and dropped in different threads at once when the object's count is thread-safe.
 #pragma once
 
 #include <cstddef>

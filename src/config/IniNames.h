@@ -1,6 +1,6 @@
 // How section and key names compare: surrounding whitespace never counts, and letters compare
 // without regard to case unless case sensitivity is on.
-// Threads: NameRules is a value that does not change after construction; its const operations
+// Thread safety: NameRules is a value that does not change after construction; its const operations
 // may run concurrently.
 #pragma once
 

@@ -1,8 +1,8 @@
 // The INI engine: one parsed INI document (`IniText`) behind a C-style interface. Getters return
 // 1 when found, 0 when not found; setters return 1 on success; IniText_Load and IniText_Save
 // return 0 on success. Every failure is one of the negative results below.
-// Threads: calls on one document must not overlap (the INI cache serialises its documents with
-// IniFileManager::CacheLock()); distinct documents may be used from different threads at once.
+// Thread safety: calls on one document must not overlap (the INI cache serialises its documents
+// with IniFileManager::CacheLock()); distinct documents may be used from different threads at once.
 #pragma once
 
 #include <cstddef>

@@ -1,5 +1,5 @@
 // Owning handle of an IniText document: destroys it with IniText_Destroy.
-// Threads: as for the document it owns (see IniText.h).
+// Thread safety: as for the document it owns (see IniText.h).
 #pragma once
 
 #include <memory>

@@ -4,9 +4,8 @@
 #include <utility>
 
 #include "expert/DiagnosticsSettings.h"
-#include "expert/HostStringResult.h"
-#include "network/NetworkItemHandler.h"
 #include "property/CuxDynamicPropertyBag.h"
+#include "property/HostStringResult.h"
 #include "property/ItemNameEnumerator.h"
 #include "property/PropertyTagEnumerator.h"
 #include "support/EntryGuard.h"
@@ -280,7 +279,7 @@ HRESULT CuxNetConfigExpert::PersistPropertyChanges(const wchar_t* item, IuxSysPr
         status = handler->PersistPropertyChanges(changes, *restartRequired, deviceHandler,
                                                  adapterDisabled);
         status = iniCache_->FlushIniCache();
-        if (dynamic_cast<NetworkItemHandler*>(handler.Get()) != nullptr) {
+        if (handler->NeedsInterfaceRestart()) {
             // The interface restarts on the task's thread, after this answer reached the host.
             CountedPtr<IuxSysPropertyBag> clone;
             status = changes->Clone(clone.Receive());

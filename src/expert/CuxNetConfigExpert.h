@@ -10,10 +10,14 @@
 #include "com/CVQComObjectRootEx.h"
 #include "com/CountedPtr.h"
 #include "config/IniFileManager.h"
+#include "items/DeferredPersistTask.h"
 #include "items/ItemManagerBase.h"
-#include "network/DeferredPersistTask.h"
 #include "uxsys/Expert.h"
 
+// Thread safety: any host thread may call at once. Initialize, Uninitialize and
+// PersistPropertyChanges (and with it the pending tasks) hold the process-wide expert lock; the
+// other entry points rely on the item manager's and the handlers' own locks. SetItemManager is
+// called once, by the factory, before the expert is shared.
 class CuxNetConfigExpert : public IuxSysExpert3,
                            public IuxSysExpertPlugPlay,
                            public IuxSysExpertImportExport,

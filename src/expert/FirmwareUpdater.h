@@ -16,6 +16,9 @@
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
+// Thread safety: any host thread may call at once, beside the worker thread. startMutex_
+// serialises Start, SetStagingPath and the worker handle; lockMutex_ guards the update lock;
+// the state and the busy mark are atomic.
 class FirmwareUpdater {
   public:
     FirmwareUpdater() = default;

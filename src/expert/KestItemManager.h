@@ -7,6 +7,7 @@
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
+// Thread safety: as ItemManagerBase; EnumerateItems builds the list under the item lock.
 class KestItemManager : public ItemManagerBase {
   public:
     KestItemManager() = default;

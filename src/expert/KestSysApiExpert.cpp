@@ -1,6 +1,6 @@
 #include "expert/KestSysApiExpert.h"
 
-#include "expert/HostStringResult.h"
+#include "property/HostStringResult.h"
 #include "support/CurrentExceptionToStatus.h"
 #include "support/Sysroot.h"
 #include "support/TraceGate.h"

@@ -10,6 +10,8 @@
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
+// Thread safety: as CuxNetConfigExpert; the firmware operations go to the FirmwareUpdater, which
+// guards itself.
 class KestSysApiExpert : public CuxNetConfigExpert,
                          public IuxSysExpertFirmware,
                          public IuxSysFrameworkNotificationHandler {

@@ -3,17 +3,12 @@
 #include <cwctype>
 #include <utility>
 
+#include "kest/ChassisTags.h"
 #include "support/StatusHolder.h"
 #include "uxsys/StatusCodes.h"
 
 namespace {
-// The rows that every item reports, in the order they are written: a fixed 1, the item name, the
-// numeric attribute, the second name and a fixed 0x150000.
-constexpr uint32_t kTagFixedOne = 0x0101C000;
-constexpr uint32_t kTagItemName = 0x0101D000;
-constexpr uint32_t kTagNumericAttribute = 0x0102A000;
-constexpr uint32_t kTagSecondName = 0x0101F000;
-constexpr uint32_t kTagFixedValue = 0x01037000;
+// The value of the fixed unsigned row every item reports.
 constexpr uint32_t kFixedValue = 0x150000;
 }  // namespace
 
@@ -45,11 +40,12 @@ HRESULT ItemHandler::GetItemProperties(IuxSysPropertyBag* bag) {
         return E_POINTER;
     }
     StatusHolder status;
-    status = bag->SetLong(kTagFixedOne, 1);
-    status = bag->SetString(kTagItemName, itemName_.c_str());
-    status = bag->SetLong(kTagNumericAttribute, static_cast<int32_t>(numericAttribute_));
-    status = bag->SetString(kTagSecondName, secondName_.c_str());
-    status = bag->SetULong(kTagFixedValue, kFixedValue);
+    status = bag->SetLong(kest::tag::kItemFixedLong, 1);
+    status = bag->SetString(kest::tag::kItemName, itemName_.c_str());
+    status = bag->SetLong(kest::tag::kNumericAttribute, static_cast<int32_t>(numericAttribute_));
+    // The second name stands in the host-name row until a handler writes the real host name.
+    status = bag->SetString(kest::tag::kHostName, secondName_.c_str());
+    status = bag->SetULong(kest::tag::kItemFixedULong, kFixedValue);
     return S_OK;
 }
 
@@ -79,5 +75,9 @@ HRESULT ItemHandler::GetImportableTags(PropertyTagSet& /*tags*/) {
 }
 
 bool ItemHandler::IsMatchingItem(IuxSysPropertyBag* /*description*/, bool& /*exactMatch*/) {
+    return false;
+}
+
+bool ItemHandler::NeedsInterfaceRestart() {
     return false;
 }

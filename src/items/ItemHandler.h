@@ -16,6 +16,8 @@
 // An ordered set of property tags filled by a handler (validated or importable tags).
 using PropertyTagSet = std::set<uint32_t>;
 
+// Thread safety: any host thread may call any operation at once; the base holds only names
+// fixed at construction, and each handler guards its own state (see its class comment).
 class ItemHandler : public vq::dsc::RefCountedThreadSafePolicy {
   public:
     // The numeric attribute every handler of this plug-in is constructed with.
@@ -46,12 +48,13 @@ class ItemHandler : public vq::dsc::RefCountedThreadSafePolicy {
     // True when `description` describes this item; `exactMatch` is set when it does so exactly.
     // The base matches nothing.
     virtual bool IsMatchingItem(IuxSysPropertyBag* description, bool& exactMatch);
+    // True when the item wants a deferred task after each persist: the task calls
+    // OnDeferredPersist, then restarts the network interface the persist handed back. The base
+    // wants none. Appended after the operations above so that their slots stay where they are.
+    virtual bool NeedsInterfaceRestart();
 
     // The name the host uses for the item.
     const std::wstring& ItemName() const noexcept { return itemName_; }
-    // The user-visible name written among the item's properties.
-    const std::wstring& SecondName() const noexcept { return secondName_; }
-    uint32_t NumericAttribute() const noexcept { return numericAttribute_; }
 
     // True when `name` equals the item name, ignoring case.
     bool HasItemName(const std::wstring& name) const;

@@ -2,13 +2,12 @@
 
 #include <utility>
 
+#include "kest/ChassisTags.h"
 #include "uxsys/StatusCodes.h"
 
 namespace {
 // The process-wide manager, or null; read and written only under the item lock.
 ItemManagerBase* processManager = nullptr;
-
-constexpr uint32_t kTagRefreshMask = ~static_cast<uint32_t>(0xFFF);
 }  // namespace
 
 vq::dsc::Mutex& ItemManagerBase::ItemLock() {
@@ -98,7 +97,7 @@ bool ItemManagerBase::AreTagsRequested(uint32_t count, const uint32_t* tags,
         return false;
     }
     for (uint32_t i = 0; i < count; ++i) {
-        if (refreshTags.count(tags[i] & kTagRefreshMask) != 0) {
+        if (refreshTags.count(tags[i] & kest::tag::kRefreshMask) != 0) {
             return true;
         }
     }

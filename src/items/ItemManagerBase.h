@@ -16,6 +16,8 @@
 // A snapshot of handlers, each held by its own reference.
 using ItemHandlerList = std::vector<CountedPtr<ItemHandler>>;
 
+// Thread safety: every operation may be called on any thread at once; the handler list and the
+// process-wide manager are guarded by the item lock (ItemLock).
 class ItemManagerBase : public vq::dsc::RefCountedThreadSafePolicy {
   public:
     // The process-wide manager with one more reference. When there is none and `create` is set,

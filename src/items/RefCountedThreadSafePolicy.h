@@ -12,6 +12,7 @@
 namespace vq {
 namespace dsc {
 
+// Thread safety: AddRef and Release may be called on any thread at once; the count is atomic.
 class RefCountedThreadSafePolicy {
   public:
     RefCountedThreadSafePolicy(const RefCountedThreadSafePolicy&) = delete;

@@ -3,10 +3,10 @@
 #include <utility>
 
 #include "items/ItemManagerBase.h"
-#include "network/BagReading.h"
-#include "network/LibraryCall.h"
-#include "network/NetworkTags.h"
-#include "network/ValidationMessage.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
+#include "property/BagAccess.h"
+#include "property/HostStringResult.h"
 #include "support/StatusHolder.h"
 #include "uxsys/StatusCodes.h"
 #include "vq/targetcfg/Network.h"
@@ -23,9 +23,8 @@ constexpr wchar_t kPollingIntervalOutOfRange[] =
 
 // The tags whose refresh rewrites the Ethernet rows.
 const PropertyTagSet& EthernetRefreshTags() {
-    static const PropertyTagSet tags = {NetworkTag::kAdapterMode, NetworkTag::kPollingInterval,
-                                        NetworkTag::kSupportedPollingModes,
-                                        NetworkTag::kPollingMode};
+    static const PropertyTagSet tags = {kest::tag::kAdapterMode, kest::tag::kPollingInterval,
+                                        kest::tag::kSupportedPollingModes, kest::tag::kPollingMode};
     return tags;
 }
 
@@ -34,7 +33,7 @@ const PropertyTagSet& EthernetRefreshTags() {
 }
 
 bool IsAcceptedPollingMode(uint32_t pollingMode) {
-    return pollingMode == 1 || pollingMode == PollingMode::kPolling || pollingMode == 4;
+    return pollingMode == 1 || pollingMode == kest::polling_mode::kPolling || pollingMode == 4;
 }
 
 }  // namespace
@@ -66,9 +65,9 @@ HRESULT EthernetItemHandler::PopulateProperties(IuxSysPropertyBag* bag) {
         return E_POINTER;
     }
     StatusHolder status;
-    status = bag->SetULong(NetworkTag::kEthernetConstantOne, 1);
+    status = bag->SetULong(kest::tag::kEthernetFixedULong, 1);
 
-    uint32_t mode = AdapterMode::kTcpIp;
+    uint32_t mode = kest::adapter_mode::kTcpIp;
     ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(DeviceIndex(), mode));
     TraceLibraryCall("EthernetItemHandler::PopulateProperties - GetDeviceModeByIndex", mode);
     uint32_t supportedModes = kDefaultSupportedAdapterModes;
@@ -76,31 +75,31 @@ HRESULT EthernetItemHandler::PopulateProperties(IuxSysPropertyBag* bag) {
         network::GetDeviceSupportedModesByIndex(DeviceIndex(), supportedModes));
     TraceLibraryCall("EthernetItemHandler::PopulateProperties - GetDeviceSupportedModesByIndex",
                      supportedModes);
-    status = bag->SetULong(NetworkTag::kAdapterMode, mode);
-    status = bag->SetULong(NetworkTag::kSupportedAdapterModes, supportedModes);
+    status = bag->SetULong(kest::tag::kAdapterMode, mode);
+    status = bag->SetULong(kest::tag::kSupportedAdapterModes, supportedModes);
 
-    uint32_t supportedPollingModes = PollingMode::kNone;
-    uint32_t pollingMode = PollingMode::kNone;
-    if (mode == AdapterMode::kTcpIp) {
+    uint32_t supportedPollingModes = kest::polling_mode::kOff;
+    uint32_t pollingMode = kest::polling_mode::kOff;
+    if (mode == kest::adapter_mode::kTcpIp) {
         if (network::GetSupportedDeviceSettings(DeviceIndex(), nullptr, &supportedPollingModes) !=
             0) {
-            supportedPollingModes = PollingMode::kNone;
+            supportedPollingModes = kest::polling_mode::kOff;
         }
         TraceLibraryCall("EthernetItemHandler::PopulateProperties - GetSupportedDeviceSettings",
                          supportedPollingModes);
         uint32_t interval = 0;
         if (network::GetCurrentDeviceSettings(DeviceIndex(), nullptr, &pollingMode, &interval) !=
             0) {
-            pollingMode = PollingMode::kNone;
+            pollingMode = kest::polling_mode::kOff;
         }
         TraceLibraryCall("EthernetItemHandler::PopulateProperties - GetCurrentDeviceSettings",
                          pollingMode);
-        if (pollingMode == PollingMode::kPolling) {
-            status = bag->SetULong(NetworkTag::kPollingInterval, interval);
+        if (pollingMode == kest::polling_mode::kPolling) {
+            status = bag->SetULong(kest::tag::kPollingInterval, interval);
         }
     }
-    status = bag->SetULong(NetworkTag::kSupportedPollingModes, supportedPollingModes);
-    status = bag->SetULong(NetworkTag::kPollingMode, pollingMode);
+    status = bag->SetULong(kest::tag::kSupportedPollingModes, supportedPollingModes);
+    status = bag->SetULong(kest::tag::kPollingMode, pollingMode);
     return S_OK;
 }
 
@@ -118,23 +117,23 @@ HRESULT EthernetItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* changes,
     }
     uint32_t tag = 0;
     while (tags->Next(1, &tag, nullptr) == S_OK) {
-        if (tag == NetworkTag::kPollingMode) {
+        if (tag == kest::tag::kPollingMode) {
             const uint32_t pollingMode = ReadULong(changes, tag);
             if (!IsAcceptedPollingMode(pollingMode) ||
-                (pollingMode & ReadULong(changes, NetworkTag::kSupportedPollingModes)) == 0) {
+                (pollingMode & ReadULong(changes, kest::tag::kSupportedPollingModes)) == 0) {
                 ThrowStatus(UX_E_VALUE_INVALID);
             }
             validated.insert(tag);
-        } else if (tag == NetworkTag::kPollingInterval) {
+        } else if (tag == kest::tag::kPollingInterval) {
             const uint32_t interval = ReadULong(changes, tag);
             if (interval < kShortestPollingIntervalMs || interval > kLongestPollingIntervalMs) {
                 StoreValidationMessage(message, kPollingIntervalOutOfRange);
                 ThrowStatus(UX_E_VALUE_INVALID);
             }
             validated.insert(tag);
-        } else if (tag == NetworkTag::kAdapterMode) {
+        } else if (tag == kest::tag::kAdapterMode) {
             const uint32_t mode = ReadULong(changes, tag);
-            if ((mode & ReadULong(changes, NetworkTag::kSupportedAdapterModes)) == 0) {
+            if ((mode & ReadULong(changes, kest::tag::kSupportedAdapterModes)) == 0) {
                 ThrowStatus(UX_E_VALUE_INVALID);
             }
             validated.insert(tag);
@@ -159,14 +158,15 @@ HRESULT EthernetItemHandler::PersistPropertyChanges(
     bool pollingModified = false;
     uint32_t tag = 0;
     while (!pollingModified && modifiedTags->Next(1, &tag, nullptr) == S_OK) {
-        pollingModified = tag == NetworkTag::kPollingMode || tag == NetworkTag::kPollingInterval;
+        pollingModified = tag == kest::tag::kPollingMode || tag == kest::tag::kPollingInterval;
     }
     if (!pollingModified) {
         return S_OK;
     }
-    const uint32_t pollingMode = ReadULong(changes, NetworkTag::kPollingMode);
-    const uint32_t interval =
-        pollingMode == PollingMode::kPolling ? ReadULong(changes, NetworkTag::kPollingInterval) : 0;
+    const uint32_t pollingMode = ReadULong(changes, kest::tag::kPollingMode);
+    const uint32_t interval = pollingMode == kest::polling_mode::kPolling
+                                  ? ReadULong(changes, kest::tag::kPollingInterval)
+                                  : 0;
     ThrowIfLibraryCallFailed(network::SetDeviceSettings(DeviceIndex(), 0, pollingMode, interval));
     return S_OK;
 }

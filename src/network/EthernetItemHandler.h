@@ -9,6 +9,8 @@
 #include "network/NetworkItemHandler.h"
 #include "vq/targetcfg/DeviceHandler.h"
 
+// Thread safety: as NetworkItemHandler; its class-wide refresh tags too are filled in the first
+// construction, under the item lock, and only read afterwards.
 class EthernetItemHandler : public NetworkItemHandler {
   public:
     // The item named `itemName` (the interface name) served through `device`.

@@ -2,10 +2,9 @@
 
 #include <string>
 
-#include "network/BagReading.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "network/IPv4Text.h"
-#include "network/LibraryCall.h"
-#include "network/NetworkTags.h"
 #include "property/BagAccess.h"
 #include "support/Exceptions.h"
 #include "support/StatusHolder.h"
@@ -49,13 +48,14 @@ void ReadOptionalAddress(IuxSysPropertyBag* bag, uint32_t tag, IPAddress& addres
 // True for the adapter modes whose selection alone counts as a change: 1, 4 and 8. Switching
 // between the TCP/IP modes does not.
 bool RestartsOnModeSwitch(uint32_t mode) {
-    return mode == AdapterMode::kDisabled || mode == 4 || mode == AdapterMode::kEtherCAT;
+    return mode == kest::adapter_mode::kDisabled || mode == 4 ||
+           mode == kest::adapter_mode::kEtherCAT;
 }
 
 // True when the bag's preferred media mode differs from the adapter's current one.
 bool HasMediaModeChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
     uint32_t newMediaMode = 0;
-    if (bag->GetULong(NetworkTag::kPreferredMediaMode, &newMediaMode) != S_OK) {
+    if (bag->GetULong(kest::tag::kPreferredMediaMode, &newMediaMode) != S_OK) {
         return false;
     }
     uint32_t currentMediaMode = 0;
@@ -68,10 +68,10 @@ bool HasMediaModeChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
 // True when the static address, mask, gateway or DNS server in the bag differs from the
 // adapter's. A text that is no address raises the runtime's exception.
 bool HaveStaticAddressesChanged(uint32_t deviceIndex, IuxSysPropertyBag* bag) {
-    const IPAddress newAddress = ReadAddress(bag, NetworkTag::kIPAddress);
-    const IPAddress newMask = ReadAddress(bag, NetworkTag::kSubnetMask);
-    const IPAddress newGateway = ReadStoredAddress(bag, NetworkTag::kGateway);
-    const IPAddress newDnsServer = ReadStoredAddress(bag, NetworkTag::kDnsServer);
+    const IPAddress newAddress = ReadAddress(bag, kest::tag::kIPAddress);
+    const IPAddress newMask = ReadAddress(bag, kest::tag::kSubnetMask);
+    const IPAddress newGateway = ReadStoredAddress(bag, kest::tag::kGateway);
+    const IPAddress newDnsServer = ReadStoredAddress(bag, kest::tag::kDnsServer);
 
     // The adapter's addresses start as 0.0.0.0, the value its properties show when the library
     // has none, so reading those properties back is no change. An adapter without an address
@@ -98,7 +98,7 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
     StatusHolder status;
 
     bool primary = false;
-    status = BagGetBool(bag, NetworkTag::kPrimaryAdapter, primary);
+    status = BagGetBool(bag, kest::tag::kPrimaryAdapter, primary);
     uint32_t primaryIndex = 0;
     ThrowIfLibraryCallFailed(network::GetPrimaryDeviceIndex(primaryIndex));
     // A false flag never takes the primary role away, so only a true one on another adapter
@@ -108,7 +108,7 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
         return S_OK;
     }
 
-    const uint32_t newMode = ReadULong(bag, NetworkTag::kAdapterMode);
+    const uint32_t newMode = ReadULong(bag, kest::tag::kAdapterMode);
     uint32_t currentMode = 0;
     ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(deviceIndex, currentMode));
     if (newMode != currentMode && RestartsOnModeSwitch(newMode)) {
@@ -116,7 +116,7 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
         return S_OK;
     }
 
-    const uint32_t newRequestMode = ReadULong(bag, NetworkTag::kRequestMode);
+    const uint32_t newRequestMode = ReadULong(bag, kest::tag::kRequestMode);
     uint32_t currentRequestMode = 0;
     ThrowIfLibraryCallFailed(
         network::GetDeviceTCPIPRequestModeByIndex(deviceIndex, currentRequestMode));
@@ -125,12 +125,12 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
         return S_OK;
     }
 
-    if (newMode == AdapterMode::kTcpIp && currentMode == AdapterMode::kTcpIp &&
+    if (newMode == kest::adapter_mode::kTcpIp && currentMode == kest::adapter_mode::kTcpIp &&
         HasMediaModeChanged(deviceIndex, bag)) {
         changed = true;
         return S_OK;
     }
-    if (newRequestMode != RequestMode::kStatic) {
+    if (newRequestMode != kest::request_mode::kStatic) {
         return S_OK;
     }
 
@@ -153,22 +153,22 @@ HRESULT ApplyInterfaceSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, boo
     IPAddress dnsServer = address;
     uint32_t requestMode = 0;
 
-    const uint32_t mode = ReadULong(bag, NetworkTag::kAdapterMode);
-    if (mode == AdapterMode::kEtherCAT) {
+    const uint32_t mode = ReadULong(bag, kest::tag::kAdapterMode);
+    if (mode == kest::adapter_mode::kEtherCAT) {
         bool flag = false;
-        BagGetBool(bag, NetworkTag::kEtherCATFlag, flag);
-        const uint32_t masterId = ReadULong(bag, NetworkTag::kEtherCATMasterId);
+        BagGetBool(bag, kest::tag::kEtherCATFlag, flag);
+        const uint32_t masterId = ReadULong(bag, kest::tag::kEtherCATMasterId);
         ThrowIfLibraryCallFailed(network::SetEtherCATSettings(deviceIndex, masterId, flag));
-    } else if (AdapterMode::IsTcpIp(mode)) {
-        requestMode = ReadULong(bag, NetworkTag::kRequestMode);
-        if (requestMode == RequestMode::kStatic) {
-            address = ReadAddress(bag, NetworkTag::kIPAddress);
-            mask = ReadAddress(bag, NetworkTag::kSubnetMask);
-            if (wasPrimary || BagHasTag(bag, NetworkTag::kGateway)) {
-                ReadOptionalAddress(bag, NetworkTag::kGateway, gateway);
+    } else if (kest::adapter_mode::IsTcpIp(mode)) {
+        requestMode = ReadULong(bag, kest::tag::kRequestMode);
+        if (requestMode == kest::request_mode::kStatic) {
+            address = ReadAddress(bag, kest::tag::kIPAddress);
+            mask = ReadAddress(bag, kest::tag::kSubnetMask);
+            if (wasPrimary || BagHasTag(bag, kest::tag::kGateway)) {
+                ReadOptionalAddress(bag, kest::tag::kGateway, gateway);
             }
-            if (wasPrimary || BagHasTag(bag, NetworkTag::kDnsServer)) {
-                ReadOptionalAddress(bag, NetworkTag::kDnsServer, dnsServer);
+            if (wasPrimary || BagHasTag(bag, kest::tag::kDnsServer)) {
+                ReadOptionalAddress(bag, kest::tag::kDnsServer, dnsServer);
             }
         }
     }

@@ -5,8 +5,18 @@
 
 #include <cstdint>
 
+#include "kest/ChassisTags.h"
 #include "uxsys/PropertyBag.h"
 #include "uxsys/Types.h"
+
+// True for the tags whose change is checked and applied as one set of interface settings:
+// adapter mode, request mode, the four addresses and the EtherCAT settings.
+constexpr bool IsInterfaceSettingTag(uint32_t tag) {
+    namespace t = kest::tag;
+    return tag == t::kAdapterMode || tag == t::kRequestMode || tag == t::kIPAddress ||
+           tag == t::kSubnetMask || tag == t::kGateway || tag == t::kDnsServer ||
+           tag == t::kEtherCATMasterId || tag == t::kEtherCATFlag;
+}
 
 // Sets `changed` when storing the settings in `bag` would alter the adapter's (device
 // `deviceIndex`): the primary role given to it, a switch to adapter mode 1, 4 or 8, the request

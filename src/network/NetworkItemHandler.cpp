@@ -3,9 +3,9 @@
 #include <utility>
 
 #include "items/ItemManagerBase.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "network/IPv4Text.h"
-#include "network/LibraryCall.h"
-#include "network/NetworkTags.h"
 #include "property/BagAccess.h"
 #include "support/StatusHolder.h"
 #include "support/TextConversion.h"
@@ -28,12 +28,12 @@ constexpr size_t kKindPrefixLength = 2;
 // the constant rows never change, so asking for them alone rewrites nothing.
 const PropertyTagSet& NetworkRefreshTags() {
     static const PropertyTagSet tags = {
-        NetworkTag::kPrimaryAdapter,   NetworkTag::kSupportedRequestModes,
-        NetworkTag::kRequestMode,      NetworkTag::kIPAddress,
-        NetworkTag::kSubnetMask,       NetworkTag::kGateway,
-        NetworkTag::kDnsServer,        NetworkTag::kSupportedMediaModes,
-        NetworkTag::kCurrentMediaMode, NetworkTag::kPreferredMediaMode,
-        NetworkTag::kEtherCATFlag,     NetworkTag::kEtherCATMasterId,
+        kest::tag::kPrimaryAdapter,   kest::tag::kSupportedRequestModes,
+        kest::tag::kRequestMode,      kest::tag::kIPAddress,
+        kest::tag::kSubnetMask,       kest::tag::kGateway,
+        kest::tag::kDnsServer,        kest::tag::kSupportedMediaModes,
+        kest::tag::kCurrentMediaMode, kest::tag::kPreferredMediaMode,
+        kest::tag::kEtherCATFlag,     kest::tag::kEtherCATMasterId,
     };
     return tags;
 }
@@ -74,35 +74,35 @@ HRESULT NetworkItemHandler::PopulateProperties(IuxSysPropertyBag* bag) {
         return E_POINTER;
     }
     StatusHolder status;
-    status = BagSetBool(bag, NetworkTag::kConstantTrue, true);
-    status = bag->SetLong(NetworkTag::kConstantOne, 1);
-    status = bag->SetULong(NetworkTag::kConstantFive, 5);
+    status = BagSetBool(bag, kest::tag::kItemFixedBool, true);
+    status = bag->SetLong(kest::tag::kItemFixedLong2, 1);
+    status = bag->SetULong(kest::tag::kItemFixedULong2, 5);
 
     vq::targetcfg::NarrowString macAddress;
     ThrowIfLibraryCallFailed(network::GetMACAddressByIndex(deviceIndex_, macAddress));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetMACAddressByIndex",
                      macAddress.str());
-    status = BagSetNarrowString(bag, NetworkTag::kMacAddress, macAddress.str());
+    status = BagSetNarrowString(bag, kest::tag::kMacAddress, macAddress.str());
 
     uint32_t primaryIndex = 0;
     ThrowIfLibraryCallFailed(network::GetPrimaryDeviceIndex(primaryIndex));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetPrimaryDeviceIndex",
                      primaryIndex);
-    status = BagSetBool(bag, NetworkTag::kPrimaryAdapter, deviceIndex_ == primaryIndex);
+    status = BagSetBool(bag, kest::tag::kPrimaryAdapter, deviceIndex_ == primaryIndex);
 
     uint32_t mode = 0;
     ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(deviceIndex_, mode));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetDeviceModeByIndex", mode);
 
     // Adapters outside the TCP/IP modes keep these empty.
-    for (uint32_t tag : {NetworkTag::kIPAddress, NetworkTag::kSubnetMask, NetworkTag::kGateway,
-                         NetworkTag::kDnsServer}) {
+    for (uint32_t tag : {kest::tag::kIPAddress, kest::tag::kSubnetMask, kest::tag::kGateway,
+                         kest::tag::kDnsServer}) {
         status = bag->SetString(tag, L"");
     }
 
-    if (AdapterMode::IsTcpIp(mode)) {
+    if (kest::adapter_mode::IsTcpIp(mode)) {
         PopulateTcpIpAddresses(mode, bag);
-    } else if (mode == AdapterMode::kEtherCAT) {
+    } else if (mode == kest::adapter_mode::kEtherCAT) {
         PopulateEtherCATSettings(macAddress.str(), bag);
         PopulateTcpRequestMode(deviceIndex_, bag);
     } else {
@@ -119,13 +119,13 @@ void NetworkItemHandler::PopulateTcpIpAddresses(uint32_t mode, IuxSysPropertyBag
     TraceLibraryCall(
         "NetworkItemHandler::PopulateProperties - GetDeviceSupportedTCPIPRequestModesByIndex",
         supportedRequestModes);
-    status = bag->SetULong(NetworkTag::kSupportedRequestModes, supportedRequestModes);
+    status = bag->SetULong(kest::tag::kSupportedRequestModes, supportedRequestModes);
 
-    uint32_t requestMode = RequestMode::kDefault;
+    uint32_t requestMode = kest::request_mode::kDynamic;
     ThrowIfLibraryCallFailed(network::GetDeviceTCPIPRequestModeByIndex(deviceIndex_, requestMode));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetDeviceTCPIPRequestModeByIndex",
                      requestMode);
-    status = bag->SetULong(NetworkTag::kRequestMode, requestMode);
+    status = bag->SetULong(kest::tag::kRequestMode, requestMode);
 
     IPAddress address = ZeroIPv4Address();
     IPAddress mask = ZeroIPv4Address();
@@ -136,23 +136,23 @@ void NetworkItemHandler::PopulateTcpIpAddresses(uint32_t mode, IuxSysPropertyBag
     }
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetIPAddressByIndex",
                      address.ToString());
-    status = SetAddressText(bag, NetworkTag::kIPAddress, address);
-    status = bag->SetULong(NetworkTag::kAddressCount, 1);
-    status = SetAddressText(bag, NetworkTag::kSubnetMask, mask);
+    status = SetAddressText(bag, kest::tag::kIPAddress, address);
+    status = bag->SetULong(kest::tag::kAddressFixedULong, 1);
+    status = SetAddressText(bag, kest::tag::kSubnetMask, mask);
 
     IPAddress gateway = ZeroIPv4Address();
     ThrowIfLibraryCallFailed(network::GetGatewayAddressByIndex(deviceIndex_, gateway));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetGatewayAddressByIndex",
                      gateway.ToString());
-    status = SetAddressText(bag, NetworkTag::kGateway, gateway);
+    status = SetAddressText(bag, kest::tag::kGateway, gateway);
 
     IPAddress dnsServer = ZeroIPv4Address();
     ThrowIfLibraryCallFailed(network::GetDNSServerAddressByIndex(deviceIndex_, dnsServer));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetDNSServerAddressByIndex",
                      dnsServer.ToString());
-    status = SetAddressText(bag, NetworkTag::kDnsServer, dnsServer);
+    status = SetAddressText(bag, kest::tag::kDnsServer, dnsServer);
 
-    if (mode != AdapterMode::kTcpIp ||
+    if (mode != kest::adapter_mode::kTcpIp ||
         deviceHandler_->GetDeviceType() != vq::targetcfg::kDeviceTypeEthernet) {
         return;
     }
@@ -162,7 +162,7 @@ void NetworkItemHandler::PopulateTcpIpAddresses(uint32_t mode, IuxSysPropertyBag
     }
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetSupportedDeviceSettings",
                      supportedMediaModes);
-    status = bag->SetULong(NetworkTag::kSupportedMediaModes, supportedMediaModes);
+    status = bag->SetULong(kest::tag::kSupportedMediaModes, supportedMediaModes);
 
     uint32_t currentMediaMode = 0;
     if (network::GetCurrentDeviceSettings(deviceIndex_, &currentMediaMode, nullptr, nullptr) != 0) {
@@ -170,13 +170,13 @@ void NetworkItemHandler::PopulateTcpIpAddresses(uint32_t mode, IuxSysPropertyBag
     }
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetCurrentDeviceSettings",
                      currentMediaMode);
-    status = bag->SetULong(NetworkTag::kCurrentMediaMode, currentMediaMode);
+    status = bag->SetULong(kest::tag::kCurrentMediaMode, currentMediaMode);
 
     uint32_t preferredMediaMode = 0;
     if (network::GetPreferredMediaMode(deviceIndex_, &preferredMediaMode) != 0) {
         preferredMediaMode = kUnknownMediaMode;
     }
-    status = bag->SetULong(NetworkTag::kPreferredMediaMode, preferredMediaMode);
+    status = bag->SetULong(kest::tag::kPreferredMediaMode, preferredMediaMode);
 }
 
 void NetworkItemHandler::PopulateEtherCATSettings(const std::string& macAddress,
@@ -189,10 +189,10 @@ void NetworkItemHandler::PopulateEtherCATSettings(const std::string& macAddress,
                                                           masterId, hasFlag, flag));
     TraceLibraryCall("NetworkItemHandler::PopulateProperties - GetEtherCATSettings", masterId);
     if (masterId != kNoMasterId) {
-        status = bag->SetULong(NetworkTag::kEtherCATMasterId, masterId);
+        status = bag->SetULong(kest::tag::kEtherCATMasterId, masterId);
     }
     if (hasFlag) {
-        status = BagSetBool(bag, NetworkTag::kEtherCATFlag, flag);
+        status = BagSetBool(bag, kest::tag::kEtherCATFlag, flag);
     }
 }
 
@@ -203,7 +203,7 @@ void NetworkItemHandler::PopulateTcpRequestMode(uint32_t deviceIndex, IuxSysProp
         network::GetDeviceSupportedTCPIPRequestModesByIndex(deviceIndex, supportedRequestModes));
     TraceLibraryCall("PopulateTcpRequestMode - GetDeviceSupportedTCPIPRequestModesByIndex",
                      supportedRequestModes);
-    status = bag->SetULong(NetworkTag::kSupportedRequestModes, supportedRequestModes);
+    status = bag->SetULong(kest::tag::kSupportedRequestModes, supportedRequestModes);
 
     uint32_t requestMode = 0;
     if ((supportedRequestModes & 0x2) != 0) {
@@ -211,13 +211,13 @@ void NetworkItemHandler::PopulateTcpRequestMode(uint32_t deviceIndex, IuxSysProp
     } else if ((supportedRequestModes & 0x1) != 0) {
         requestMode = 1;
     }
-    status = bag->SetULong(NetworkTag::kRequestMode, requestMode);
+    status = bag->SetULong(kest::tag::kRequestMode, requestMode);
 }
 
 bool NetworkItemHandler::IsMatchingItem(IuxSysPropertyBag* description, bool& exactMatch) {
     StatusHolder status;
     std::wstring name;
-    status = BagGetWideString(description, NetworkTag::kItemName, name);
+    status = BagGetWideString(description, kest::tag::kItemName, name);
     if (HasItemName(name)) {
         exactMatch = true;
         return true;

@@ -10,6 +10,9 @@
 #include "items/ItemHandler.h"
 #include "vq/targetcfg/DeviceHandler.h"
 
+// Thread safety: any thread may call at once; no lock, as every operation only calls the library
+// and writes bags (persists run under the expert lock). The class-wide refresh tags are filled in
+// the first construction, under the item lock, and only read afterwards.
 class NetworkItemHandler : public ItemHandler {
   public:
     // The base rows, then the network catalogue. Failures are thrown as a status (long).
@@ -34,8 +37,9 @@ class NetworkItemHandler : public ItemHandler {
     // (same first two characters). A failed read of the name is thrown.
     bool IsMatchingItem(IuxSysPropertyBag* description, bool& exactMatch) override;
 
-    // A persisted change of this item restarts the network interface; always true.
-    virtual bool NeedsInterfaceRestart();
+    // A persisted change of this item restarts the network interface on a deferred task;
+    // always true.
+    bool NeedsInterfaceRestart() override;
     // True only when the library reports the adapter up.
     virtual bool IsAdapterUp();
 

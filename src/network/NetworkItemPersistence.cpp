@@ -1,11 +1,10 @@
 // NetworkItemHandler::PersistPropertyChanges: writing the modified network settings at once and
 // handing the adapter back for its deferred interface restart.
 #include "com/CountedPtr.h"
-#include "network/BagReading.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "network/InterfaceSettings.h"
-#include "network/LibraryCall.h"
 #include "network/NetworkItemHandler.h"
-#include "network/NetworkTags.h"
 #include "property/BagAccess.h"
 #include "support/StatusHolder.h"
 #include "support/TraceGate.h"
@@ -43,11 +42,11 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
 
         // A false flag never takes the primary role away.
         bool primary = false;
-        BagGetBool(changes, NetworkTag::kPrimaryAdapter, primary);
+        BagGetBool(changes, kest::tag::kPrimaryAdapter, primary);
         bool written = false;
         if (primary && !wasPrimary) {
             ThrowIfLibraryCallFailed(network::SetPrimaryDeviceByIndex(DeviceIndex()));
-            status = changes->SetULong(NetworkTag::kAdapterMode, AdapterMode::kTcpIp);
+            status = changes->SetULong(kest::tag::kAdapterMode, kest::adapter_mode::kTcpIp);
             written = true;
         }
 
@@ -58,24 +57,24 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
         }
 
         // Read before the new mode is stored: entering or leaving EtherCAT needs a restart.
-        const uint32_t newMode = ReadULong(changes, NetworkTag::kAdapterMode);
+        const uint32_t newMode = ReadULong(changes, kest::tag::kAdapterMode);
         uint32_t currentMode = 0;
         ThrowIfLibraryCallFailed(network::GetDeviceModeByIndex(DeviceIndex(), currentMode));
         const bool switchesEtherCAT =
-            newMode != currentMode &&
-            (newMode == AdapterMode::kEtherCAT || currentMode == AdapterMode::kEtherCAT);
+            newMode != currentMode && (newMode == kest::adapter_mode::kEtherCAT ||
+                                       currentMode == kest::adapter_mode::kEtherCAT);
 
         if (changed) {
             bool settingsApplied = false;
             uint32_t tag = 0;
             while (modifiedTags->Next(1, &tag, nullptr) == S_OK) {
-                if (NetworkTag::IsInterfaceSettingTag(tag)) {
+                if (IsInterfaceSettingTag(tag)) {
                     if (!settingsApplied) {
                         settingsApplied = true;
                         status = ApplyInterfaceSettings(DeviceIndex(), changes, wasPrimary);
                         written = true;
                     }
-                } else if (tag == NetworkTag::kPreferredMediaMode) {
+                } else if (tag == kest::tag::kPreferredMediaMode) {
                     ThrowIfLibraryCallFailed(
                         network::SetDeviceSettings(DeviceIndex(), ReadULong(changes, tag), 0, 0));
                     written = true;
@@ -91,7 +90,7 @@ HRESULT NetworkItemHandler::PersistPropertyChanges(
             if (NeedsInterfaceRestart()) {
                 deviceHandler = CountedPtr<vq::targetcfg::IDeviceHandler>(Device());
                 adapterDisabled =
-                    ReadULong(changes, NetworkTag::kAdapterMode) == AdapterMode::kDisabled;
+                    ReadULong(changes, kest::tag::kAdapterMode) == kest::adapter_mode::kDisabled;
             }
         }
     } catch (long failure) {

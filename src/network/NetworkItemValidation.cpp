@@ -1,11 +1,11 @@
 // NetworkItemHandler::ValidatePropertyChanges: which tags of a changes bag the network side
 // accepts, and the checks they pass through.
 #include "com/CountedPtr.h"
-#include "network/BagReading.h"
-#include "network/LibraryCall.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
+#include "network/InterfaceSettings.h"
 #include "network/NetworkItemHandler.h"
 #include "network/NetworkSettingsValidation.h"
-#include "network/NetworkTags.h"
 #include "property/BagAccess.h"
 #include "support/StatusHolder.h"
 #include "support/TraceGate.h"
@@ -48,12 +48,12 @@ HRESULT NetworkItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* changes,
 
     try {
         // Making this adapter primary is a change of its own: nothing else is checked with it.
-        if (EnumeratorHasTag(tags.Get(), NetworkTag::kPrimaryAdapter)) {
+        if (EnumeratorHasTag(tags.Get(), kest::tag::kPrimaryAdapter)) {
             bool primary = false;
-            status = BagGetBool(changes, NetworkTag::kPrimaryAdapter, primary);
+            status = BagGetBool(changes, kest::tag::kPrimaryAdapter, primary);
             uint32_t primaryIndex = 0;
             ThrowIfLibraryCallFailed(vq::targetcfg::network::GetPrimaryDeviceIndex(primaryIndex));
-            validated.insert(NetworkTag::kPrimaryAdapter);
+            validated.insert(kest::tag::kPrimaryAdapter);
             if (primary && DeviceIndex() != primaryIndex) {
                 return S_OK;
             }
@@ -63,13 +63,13 @@ HRESULT NetworkItemHandler::ValidatePropertyChanges(IuxSysPropertyBag* changes,
         bool settingsChecked = false;
         uint32_t tag = 0;
         while (tags->Next(1, &tag, nullptr) == S_OK) {
-            if (NetworkTag::IsInterfaceSettingTag(tag)) {
+            if (IsInterfaceSettingTag(tag)) {
                 if (!settingsChecked) {
                     settingsChecked = true;
                     status = ValidateNetworkSettings(DeviceIndex(), changes, message);
                 }
                 validated.insert(tag);
-            } else if (tag == NetworkTag::kPreferredMediaMode) {
+            } else if (tag == kest::tag::kPreferredMediaMode) {
                 if (!IsAcceptedMediaMode(ReadULong(changes, tag))) {
                     status = UX_E_VALUE_INVALID;
                 }

@@ -2,13 +2,12 @@
 
 #include <string>
 
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "network/AddressRules.h"
-#include "network/BagReading.h"
 #include "network/IPv4Text.h"
-#include "network/LibraryCall.h"
-#include "network/NetworkTags.h"
-#include "network/ValidationMessage.h"
 #include "property/BagAccess.h"
+#include "property/HostStringResult.h"
 #include "support/StatusHolder.h"
 #include "support/TraceGate.h"
 #include "uxsys/StatusCodes.h"
@@ -67,17 +66,17 @@ void ValidateGatewayDNSHelper(IuxSysPropertyBag* bag, const std::wstring& addres
     try {
         StatusHolder status;
         bool primary = false;
-        BagGetBool(bag, NetworkTag::kPrimaryAdapter, primary);
-        if (primary || BagHasTag(bag, NetworkTag::kGateway)) {
+        BagGetBool(bag, kest::tag::kPrimaryAdapter, primary);
+        if (primary || BagHasTag(bag, kest::tag::kGateway)) {
             std::wstring gateway;
-            status = BagGetWideString(bag, NetworkTag::kGateway, gateway);
+            status = BagGetWideString(bag, kest::tag::kGateway, gateway);
             if (primary || !gateway.empty()) {
                 ValidateGateway(address, mask, gateway, message);
             }
         }
-        if (primary || BagHasTag(bag, NetworkTag::kDnsServer)) {
+        if (primary || BagHasTag(bag, kest::tag::kDnsServer)) {
             std::wstring dnsServer;
-            status = BagGetWideString(bag, NetworkTag::kDnsServer, dnsServer);
+            status = BagGetWideString(bag, kest::tag::kDnsServer, dnsServer);
             if ((primary || !dnsServer.empty()) && !IsValidIPv4Text(dnsServer, true, true, false)) {
                 ThrowStatus(UX_E_DNS_ADDRESS_INVALID);
             }
@@ -94,18 +93,19 @@ HRESULT ValidateNetworkSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, Cv
     if (bag == nullptr) {
         return E_POINTER;
     }
-    const uint32_t adapterMode = ReadULong(bag, NetworkTag::kAdapterMode);
-    if (adapterMode == AdapterMode::kEtherCAT) {
-        if (ReadULong(bag, NetworkTag::kEtherCATMasterId) > kHighestMasterId) {
+    const uint32_t adapterMode = ReadULong(bag, kest::tag::kAdapterMode);
+    if (adapterMode == kest::adapter_mode::kEtherCAT) {
+        if (ReadULong(bag, kest::tag::kEtherCATMasterId) > kHighestMasterId) {
             Reject(message, kMasterIdOutOfRange, UX_E_VALUE_INVALID);
         }
         return S_OK;
     }
-    if (adapterMode != AdapterMode::kTcpIp && adapterMode != AdapterMode::kTcpIp20) {
+    if (adapterMode != kest::adapter_mode::kTcpIp &&
+        adapterMode != kest::adapter_mode::kTcpIpVariant1) {
         return S_OK;
     }
 
-    const uint32_t requestMode = ReadULong(bag, NetworkTag::kRequestMode);
+    const uint32_t requestMode = ReadULong(bag, kest::tag::kRequestMode);
     if (!IsAcceptedRequestMode(requestMode)) {
         ThrowStatus(UX_E_VALUE_INVALID);
     }
@@ -117,17 +117,17 @@ HRESULT ValidateNetworkSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, Cv
         TraceLineIfEnabled("NetworkItemHandler::ValidateNetworkSettings() failed", kTraceErrors);
         return UX_E_VALUE_INVALID;
     }
-    if (requestMode != RequestMode::kStatic) {
+    if (requestMode != kest::request_mode::kStatic) {
         return S_OK;
     }
 
     std::wstring address;
-    BagGetWideString(bag, NetworkTag::kIPAddress, address);
+    BagGetWideString(bag, kest::tag::kIPAddress, address);
     if (!IsValidIPv4Text(address, false, false, true)) {
         ThrowStatus(UX_E_IP_ADDRESS_INVALID);
     }
     std::wstring mask;
-    BagGetWideString(bag, NetworkTag::kSubnetMask, mask);
+    BagGetWideString(bag, kest::tag::kSubnetMask, mask);
     if (!IsValidIPv4Text(mask, false, false, true) || !IsContiguousSubnetMask(ParseIPv4(mask))) {
         ThrowStatus(UX_E_SUBNET_MASK_INVALID);
     }

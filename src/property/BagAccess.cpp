@@ -1,5 +1,6 @@
 #include "property/BagAccess.h"
 
+#include "support/StatusHolder.h"
 #include "support/TextConversion.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
@@ -39,6 +40,29 @@ HRESULT BagSetWideString(IuxSysPropertyBag* bag, uint32_t tag, const std::wstrin
 
 HRESULT BagSetNarrowString(IuxSysPropertyBag* bag, uint32_t tag, const std::string& value) {
     return BagSetWideString(bag, tag, vq::dsc::WideFromNarrow(value));
+}
+
+CountedPtr<IuxSysPropertyBag2> QueryPropertyBag2(IuxSysPropertyBag* bag) {
+    CountedPtr<IuxSysPropertyBag2> bag2;
+    if (bag == nullptr || bag->QueryInterface(IID_IuxSysPropertyBag2, bag2.ReceiveVoid()) < 0 ||
+        !bag2) {
+        throw static_cast<long>(E_NOINTERFACE);
+    }
+    return bag2;
+}
+
+uint32_t ReadULong(IuxSysPropertyBag* bag, uint32_t tag, uint32_t preset) {
+    StatusHolder status;
+    uint32_t value = preset;
+    status = bag->GetULong(tag, &value);
+    return value;
+}
+
+CountedPtr<IuxSysEnumPropertyTag> ModifiedTags(IuxSysPropertyBag* bag) {
+    StatusHolder status;
+    CountedPtr<IuxSysEnumPropertyTag> tags;
+    status = QueryPropertyBag2(bag)->GetModifiedTagEnumerator(tags.Receive());
+    return tags;
 }
 
 bool EnumeratorHasTag(IuxSysEnumPropertyTag* tags, uint32_t tag) {

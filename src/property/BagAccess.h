@@ -1,13 +1,23 @@
 // Convenience access to any property bag for the item handlers: booleans as bool, strings as
-// std::wstring or locale-encoded std::string, and tag lookup in a tag enumerator.
+// std::wstring or locale-encoded std::string, tag lookup in a tag enumerator, and the bag's
+// second interface (timestamps and the modified set).
 #pragma once
 
 #include <cstdint>
 #include <string>
 
+#include "com/CountedPtr.h"
 #include "uxsys/Enumerators.h"
 #include "uxsys/PropertyBag.h"
 
+// The unsigned value of `tag`, preset to `preset`; a failed read is thrown as a status (long).
+uint32_t ReadULong(IuxSysPropertyBag* bag, uint32_t tag, uint32_t preset = 0);
+// An enumerator over the modified tags of `bag` in ascending order, or null when none is
+// modified. A bag without the modified-set interface gives E_NOINTERFACE; failures are thrown.
+CountedPtr<IuxSysEnumPropertyTag> ModifiedTags(IuxSysPropertyBag* bag);
+// The bag's IuxSysPropertyBag2 interface; a null bag or one that does not offer it throws
+// E_NOINTERFACE as a status (long).
+CountedPtr<IuxSysPropertyBag2> QueryPropertyBag2(IuxSysPropertyBag* bag);
 // Reads a boolean; `value` is false unless the bag holds a true value. Returns GetBool's status.
 HRESULT BagGetBool(IuxSysPropertyBag* bag, uint32_t tag, bool& value);
 // Stores a boolean; returns SetBool's status.

@@ -1,6 +1,7 @@
 // The plug-in's property bag: typed values keyed by property tag, the set of modified tags, a lock
-// that a caller may hold across several calls, and copying. Every operation runs under the bag's
-// recursive lock, so each is atomic with respect to the others on the same bag.
+// that a caller may hold across several calls, and copying.
+// Thread safety: any thread may call any operation at once; each runs under the bag's recursive
+// lock, so it is atomic with respect to the others on the same bag.
 #pragma once
 
 #include <cstdint>

@@ -1,6 +1,8 @@
 // The enumerator components handed to the host: Next, Skip, Reset and Clone over a container that
 // is filled before the first enumerator sees it and never changes afterwards. Clones share the
 // container and keep it alive through a counted reference to whoever owns it.
+// Thread safety: an enumerator's position is not locked, so one enumerator serves one thread at a
+// time; its clones have positions of their own and may be used in other threads at once.
 #pragma once
 
 #include <cstdint>

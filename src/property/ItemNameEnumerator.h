@@ -1,5 +1,6 @@
 // The enumerator over item names that the expert hands to the host: it owns the names in the
 // order they were appended, and its clones share them.
+// Thread safety: as every enumerator, one thread at a time; its clones may serve other threads.
 #pragma once
 
 #include <string>

@@ -1,5 +1,6 @@
 // The enumerator over property tags that the bag and the expert hand to the host: it owns an
 // ascending list of tags, and its clones share that list.
+// Thread safety: as every enumerator, one thread at a time; its clones may serve other threads.
 #pragma once
 
 #include <cstdint>

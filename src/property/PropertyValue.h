@@ -1,5 +1,6 @@
 // Typed property values: one value class per property type code. A bag owns the values it holds;
 // the type code fixed at construction decides which typed access applies to a value.
+// Thread safety: none of their own; a bag touches its values only under its lock.
 #pragma once
 
 #include <cstdint>

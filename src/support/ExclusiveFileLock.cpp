@@ -12,12 +12,18 @@
 namespace vq {
 namespace dsc {
 namespace osdep {
+namespace {
+
+constexpr mode_t kLockFileMode = S_IRUSR | S_IWUSR;
+
+}  // namespace
 
 ExclusiveFileLock::ExclusiveFileLock(const std::string& path) {
     int descriptor;
     do {
-        descriptor = open(path.c_str(),
-                          O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0600);
+        descriptor =
+            open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC,
+                 kLockFileMode);
     } while (descriptor < 0 && errno == EINTR);
     if (descriptor < 0) {
         throw PosixError();

@@ -1,6 +1,8 @@
 // An exclusive advisory lock (flock) on a lock file, held for the object's lifetime: it orders a
 // read-modify-write of a file across processes. The lock goes with the process, so a killed
 // holder never blocks the next one.
+// Thread safety: each lock opens its own file description, so it also orders threads of one
+// process that each hold their own ExclusiveFileLock; one object belongs to one thread.
 #pragma once
 
 #include <string>

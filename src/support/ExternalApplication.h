@@ -5,6 +5,9 @@
 // fixed environment. A small intermediate process (in a session of its own as well) starts the
 // program, waits for it and reports its pid and exit status over a pipe, so the status arrives
 // even when the host ignores SIGCHLD and lets the system reap its children.
+//
+// Thread safety: the setters, Start and Wait may be called from any thread and run one at a time
+// under the object's mutex; ExitResult, GetState and ProcessId may be read at any moment.
 #pragma once
 
 #include <sys/types.h>

@@ -22,6 +22,14 @@ constexpr uint64_t kIntervalsPerSecond = 10000000;  // 100-ns intervals
 // Seconds from 1582-10-15 00:00:00 UTC (the start of version 1 timestamps) to 1904-01-01.
 constexpr uint64_t kGregorianToAbsTimeSeconds = 10136448000u;
 constexpr uint16_t kClockSequenceMask = 0x3FFF;
+// The version field of a time-based identifier, above the timestamp's top twelve bits.
+constexpr uint16_t kTimestampHighMask = 0x0FFF;
+constexpr uint16_t kVersionTimeBased = 0x1000;
+// The variant of the layout, above the clock sequence's top six bits.
+constexpr uint8_t kClockSequenceHighMask = 0x3F;
+constexpr uint8_t kVariantStandard = 0x80;
+// Set in the first byte of a node made of random bytes.
+constexpr uint8_t kRandomNodeBit = 0x80;
 constexpr size_t kNodeBytes = 6;
 
 uint64_t MonotonicIntervals() {
@@ -91,7 +99,7 @@ class TimeBasedGenerator {
             for (uint8_t& byte : node_) {
                 byte = static_cast<uint8_t>(RandomBits());
             }
-            node_[0] |= 0x80;
+            node_[0] |= kRandomNodeBit;
         }
     }
 
@@ -115,8 +123,10 @@ class TimeBasedGenerator {
         Guid guid;
         guid.Data1 = static_cast<uint32_t>(timestamp);
         guid.Data2 = static_cast<uint16_t>(timestamp >> 32);
-        guid.Data3 = static_cast<uint16_t>(((timestamp >> 48) & 0x0FFF) | 0x1000);
-        guid.Data4[0] = static_cast<uint8_t>(((clockSequence_ >> 8) & 0x3F) | 0x80);
+        guid.Data3 =
+            static_cast<uint16_t>(((timestamp >> 48) & kTimestampHighMask) | kVersionTimeBased);
+        guid.Data4[0] = static_cast<uint8_t>(((clockSequence_ >> 8) & kClockSequenceHighMask) |
+                                             kVariantStandard);
         guid.Data4[1] = static_cast<uint8_t>(clockSequence_);
         std::memcpy(&guid.Data4[2], node_, kNodeBytes);
         return guid;

@@ -22,7 +22,7 @@ struct Guid {
 
     // A new time-based (version 1) identifier: a timestamp that follows the monotonic clock, a
     // per-process clock sequence and the first network adapter's hardware address (random bytes
-    // when there is none). Identifiers never repeat within the process.
+    // when there is none). Identifiers never repeat within the process, whichever threads ask.
     static Guid CreateTimeBased();
 };
 

@@ -1,5 +1,7 @@
 // The runtime library's recursive mutex, with priority inheritance where the platform offers it,
 // and the scoped guard that holds it for a block.
+// Thread safety: a Mutex is made to be shared by threads; a ScopedLock belongs to the thread that
+// made it.
 #pragma once
 
 #include <pthread.h>

@@ -34,6 +34,10 @@ int StatRetryingInterrupts(const std::string& path, struct stat& status) {
 }
 
 constexpr int kDirectoryOpenFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
+// The read, write and search bits of owner, group and others.
+constexpr mode_t kPermissionBits = S_IRWXU | S_IRWXG | S_IRWXO;
+// The permission bits with set-user-id, set-group-id and sticky.
+constexpr mode_t kModeBits = kPermissionBits | S_ISUID | S_ISGID | S_ISVTX;
 constexpr int kCreateAttempts = 8;
 
 int OpenAtRetryingInterrupts(int parent, const std::string& name, int flags) {
@@ -85,7 +89,7 @@ int OpenOrCreateLevel(int parent, const std::string& name, mode_t mode,
         if (descriptor >= 0 || errno != ENOENT) {
             break;
         }
-        if (mkdirat(parent, name.c_str(), mode & 0777) == 0) {
+        if (mkdirat(parent, name.c_str(), mode & kPermissionBits) == 0) {
             created = true;
         } else if (errno != EEXIST && errno != EINTR) {
             ThrowPathFailure(errno, requestedPath);
@@ -177,7 +181,7 @@ void CreateDirectories(const std::string& path, mode_t mode) {
     if (lastStart != std::string::npos && (mode & S_ISVTX) != 0 &&
         fstat(current.Get(), &status) == 0 && status.st_uid == geteuid() &&
         (status.st_mode & S_IWOTH) != 0 && (status.st_mode & S_ISVTX) == 0 &&
-        fchmod(current.Get(), (status.st_mode & 07777) | S_ISVTX) != 0) {
+        fchmod(current.Get(), (status.st_mode & kModeBits) | S_ISVTX) != 0) {
         ThrowPathFailure(errno, path);
     }
 }

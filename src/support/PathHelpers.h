@@ -2,6 +2,7 @@
 // text in the locale's character set first.
 #pragma once
 
+#include <sys/stat.h>
 #include <sys/types.h>
 
 #include <string>
@@ -31,8 +32,8 @@ bool IsRegularFile(const std::wstring& path);
 // for it. A relative path raises vq::dsc::exception::InvalidArgument, a refused permission
 // vq::dsc::exception::AccessDenied, other failures vq::dsc::osdep::PosixError (ENOTDIR for a
 // file in the way, ELOOP for an untrusted link, EPERM for a directory of another user).
-void CreateDirectories(const std::string& path, mode_t mode = 0700);
-void CreateDirectories(const std::wstring& path, mode_t mode = 0700);
+void CreateDirectories(const std::string& path, mode_t mode = S_IRWXU);
+void CreateDirectories(const std::wstring& path, mode_t mode = S_IRWXU);
 
 }  // namespace osdep
 }  // namespace dsc

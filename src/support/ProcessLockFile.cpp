@@ -16,8 +16,8 @@ namespace dsc {
 namespace osdep {
 namespace {
 
-constexpr mode_t kLockFileMode = 0600;
-constexpr mode_t kLockDirectoryMode = 0755;
+constexpr mode_t kLockFileMode = S_IRUSR | S_IWUSR;
+constexpr mode_t kLockDirectoryMode = S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH;
 
 bool OwnedByUs(const struct stat& status) {
     return status.st_uid == 0 || status.st_uid == geteuid();

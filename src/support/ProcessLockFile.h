@@ -2,6 +2,7 @@
 // directory that only root or the effective user can write; the file holds the holder's process
 // id. The lock belongs to the open file description, so two openings in one process exclude each
 // other too, and a program started with the descriptor keeps the lock until it ends.
+// Thread safety: none of its own; threads that share one object serialise their calls.
 #pragma once
 
 #include <sys/types.h>

@@ -17,6 +17,10 @@
 namespace kest {
 namespace {
 
+// The redirected clock file is readable by everyone; its directory is searchable by everyone.
+constexpr mode_t kClockFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH;
+constexpr mode_t kClockDirectoryMode = S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH;
+
 // A new temporary file, removed again unless it was renamed into place.
 class TemporaryFile {
   public:
@@ -43,7 +47,7 @@ class TemporaryFile {
 
     // Makes the file readable by everyone, flushes it and moves it to `target` atomically.
     void ReplaceFile(const std::string& target) {
-        if (fchmod(descriptor_.Get(), 0644) != 0 || fsync(descriptor_.Get()) != 0 ||
+        if (fchmod(descriptor_.Get(), kClockFileMode) != 0 || fsync(descriptor_.Get()) != 0 ||
             descriptor_.Close() != 0) {
             throw vq::dsc::osdep::PosixError();
         }
@@ -62,7 +66,7 @@ class TemporaryFile {
 void WriteRedirectedClock(int64_t seconds, int64_t microseconds) {
     const std::string target = paths::RedirectedSystemClockFile();
     const std::string directory = target.substr(0, target.rfind('/'));
-    vq::dsc::osdep::CreateDirectories(directory, 0755);
+    vq::dsc::osdep::CreateDirectories(directory, kClockDirectoryMode);
     TemporaryFile file(target + ".XXXXXX");
     file.Write(std::to_string(seconds) + " " + std::to_string(microseconds) + "\n");
     file.ReplaceFile(target);

@@ -1,4 +1,6 @@
 // A POSIX thread that runs either a start function with its argument or a subclass's Run body.
+// Thread safety: none of its own; Start, Join and IsJoinable are called by the thread that owns
+// the object.
 #pragma once
 
 #include <pthread.h>
@@ -33,8 +35,6 @@ class Thread {
     void Join();
     // True between a successful start and Join.
     bool IsJoinable() const { return joinable_; }
-    // The thread's identifier; meaningful while IsJoinable.
-    pthread_t Id() const { return id_; }
 
   protected:
     // The thread body; the base runs the start function given to Start. A subclass that

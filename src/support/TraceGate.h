@@ -1,5 +1,7 @@
 // The gate between trace callers and the tracer: the process-wide trace mask and the line writer
 // the tracer installs. Until a tracer installs itself the mask is 0 and nothing is written.
+// Thread safety: every function may be called from any thread at once (the mask and the writer
+// are atomic).
 #pragma once
 
 #include <atomic>

@@ -7,6 +7,8 @@
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
+// Thread safety: not for concurrent calls; its owner calls it under its mutex. Saves of all
+// processes take turns on the lock file beside the settings file.
 class KestConfigIni {
   public:
     // Loads the settings file; a missing or unreadable file leaves the settings empty. Throws

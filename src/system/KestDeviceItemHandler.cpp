@@ -3,15 +3,14 @@
 #include <cstdio>
 #include <memory>
 
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "property/BagAccess.h"
-#include "support/ConvertStatusCode.h"
 #include "support/CurrentExceptionToStatus.h"
 #include "support/StatusHolder.h"
 #include "support/Sysroot.h"
 #include "support/TextConversion.h"
 #include "support/TraceGate.h"
-#include "system/PropertyBag2.h"
-#include "system/SystemItemTags.h"
 #include "vq/targetcfg/Network.h"
 #include "vq/targetcfg/System.h"
 
@@ -131,52 +130,52 @@ HRESULT KestDeviceItemHandler::GetItemProperties(IuxSysPropertyBag* bag) {
 
 void KestDeviceItemHandler::WriteCatalogue(IuxSysPropertyBag* bag) {
     StatusHolder status;
-    status = bag->SetBool(0x01001000, 1);
-    status = bag->SetBool(0x01038000, 1);
-    status = bag->SetLong(0x01039000, 1);
-    status = bag->SetULong(0x0103A000, 4);
-    status = bag->SetLong(0x01024000, 1);
-    status = bag->SetULong(0x01002000, 0);
+    status = bag->SetBool(kest::tag::kChassisFixedBool1, 1);
+    status = bag->SetBool(kest::tag::kItemFixedBool, 1);
+    status = bag->SetLong(kest::tag::kItemFixedLong2, 1);
+    status = bag->SetULong(kest::tag::kItemFixedULong2, 4);
+    status = bag->SetLong(kest::tag::kChassisFixedLong1, 1);
+    status = bag->SetULong(kest::tag::kChassisFixedULong1, 0);
 
     // One narrow string carries the description, then the target class, then the host name.
     NarrowString text;
-    status = ConvertStatusCode(targetsystem::GetDeviceDescription(text));
-    SetString(status, bag, SystemTag::kDeviceDescription, ReportedDescription(text.str()));
+    ThrowIfLibraryCallFailed(targetsystem::GetDeviceDescription(text));
+    SetString(status, bag, kest::tag::kDeviceDescription, ReportedDescription(text.str()));
     uint32_t targetId = 0;
     targetsystem::GetTargetID(targetId);
-    status = bag->SetULong(SystemTag::kTargetId, targetId);
-    status = ConvertStatusCode(targetsystem::GetTargetClass(text));
-    SetString(status, bag, SystemTag::kTargetClass, WideFromNarrow(text.str()));
-    status = bag->SetBool(0x01008000, 1);
-    SetString(status, bag, SystemTag::kVendorName, kVendorName);
-    status = bag->SetULong(0x01003000, kProductCode);
+    status = bag->SetULong(kest::tag::kTargetId, targetId);
+    ThrowIfLibraryCallFailed(targetsystem::GetTargetClass(text));
+    SetString(status, bag, kest::tag::kTargetClass, WideFromNarrow(text.str()));
+    status = bag->SetBool(kest::tag::kChassisFixedBool2, 1);
+    SetString(status, bag, kest::tag::kVendorName, kVendorName);
+    status = bag->SetULong(kest::tag::kChassisFixedULong2, kProductCode);
     uint32_t serialNumber = 0;
     targetsystem::GetSerialNumber(serialNumber);
-    SetString(status, bag, SystemTag::kSerialNumber, ReportedSerialNumber(serialNumber));
-    status = ConvertStatusCode(targetsystem::GetHostName(text));
-    SetString(status, bag, SystemTag::kHostName, WideFromNarrow(text.str()));
+    SetString(status, bag, kest::tag::kSerialNumber, ReportedSerialNumber(serialNumber));
+    ThrowIfLibraryCallFailed(targetsystem::GetHostName(text));
+    SetString(status, bag, kest::tag::kHostName, WideFromNarrow(text.str()));
     vq::targetcfg::WideString comment;
     targetsystem::GetUserComment(comment);
-    status = bag->SetString(SystemTag::kComment, comment.c_str());
+    status = bag->SetString(kest::tag::kComment, comment.c_str());
 
     // A current language outside the table raises std::out_of_range (E_FAIL at the boundary).
     NarrowString languageName;
     targetsystem::GetLanguageName(languageName);
-    SetString(status, bag, SystemTag::kLocaleCode, languageTable_.at(languageName.str()));
-    SetString(status, bag, SystemTag::kSupportedLocaleCodes, localeCodes_);
-    status = bag->SetLong(SystemTag::kTimeZoneOffset, targetsystem::GetTimezoneOffset());
-    SetString(status, bag, SystemTag::kLegacyTimeZone,
+    SetString(status, bag, kest::tag::kLocaleCode, languageTable_.at(languageName.str()));
+    SetString(status, bag, kest::tag::kSupportedLocaleCodes, localeCodes_);
+    status = bag->SetLong(kest::tag::kTimeZoneOffset, targetsystem::GetTimezoneOffset());
+    SetString(status, bag, kest::tag::kLegacyTimeZone,
               WideFromNarrow(timeAssistant_.GetLegacyTimeZone()));
-    SetString(status, bag, SystemTag::kOlsonTimeZone,
+    SetString(status, bag, kest::tag::kOlsonTimeZone,
               WideFromNarrow(timeAssistant_.GetOlsonTimeZone()));
-    status = bag->SetBool(0x0D129000, 1);
-    SetString(status, bag, SystemTag::kFirmwareVersion, firmwareVersion_);
-    status = bag->SetLong(0x0104C000, 0);
-    status = bag->SetBool(0x0104A000, 1);
-    SetString(status, bag, 0x0104B000, kConfigurationFilePattern);
-    status = bag->SetBool(0x01056000, 0);
-    status = bag->SetBool(0x01055000, 0);
-    status = bag->SetBool(SystemTag::kWebServiceEnabled,
+    status = bag->SetBool(kest::tag::kChassisFixedBool3, 1);
+    SetString(status, bag, kest::tag::kFirmwareVersion, firmwareVersion_);
+    status = bag->SetLong(kest::tag::kChassisFixedLong2, 0);
+    status = bag->SetBool(kest::tag::kChassisFixedBool4, 1);
+    SetString(status, bag, kest::tag::kConfigurationFilePattern, kConfigurationFilePattern);
+    status = bag->SetBool(kest::tag::kChassisFixedBool5, 0);
+    status = bag->SetBool(kest::tag::kChassisFixedBool6, 0);
+    status = bag->SetBool(kest::tag::kWebServiceEnabled,
                           webServiceSettings_.IsWebServiceEnabled() ? 1 : 0);
 }
 
@@ -191,12 +190,11 @@ HRESULT KestDeviceItemHandler::RefreshProperties(uint32_t count, const uint32_t*
         bool timeRequested = false;
         NarrowString dnsName;
         for (uint32_t i = 0; i < count; ++i) {
-            const uint32_t requested = tags[i] & SystemTag::kRefreshTagMask;
-            if (requested == SystemTag::kDnsName) {
-                status =
-                    ConvertStatusCode(vq::targetcfg::network::GetFullyQualifiedDNSName(dnsName));
-                SetString(status, bag, SystemTag::kDnsName, WideFromNarrow(dnsName.str()));
-            } else if (requested == SystemTag::kCurrentTime) {
+            const uint32_t requested = tags[i] & kest::tag::kRefreshMask;
+            if (requested == kest::tag::kDnsName) {
+                ThrowIfLibraryCallFailed(vq::targetcfg::network::GetFullyQualifiedDNSName(dnsName));
+                SetString(status, bag, kest::tag::kDnsName, WideFromNarrow(dnsName.str()));
+            } else if (requested == kest::tag::kCurrentTime) {
                 timeRequested = true;
             }
         }
@@ -204,7 +202,7 @@ HRESULT KestDeviceItemHandler::RefreshProperties(uint32_t count, const uint32_t*
         if (timeRequested) {
             const bool valid = now.seconds != vq::dsc::AbsTime::Invalid().seconds;
             status = QueryPropertyBag2(bag)->SetTimestamp(
-                SystemTag::kCurrentTime, valid ? now.ToTimestamp() : uxSysAttrTimestampUTC{0, 0});
+                kest::tag::kCurrentTime, valid ? now.ToTimestamp() : uxSysAttrTimestampUTC{0, 0});
         }
     } catch (...) {
         return CurrentExceptionToStatus();

@@ -15,6 +15,9 @@
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
+// Thread safety: any thread may call at once; GetItemProperties, ValidatePropertyChanges and
+// PersistPropertyChanges hold mutex_ throughout, RefreshProperties takes it through
+// GetItemProperties, and the owned time assistant and web-service settings are used only under it.
 class KestDeviceItemHandler : public ItemHandler {
   public:
     // The item name and the second name of the system item.

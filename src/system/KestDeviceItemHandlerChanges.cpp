@@ -1,13 +1,13 @@
 // Validation and persistence of changes to the system item.
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "property/BagAccess.h"
-#include "support/ConvertStatusCode.h"
+#include "property/HostStringResult.h"
 #include "support/CurrentExceptionToStatus.h"
 #include "support/StatusHolder.h"
 #include "support/TextConversion.h"
 #include "support/TraceGate.h"
 #include "system/KestDeviceItemHandler.h"
-#include "system/PropertyBag2.h"
-#include "system/SystemItemTags.h"
 #include "system/SystemItemValidation.h"
 #include "vq/targetcfg/System.h"
 
@@ -70,27 +70,27 @@ HRESULT KestDeviceItemHandler::ValidateChange(uint32_t tag, IuxSysPropertyBag* b
                                               CvqBStr* message) {
     StatusHolder status;
     switch (tag) {
-        case SystemTag::kHostName:
+        case kest::tag::kHostName:
             return Report(CheckHostName(ReadNarrowString(bag, tag)), message);
-        case SystemTag::kComment:
+        case kest::tag::kComment:
             return Report(CheckComment(ReadNarrowString(bag, tag)), message);
-        case SystemTag::kLocaleCode: {
+        case kest::tag::kLocaleCode: {
             std::wstring localeCode;
             status = BagGetWideString(bag, tag, localeCode);
             return Report(CheckLocaleCode(localeCode, localeCodes_), message);
         }
-        case SystemTag::kCurrentTime: {
+        case kest::tag::kCurrentTime: {
             uxSysAttrTimestampUTC time{};
             status = QueryPropertyBag2(bag)->GetTimestamp(tag, &time);
             return Report(CheckCurrentTime(time), message);
         }
-        case SystemTag::kOlsonTimeZone:
+        case kest::tag::kOlsonTimeZone:
             return timeAssistant_.ValidateOlsonOrLegacyTimeZone(ReadNarrowString(bag, tag), true,
                                                                 message);
-        case SystemTag::kLegacyTimeZone:
+        case kest::tag::kLegacyTimeZone:
             return timeAssistant_.ValidateOlsonOrLegacyTimeZone(ReadNarrowString(bag, tag), false,
                                                                 message);
-        case SystemTag::kWebServiceEnabled: {
+        case kest::tag::kWebServiceEnabled: {
             bool enabled = false;
             status = BagGetBool(bag, tag, enabled);
             return S_OK;
@@ -124,11 +124,11 @@ HRESULT KestDeviceItemHandler::PersistPropertyChanges(
 
         // The clock correction uses the time zone in force before any change is applied.
         int32_t clockCorrection = 0;
-        if (EnumeratorHasTag(tags.Get(), SystemTag::kLegacyTimeZone)) {
+        if (EnumeratorHasTag(tags.Get(), kest::tag::kLegacyTimeZone)) {
             std::wstring newLegacyText;
-            BagGetWideString(changes, SystemTag::kLegacyTimeZone, newLegacyText);
+            BagGetWideString(changes, kest::tag::kLegacyTimeZone, newLegacyText);
             vq::targetcfg::NarrowString currentTimeZone;
-            status = ConvertStatusCode(targetsystem::GetTimeZone(currentTimeZone));
+            ThrowIfLibraryCallFailed(targetsystem::GetTimeZone(currentTimeZone));
             clockCorrection =
                 timeAssistant_.GetLegacyOffsetDifference(currentTimeZone.str(), newLegacyText);
         }
@@ -137,7 +137,7 @@ HRESULT KestDeviceItemHandler::PersistPropertyChanges(
         bool clockRequested = false;
         uint32_t tag = 0;
         while (tags->Next(1, &tag, nullptr) == S_OK) {
-            if (tag == SystemTag::kCurrentTime) {
+            if (tag == kest::tag::kCurrentTime) {
                 clockRequested = true;
             } else {
                 PersistChange(tag, changes, persistFlag);
@@ -156,22 +156,22 @@ void KestDeviceItemHandler::PersistChange(uint32_t tag, IuxSysPropertyBag* bag,
                                           int32_t& persistFlag) {
     StatusHolder status;
     switch (tag) {
-        case SystemTag::kHostName:
-            status = ConvertStatusCode(targetsystem::SetHostName(ReadNarrowString(bag, tag)));
+        case kest::tag::kHostName:
+            ThrowIfLibraryCallFailed(targetsystem::SetHostName(ReadNarrowString(bag, tag)));
             persistFlag = 1;
             break;
-        case SystemTag::kComment:
-            status = ConvertStatusCode(targetsystem::SetUserComment(ReadNarrowString(bag, tag)));
+        case kest::tag::kComment:
+            ThrowIfLibraryCallFailed(targetsystem::SetUserComment(ReadNarrowString(bag, tag)));
             break;
-        case SystemTag::kLocaleCode:
-            status = ConvertStatusCode(targetsystem::SetLanguageName(ReadNarrowString(bag, tag)));
+        case kest::tag::kLocaleCode:
+            ThrowIfLibraryCallFailed(targetsystem::SetLanguageName(ReadNarrowString(bag, tag)));
             persistFlag = 1;
             break;
-        case SystemTag::kLegacyTimeZone:
-        case SystemTag::kOlsonTimeZone:
+        case kest::tag::kLegacyTimeZone:
+        case kest::tag::kOlsonTimeZone:
             status = timeAssistant_.PersistSystemPropertyTimezone(tag, bag, persistFlag);
             break;
-        case SystemTag::kWebServiceEnabled: {
+        case kest::tag::kWebServiceEnabled: {
             bool enabled = false;
             status = BagGetBool(bag, tag, enabled);
             webServiceSettings_.SetWebServiceEnabled(enabled);

@@ -3,7 +3,6 @@
 #include <cctype>
 
 #include "support/AbsTime.h"
-#include "uxsys/HostString.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
@@ -147,14 +146,6 @@ ValidationVerdict CheckCurrentTime(const uxSysAttrTimestampUTC& time) {
         }
     }
     return Reject(UX_E_VALUE_INVALID, kTimestampMessage);
-}
-
-void StoreValidationMessage(CvqBStr* slot, const wchar_t* text) {
-    if (slot == nullptr) {
-        return;
-    }
-    CvqBStrFree(*slot);
-    *slot = CvqBStrAlloc(text);
 }
 
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100

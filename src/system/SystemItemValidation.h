@@ -35,8 +35,4 @@ ValidationVerdict CheckLocaleCode(const std::wstring& localeCode, const std::wst
 // 1970-01-01 00:00:00 UTC.
 ValidationVerdict CheckCurrentTime(const uxSysAttrTimestampUTC& time);
 
-// Stores a new host string holding `text` in *slot (freeing what it held) when the slot is
-// given; a string that cannot be allocated leaves null.
-void StoreValidationMessage(CvqBStr* slot, const wchar_t* text);
-
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100

@@ -8,8 +8,10 @@
 #include <cstdint>
 
 #include "config/IniNames.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
 #include "property/BagAccess.h"
-#include "support/ConvertStatusCode.h"
+#include "property/HostStringResult.h"
 #include "support/Exceptions.h"
 #include "support/ExternalApplication.h"
 #include "support/StatusHolder.h"
@@ -18,8 +20,6 @@
 #include "support/TextConversion.h"
 #include "support/TraceGate.h"
 #include "support/TrustedTool.h"
-#include "system/PropertyBag2.h"
-#include "system/SystemItemTags.h"
 #include "system/SystemItemValidation.h"
 #include "vq/targetcfg/System.h"
 
@@ -104,8 +104,7 @@ HRESULT SystemTimeAssistant::LookupOlsonToLegacy(const std::string& olsonName,
 
 std::string SystemTimeAssistant::GetOlsonTimeZone() {
     vq::targetcfg::NarrowString timeZone;
-    StatusHolder status;
-    status = ConvertStatusCode(targetsystem::GetTimeZone(timeZone));
+    ThrowIfLibraryCallFailed(targetsystem::GetTimeZone(timeZone));
     return timeZone.str();
 }
 
@@ -151,7 +150,7 @@ HRESULT SystemTimeAssistant::ValidateOlsonOrLegacyTimeZone(const std::string& te
     }
     StatusHolder status;
     if (olsonForm) {
-        status = ConvertStatusCode(targetsystem::ValidateTimeZone(text));
+        ThrowIfLibraryCallFailed(targetsystem::ValidateTimeZone(text));
         return S_OK;
     }
     std::string olsonName;
@@ -170,7 +169,7 @@ HRESULT SystemTimeAssistant::PersistSystemPropertyTimezone(uint32_t tag, IuxSysP
     if (bag == nullptr) {
         return E_POINTER;
     }
-    if (tag != SystemTag::kLegacyTimeZone && tag != SystemTag::kOlsonTimeZone) {
+    if (tag != kest::tag::kLegacyTimeZone && tag != kest::tag::kOlsonTimeZone) {
         throw static_cast<long>(E_FAIL);
     }
     std::string newText;
@@ -179,7 +178,7 @@ HRESULT SystemTimeAssistant::PersistSystemPropertyTimezone(uint32_t tag, IuxSysP
         return read;
     }
     std::string olsonName;
-    if (tag == SystemTag::kLegacyTimeZone) {
+    if (tag == kest::tag::kLegacyTimeZone) {
         if (newText == GetLegacyTimeZone()) {
             return S_FALSE;
         }
@@ -197,8 +196,7 @@ HRESULT SystemTimeAssistant::PersistSystemPropertyTimezone(uint32_t tag, IuxSysP
         TraceIfEnabled("PersistSystemPropertyTimezone() failed", kTraceErrors);
         return UX_E_VALUE_INVALID;
     }
-    StatusHolder status;
-    status = ConvertStatusCode(targetsystem::SetTimeZone(olsonName));
+    ThrowIfLibraryCallFailed(targetsystem::SetTimeZone(olsonName));
     return S_OK;
 }
 
@@ -210,7 +208,7 @@ HRESULT SystemTimeAssistant::PersistSystemPropertyCurrentTime(IuxSysPropertyBag*
     }
     uxSysAttrTimestampUTC timestamp{};
     StatusHolder status;
-    status = QueryPropertyBag2(bag)->GetTimestamp(SystemTag::kCurrentTime, &timestamp);
+    status = QueryPropertyBag2(bag)->GetTimestamp(kest::tag::kCurrentTime, &timestamp);
     try {
         vq::dsc::AbsTime time = vq::dsc::AbsTime::FromTimestamp(timestamp);
         if (__builtin_add_overflow(time.seconds, offsetSeconds, &time.seconds)) {

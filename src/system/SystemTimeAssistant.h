@@ -17,6 +17,8 @@
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
+// Thread safety: not for concurrent calls; its owner calls it under its mutex. The time-zone
+// table goes through the INI cache, which takes its own lock.
 class SystemTimeAssistant {
   public:
     SystemTimeAssistant();

@@ -1,6 +1,6 @@
 // Free space of the file system that holds the trace log, as the tracer measures it before it
-// writes: kest::MeasureFileSystemSpace unless a test has put a stand-in in its place. The
-// measurement may be replaced and used from any thread (an atomic pointer).
+// writes: kest::MeasureFileSystemSpace unless a test has put a stand-in in its place.
+// Thread safety: the measurement may be replaced while other threads trace (it is kept atomic).
 #pragma once
 
 #include "support/FileSystemSpace.h"

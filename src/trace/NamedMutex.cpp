@@ -21,8 +21,8 @@ namespace vq {
 namespace dsc {
 namespace {
 
-constexpr mode_t kLockDirectoryMode = 01777;
-constexpr mode_t kLockFileMode = 0600;
+constexpr mode_t kLockDirectoryMode = S_IRWXU | S_IRWXG | S_IRWXO | S_ISVTX;
+constexpr mode_t kLockFileMode = S_IRUSR | S_IWUSR;
 // The file lock is tried this often, kFileLockRetryMs apart, before the mutex gives it up.
 constexpr int kFileLockAttempts = 200;
 constexpr uint32_t kFileLockRetryMs = 5;

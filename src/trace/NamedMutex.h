@@ -7,6 +7,9 @@
 // the effective user. When the lock file cannot be used, or another holder keeps it beyond a
 // bound, the mutex goes on ordering the threads of this process only: a stranger can neither
 // stop nor hang the process through it.
+//
+// Thread safety: any thread may use a NamedMutex at once; a ScopedNamedLock belongs to the thread
+// that made it.
 #pragma once
 
 #include <memory>

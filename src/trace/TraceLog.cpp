@@ -18,7 +18,7 @@ const char* const kAbortMessage =
 
 namespace {
 
-constexpr mode_t kLogFileMode = 0644;
+constexpr mode_t kLogFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH;
 
 // Opens the log for appending without following a symbolic link. The log directory may be
 // writable by everyone: the file is created exclusively, and an existing one is kept only when

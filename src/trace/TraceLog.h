@@ -1,6 +1,7 @@
 // The per-process trace log file: opened by the first line written to it, closed for good when
 // the free space of its file system falls below the low-disk threshold or when the file at its
 // path belongs to another user.
+// Thread safety: none of its own; the tracer uses its one log only under the trace lock.
 #pragma once
 
 #include <cstdint>

@@ -1,6 +1,8 @@
 // The tracer: writes trace records to a per-process log file, standard output and standard
 // error, each chosen by an output bit, serialised across threads and processes by a lock shared
 // through a lock file. Callers test the trace mask (TraceGate.h) before they build a line.
+// Thread safety: every function may be called from any thread at once; InitializeTracing and
+// ShutdownTracing are serialised, and records are written one at a time under the trace lock.
 #pragma once
 
 #include <cstdint>

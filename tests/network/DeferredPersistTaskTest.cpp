@@ -5,7 +5,7 @@
 #include <time.h>
 
 #include "NetworkTestSupport.h"
-#include "network/DeferredPersistTask.h"
+#include "items/DeferredPersistTask.h"
 
 namespace network_test {
 namespace {

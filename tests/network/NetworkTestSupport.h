@@ -14,10 +14,29 @@
 
 #include "common/TempSysroot.h"
 #include "network/EthernetItemHandler.h"
-#include "network/NetworkTags.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/TraceGate.h"
 #include "vq/targetcfg/TargetConfig.h"
+
+// The network item's tags, written out here as an independent check of the plug-in's.
+namespace NetworkTag {
+constexpr uint32_t kItemName = 0x0101D000;
+constexpr uint32_t kAdapterMode = 0x0D102000;
+constexpr uint32_t kSupportedAdapterModes = 0x0D103000;
+constexpr uint32_t kMacAddress = 0x0D104000;
+constexpr uint32_t kRequestMode = 0x0D105000;
+constexpr uint32_t kIPAddress = 0x0D107000;
+constexpr uint32_t kSubnetMask = 0x0D109000;
+constexpr uint32_t kGateway = 0x0D10A000;
+constexpr uint32_t kDnsServer = 0x0D10B000;
+constexpr uint32_t kPreferredMediaMode = 0x0D10F000;
+constexpr uint32_t kEtherCATMasterId = 0x0D118000;
+constexpr uint32_t kSupportedPollingModes = 0x0D119000;
+constexpr uint32_t kPollingMode = 0x0D11A000;
+constexpr uint32_t kPollingInterval = 0x0D11B000;
+constexpr uint32_t kPrimaryAdapter = 0x0D126000;
+constexpr uint32_t kEtherCATFlag = 0x0D155000;
+}  // namespace NetworkTag
 
 namespace network_test {
 

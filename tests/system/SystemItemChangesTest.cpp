@@ -9,7 +9,6 @@
 #include "support/ConvertStatusCode.h"
 #include "system/KestDeviceItemHandler.h"
 #include "system/SystemItemSysroot.h"
-#include "system/SystemItemTags.h"
 #include "uxsys/HostString.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {

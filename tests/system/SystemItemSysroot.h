@@ -2,6 +2,7 @@
 // version file, the time-zone table, the web-service settings and a logging hardware-clock tool.
 #pragma once
 
+#include <cstdint>
 #include <fstream>
 #include <map>
 #include <sstream>
@@ -111,4 +112,16 @@ class SystemItemSysroot : public vqsim_test::SimSysroot {
 };
 
 }  // namespace test
+
+// The system item's setting tags, written out here as an independent check of the plug-in's.
+namespace SystemTag {
+constexpr uint32_t kDeviceDescription = 0x01006000;
+constexpr uint32_t kHostName = 0x0101F000;
+constexpr uint32_t kComment = 0x0103D000;
+constexpr uint32_t kLocaleCode = 0x0D11D000;
+constexpr uint32_t kCurrentTime = 0x0D11F000;
+constexpr uint32_t kLegacyTimeZone = 0x0D120000;
+constexpr uint32_t kOlsonTimeZone = 0x0D14E000;
+constexpr uint32_t kWebServiceEnabled = 0x21004000;
+}  // namespace SystemTag
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100

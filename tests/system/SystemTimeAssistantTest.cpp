@@ -9,7 +9,6 @@
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/ConvertStatusCode.h"
 #include "system/SystemItemSysroot.h"
-#include "system/SystemItemTags.h"
 #include "uxsys/HostString.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {

@@ -11,6 +11,7 @@
 #include "StatusNames.h"
 #include "TextTable.h"
 #include "ValueText.h"
+#include "kest/ChassisTags.h"
 #include "uxsys/StatusCodes.h"
 
 namespace {
@@ -54,8 +55,8 @@ std::vector<std::string> ValuesOf(const PropertyDescription& description, IuxSys
         return all;
     }
     PropertyValue locales;
-    if (description.tag == 0x0D11D000 && bag != nullptr &&
-        ReadBagValue(bag, 0x0D11E000, &locales) >= 0 &&
+    if (description.tag == kest::tag::kLocaleCode && bag != nullptr &&
+        ReadBagValue(bag, kest::tag::kSupportedLocaleCodes, &locales) >= 0 &&
         std::holds_alternative<std::wstring>(locales)) {
         return {"one of " + ValueForPeople(locales, NumberStyle::kDecimal)};
     }

@@ -13,12 +13,11 @@
 #include "PropertyText.h"
 #include "StatusNames.h"
 #include "ValueText.h"
+#include "kest/ChassisTags.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
 namespace {
-
-constexpr uint32_t kClockTag = 0x0D11F000;
 
 std::optional<PropertyValue> Lookup(const std::vector<std::pair<uint32_t, PropertyValue>>& values,
                                     uint32_t tag) {
@@ -124,7 +123,7 @@ std::vector<ChangeOutcome> ItemChange::ReadBack(bool persisted) const {
     for (const auto& [tag, value] : requested_) {
         ChangeOutcome outcome{tag, value, Lookup(now, tag), Outcome::kNotStored};
         const std::optional<PropertyValue> before = Current(tag);
-        if (tag == kClockTag) {
+        if (tag == kest::tag::kCurrentTime) {
             outcome.outcome = persisted ? Outcome::kNotReadBack : Outcome::kNotStored;
         } else if (outcome.now && SameValue(*outcome.now, value)) {
             outcome.outcome = Outcome::kStored;

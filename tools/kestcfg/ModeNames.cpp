@@ -4,6 +4,8 @@
 
 #include <cstdio>
 
+#include "kest/ChassisTags.h"
+
 namespace {
 
 std::string Hex(uint32_t value) {
@@ -26,15 +28,27 @@ const char* NameOf(const ModeProperty& mode, uint32_t value) {
 const ModeProperty* FindModeProperty(uint32_t tag) {
     // Values without a name here are accepted as numbers; what they select is the device's
     // business.
-    static const std::vector<NamedMode> media = {
-        {0x01, "auto"},     {0x02, "10-half"},   {0x04, "10-full"},  {0x08, "100-half"},
-        {0x10, "100-full"}, {0x20, "1000-half"}, {0x40, "1000-full"}};
+    static const std::vector<NamedMode> media = {{kest::media_mode::kAuto, "auto"},
+                                                 {kest::media_mode::kHalfDuplex10, "10-half"},
+                                                 {kest::media_mode::kFullDuplex10, "10-full"},
+                                                 {kest::media_mode::kHalfDuplex100, "100-half"},
+                                                 {kest::media_mode::kFullDuplex100, "100-full"},
+                                                 {kest::media_mode::kHalfDuplex1000, "1000-half"},
+                                                 {kest::media_mode::kFullDuplex1000, "1000-full"}};
     static const std::vector<ModeProperty> modes = {
-        {0x0D102000, 0x0D103000, {{0x01, "disabled"}, {0x02, "tcpip"}, {0x08, "ethercat"}}},
-        {0x0D105000, 0x0D106000, {{0x01, "static"}, {0x02, "dynamic"}}},
-        {0x0D10F000, 0x0D110000, media},
-        {0x0D111000, 0x0D110000, media},
-        {0x0D11A000, 0x0D119000, {{0x01, "off"}, {0x02, "polling"}}},
+        {kest::tag::kAdapterMode,
+         kest::tag::kSupportedAdapterModes,
+         {{kest::adapter_mode::kDisabled, "disabled"},
+          {kest::adapter_mode::kTcpIp, "tcpip"},
+          {kest::adapter_mode::kEtherCAT, "ethercat"}}},
+        {kest::tag::kRequestMode,
+         kest::tag::kSupportedRequestModes,
+         {{kest::request_mode::kStatic, "static"}, {kest::request_mode::kDynamic, "dynamic"}}},
+        {kest::tag::kPreferredMediaMode, kest::tag::kSupportedMediaModes, media},
+        {kest::tag::kCurrentMediaMode, kest::tag::kSupportedMediaModes, media},
+        {kest::tag::kPollingMode,
+         kest::tag::kSupportedPollingModes,
+         {{kest::polling_mode::kOff, "off"}, {kest::polling_mode::kPolling, "polling"}}},
     };
     for (const ModeProperty& mode : modes) {
         if (mode.tag == tag || mode.maskTag == tag) {

@@ -1,4 +1,4 @@
-// Storing a fixed text as a new host string in a caller's result pointer.
+// Handing a text to the caller as a new host string, in a result pointer or a message slot.
 #pragma once
 
 #include "uxsys/HostString.h"
@@ -12,4 +12,14 @@ inline HRESULT StoreNewHostString(const wchar_t* text, CvqBStr* result) noexcept
     }
     *result = CvqBStrAlloc(text);
     return *result == nullptr ? E_OUTOFMEMORY : S_OK;
+}
+
+// Stores a new host string holding `text` in *slot (the caller frees it), freeing what the slot
+// held before; does nothing for a null slot. A string that cannot be allocated leaves null.
+inline void StoreValidationMessage(CvqBStr* slot, const wchar_t* text) {
+    if (slot == nullptr) {
+        return;
+    }
+    CvqBStrFree(*slot);
+    StoreNewHostString(text, slot);
 }

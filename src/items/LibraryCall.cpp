@@ -1,4 +1,4 @@
-#include "network/LibraryCall.h"
+#include "items/LibraryCall.h"
 
 #include "support/ConvertStatusCode.h"
 #include "support/StatusHolder.h"

@@ -1,10 +1,10 @@
-#include "network/DeferredPersistTask.h"
+#include "items/DeferredPersistTask.h"
 
 #include <utility>
 
-#include "network/BagReading.h"
-#include "network/LibraryCall.h"
-#include "network/NetworkTags.h"
+#include "items/LibraryCall.h"
+#include "kest/ChassisTags.h"
+#include "property/BagAccess.h"
 #include "support/Sleep.h"
 #include "support/TraceGate.h"
 #include "vq/targetcfg/Network.h"
@@ -64,10 +64,10 @@ void DeferredPersistTask::Run() {
 }
 
 void DeferredPersistTask::ReapplyLinkSpeed() {
-    if (ReadULong(changes_.Get(), NetworkTag::kAdapterMode) != AdapterMode::kTcpIp) {
+    if (ReadULong(changes_.Get(), kest::tag::kAdapterMode) != kest::adapter_mode::kTcpIp) {
         return;
     }
-    const uint32_t mediaMode = ReadULong(changes_.Get(), NetworkTag::kPreferredMediaMode);
+    const uint32_t mediaMode = ReadULong(changes_.Get(), kest::tag::kPreferredMediaMode);
     ThrowIfLibraryCallFailed(vq::targetcfg::network::SetDeviceSettings(
         deviceHandler_->GetDeviceIndex(), mediaMode, 0, 0));
 }

@@ -13,6 +13,8 @@
 #include "uxsys/PropertyBag.h"
 #include "vq/targetcfg/DeviceHandler.h"
 
+// Thread safety: no lock; after the constructor starts the thread only Run touches the members,
+// and the destructor (any thread) joins the thread before it drops them.
 class DeferredPersistTask : public vq::dsc::osdep::Thread,
                             public vq::dsc::RefCountedThreadSafePolicy {
   public:
