@@ -10,29 +10,29 @@
 #include <string>
 #include <string_view>
 
+#include "support/FileDescriptor.h"
+
 class MemoryFile {
   public:
     MemoryFile() : descriptor_(memfd_create("kest-fuzz", MFD_CLOEXEC)) {
-        if (descriptor_ < 0) {
+        if (!descriptor_.IsOpen()) {
             std::abort();
         }
-        path_ = "/proc/self/fd/" + std::to_string(descriptor_);
+        path_ = "/proc/self/fd/" + std::to_string(descriptor_.Get());
     }
-    ~MemoryFile() { close(descriptor_); }
-    MemoryFile(const MemoryFile&) = delete;
-    MemoryFile& operator=(const MemoryFile&) = delete;
 
     const char* Path() const { return path_.c_str(); }
 
     // Makes `bytes` the whole content.
     void Replace(std::string_view bytes) const {
-        if (ftruncate(descriptor_, 0) != 0 || pwrite(descriptor_, bytes.data(), bytes.size(), 0) !=
-                                                  static_cast<ssize_t>(bytes.size())) {
+        if (ftruncate(descriptor_.Get(), 0) != 0 ||
+            pwrite(descriptor_.Get(), bytes.data(), bytes.size(), 0) !=
+                static_cast<ssize_t>(bytes.size())) {
             std::abort();
         }
     }
 
   private:
-    int descriptor_;
+    kest::FileDescriptor descriptor_;
     std::string path_;
 };

@@ -9,6 +9,9 @@
 #include <cerrno>
 #include <cstring>
 
+#include "support/FileDescriptor.h"
+#include "support/WholeTransfer.h"
+
 namespace vqsim {
 namespace {
 
@@ -18,39 +21,6 @@ constexpr mode_t kFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH;
 
 [[noreturn]] void ThrowFailure(const char* operation, const std::string& path, int error) {
     throw StoreFailure(std::string(operation) + " " + path + ": " + std::strerror(error));
-}
-
-// Closes a descriptor on scope exit.
-class FdCloser {
-  public:
-    explicit FdCloser(int fd) : fd_(fd) {}
-    ~FdCloser() {
-        if (fd_ >= 0) {
-            ::close(fd_);
-        }
-    }
-    FdCloser(const FdCloser&) = delete;
-    FdCloser& operator=(const FdCloser&) = delete;
-    int Get() const { return fd_; }
-
-  private:
-    int fd_;
-};
-
-// Writes all of `size` bytes, repeating after short writes and EINTR.
-bool WriteAll(int fd, const char* data, size_t size) {
-    while (size > 0) {
-        const ssize_t written = ::write(fd, data, size);
-        if (written < 0) {
-            if (errno == EINTR) {
-                continue;
-            }
-            return false;
-        }
-        data += written;
-        size -= static_cast<size_t>(written);
-    }
-    return true;
 }
 
 int OpenRetrying(const std::string& path, int flags, mode_t mode = 0) {
@@ -98,27 +68,16 @@ void StateStore::EnsureDirectory() const {
 
 StateDocument StateStore::Load() const {
     const std::string path = StatePath();
-    const FdCloser fd(OpenRetrying(path, O_RDONLY));
-    if (fd.Get() < 0) {
+    const kest::FileDescriptor fd(OpenRetrying(path, O_RDONLY));
+    if (!fd.IsOpen()) {
         if (errno == ENOENT) {
             return StateDocument();
         }
         ThrowFailure("open", path, errno);
     }
     std::string text;
-    char buffer[4096];
-    for (;;) {
-        const ssize_t count = ::read(fd.Get(), buffer, sizeof buffer);
-        if (count < 0) {
-            if (errno == EINTR) {
-                continue;
-            }
-            ThrowFailure("read", path, errno);
-        }
-        if (count == 0) {
-            break;
-        }
-        text.append(buffer, static_cast<size_t>(count));
+    if (!kest::ReadToEnd(fd.Get(), text)) {
+        ThrowFailure("read", path, errno);
     }
     return StateDocument::Parse(text);
 }
@@ -126,51 +85,44 @@ StateDocument StateStore::Load() const {
 void StateStore::Save(const StateDocument& document) const {
     const std::string path = StatePath();
     std::string temporary = path + ".XXXXXX";
-    const FdCloser fd(::mkostemp(&temporary[0], O_CLOEXEC));
-    if (fd.Get() < 0) {
+    const kest::FileDescriptor fd(::mkostemp(&temporary[0], O_CLOEXEC));
+    if (!fd.IsOpen()) {
         ThrowFailure("mkostemp", temporary, errno);
     }
     const std::string text = document.Serialize();
-    const bool written = ::fchmod(fd.Get(), kFileMode) == 0 &&
-                         WriteAll(fd.Get(), text.data(), text.size()) && ::fsync(fd.Get()) == 0 &&
-                         ::rename(temporary.c_str(), path.c_str()) == 0;
+    const bool written = ::fchmod(fd.Get(), kFileMode) == 0 && kest::WriteWhole(fd.Get(), text) &&
+                         ::fsync(fd.Get()) == 0 && ::rename(temporary.c_str(), path.c_str()) == 0;
     if (!written) {
         const int error = errno;
         ::unlink(temporary.c_str());
         ThrowFailure("write", path, error);
     }
-    const FdCloser directory(OpenRetrying(directory_, O_RDONLY | O_DIRECTORY));
-    if (directory.Get() < 0 || ::fsync(directory.Get()) != 0) {
+    const kest::FileDescriptor directory(OpenRetrying(directory_, O_RDONLY | O_DIRECTORY));
+    if (!directory.IsOpen() || ::fsync(directory.Get()) != 0) {
         ThrowFailure("fsync", directory_, errno);
     }
 }
 
 void StateStore::AppendCallLog(const std::string& line) const {
     const std::string path = CallLogPath();
-    const FdCloser fd(OpenRetrying(path, O_WRONLY | O_APPEND | O_CREAT, kFileMode));
-    if (fd.Get() < 0) {
+    const kest::FileDescriptor fd(OpenRetrying(path, O_WRONLY | O_APPEND | O_CREAT, kFileMode));
+    if (!fd.IsOpen()) {
         ThrowFailure("open", path, errno);
     }
-    if (!WriteAll(fd.Get(), line.data(), line.size())) {
+    if (!kest::WriteWhole(fd.Get(), line)) {
         ThrowFailure("write", path, errno);
     }
 }
 
 FileLock::FileLock(const std::string& path) : fd_(OpenRetrying(path, O_RDWR | O_CREAT, kFileMode)) {
-    if (fd_ < 0) {
+    if (!fd_.IsOpen()) {
         ThrowFailure("open", path, errno);
     }
-    while (::flock(fd_, LOCK_EX) != 0) {
+    while (::flock(fd_.Get(), LOCK_EX) != 0) {
         if (errno != EINTR) {
-            const int error = errno;
-            ::close(fd_);
-            ThrowFailure("flock", path, error);
+            ThrowFailure("flock", path, errno);
         }
     }
-}
-
-FileLock::~FileLock() {
-    ::close(fd_);
 }
 
 }  // namespace vqsim

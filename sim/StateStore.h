@@ -9,6 +9,7 @@
 #include <string>
 
 #include "StateDocument.h"
+#include "support/FileDescriptor.h"
 
 namespace vqsim {
 
@@ -51,12 +52,11 @@ class StateStore {
 class FileLock {
   public:
     explicit FileLock(const std::string& path);
-    ~FileLock();
     FileLock(const FileLock&) = delete;
     FileLock& operator=(const FileLock&) = delete;
 
   private:
-    int fd_;
+    kest::FileDescriptor fd_;
 };
 
 }  // namespace vqsim

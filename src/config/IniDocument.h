@@ -1,5 +1,7 @@
 // The content of one INI document: sections in file order, each with its keys in file order, and
 // the comment lines kept with them. Names are looked up through hash indexes.
+// Thread safety: no lock of its own; only the IniText that holds it touches it, under that
+// document's rule that calls do not overlap.
 #pragma once
 
 #include <cstdint>

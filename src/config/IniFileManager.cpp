@@ -25,7 +25,7 @@ std::weak_ptr<IniFileManager>& InstanceSlot() {
 
 // Saves one cached document by safe replacement; a file new on disk gets mode 0664.
 bool Save(const std::string& path, IniText* text) {
-    IniText_SetWriteOptions(text, kIniNoMaxLineLength, 0, kCacheWriteFlags);
+    IniText_SetWriteOptions(text, kIniNoMaxLineLength, kIniNoSplitCharacter, kCacheWriteFlags);
     bool existed = false;
     try {
         existed = vq::dsc::osdep::IsRegularFile(path);

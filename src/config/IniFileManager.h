@@ -1,5 +1,7 @@
 // The process-wide INI cache: one parsed document per file path, re-read when the file's
 // modification time changes, with all access serialised by one process-wide recursive lock.
+// Thread safety: every operation may be called from any thread; CacheLock() guards the cache and
+// its documents, and a caller of GetIniCacheEntry holds it for as long as it uses the document.
 #pragma once
 
 #include <cstdint>

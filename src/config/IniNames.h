@@ -1,5 +1,7 @@
 // How section and key names compare: surrounding whitespace never counts, and letters compare
 // without regard to case unless case sensitivity is on.
+// Thread safety: NameRules is a value that does not change after construction; its const operations
+// may run concurrently.
 #pragma once
 
 #include <cctype>

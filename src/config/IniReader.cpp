@@ -11,6 +11,8 @@
 #include <vector>
 
 #include "config/IniText.h"
+#include "support/FileDescriptor.h"
+#include "support/WholeTransfer.h"
 
 namespace kest_ini {
 namespace {
@@ -217,18 +219,6 @@ class Parser {
     std::vector<std::string> pending_;
 };
 
-// Closes a file descriptor when it goes out of scope.
-class ScopedDescriptor {
-  public:
-    explicit ScopedDescriptor(int descriptor) : descriptor_(descriptor) {}
-    ScopedDescriptor(const ScopedDescriptor&) = delete;
-    ScopedDescriptor& operator=(const ScopedDescriptor&) = delete;
-    ~ScopedDescriptor() { close(descriptor_); }
-
-  private:
-    int descriptor_;
-};
-
 }  // namespace
 
 bool IsPieceName(std::string_view keyName) {
@@ -276,43 +266,24 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, Fil
     do {
         descriptor = open(path, O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
     } while (descriptor < 0 && errno == EINTR);
-    if (descriptor < 0) {
+    const kest::FileDescriptor file(descriptor);
+    if (!file.IsOpen()) {
         struct stat status;
         return stat(path, &status) == 0 ? kIniCannotOpenForReading : kIniInvalidArgument;
     }
-    ScopedDescriptor closer(descriptor);
     struct stat status;
-    if (fstat(descriptor, &status) != 0) {
+    if (fstat(file.Get(), &status) != 0) {
         return kIniReadError;
     }
     if (!S_ISREG(status.st_mode)) {
         return kIniCannotOpenForReading;
     }
+    // Sized by the file, so that loading costs no read beyond its end.
     std::string bytes;
-    bytes.resize(static_cast<size_t>(status.st_size) + 1);
-    size_t filled = 0;
-    for (;;) {
-        if (filled == bytes.size()) {
-            bytes.resize(bytes.size() * 2);
-        }
-        ssize_t count = read(descriptor, &bytes[filled], bytes.size() - filled);
-        if (count < 0 && errno == EINTR) {
-            continue;
-        }
-        if (count < 0) {
-            return kIniReadError;
-        }
-        if (count == 0) {
-            break;
-        }
-        filled += static_cast<size_t>(count);
-        // A file that gave exactly its size with room to spare has ended: asking again only to
-        // hear so would cost a system call on every load.
-        if (filled == static_cast<size_t>(status.st_size) && filled < bytes.size()) {
-            break;
-        }
+    if (!kest::ReadToEnd(file.Get(), bytes, static_cast<size_t>(status.st_size))) {
+        return kIniReadError;
     }
-    std::string_view text(bytes.data(), filled);
+    std::string_view text(bytes);
     int start = TextStart(text);
     if (start < 0) {
         return start;

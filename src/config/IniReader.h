@@ -1,5 +1,6 @@
 // Reading INI text: byte-order marks, line ends, sections, keys, quote stripping, comment
 // retention and the joining of values that the writer split into numbered " Line" keys.
+// Thread safety: keeps no state; may run concurrently on distinct documents.
 #pragma once
 
 #include <sys/stat.h>

@@ -1,6 +1,8 @@
 // The INI engine: one parsed INI document (`IniText`) behind a C-style interface. Getters return
 // 1 when found, 0 when not found; setters return 1 on success; IniText_Load and IniText_Save
 // return 0 on success. Every failure is one of the negative results below.
+// Thread safety: calls on one document must not overlap (the INI cache serialises its documents
+// with IniFileManager::CacheLock()); distinct documents may be used from different threads at once.
 #pragma once
 
 #include <cstddef>
@@ -43,9 +45,12 @@ constexpr uint32_t kIniWriteComments = 0x10;
 constexpr uint32_t kIniWriteSync = 0x20;
 
 constexpr uint32_t kIniDefaultReadFlags = kIniReadStripDoubleQuotes;
-constexpr uint32_t kIniDefaultWriteFlags = 46;
+// Safe replacement through a uniquely named temporary, " = " between name and value, synced.
+constexpr uint32_t kIniDefaultWriteFlags =
+    kIniWriteSafeReplacement | kIniWriteUniqueTemporary | kIniWriteSpacedSeparator | kIniWriteSync;
 constexpr int kIniDefaultMaxLineLength = 80;
 constexpr int kIniNoMaxLineLength = -1;
+constexpr int kIniNoSplitCharacter = 0;
 
 // Name of the section that holds keys found before the first header; a null section name given
 // to any operation means this section.
@@ -58,8 +63,8 @@ void IniText_Destroy(IniText* ini);
 
 // Read flags used by the next IniText_Load.
 void IniText_SetReadOptions(IniText* ini, uint32_t readFlags);
-// Maximum line length (<= 0: none), split character (0: none; must be below 128, else -5021)
-// and write flags used by IniText_Save. Returns 1.
+// Maximum line length (<= 0: none), split character (kIniNoSplitCharacter: none; must be
+// below 128, else -5021) and write flags used by IniText_Save. Returns 1.
 int IniText_SetWriteOptions(IniText* ini, int maxLineLength, int splitCharacter,
                             uint32_t writeFlags);
 // Whether repeated names refer to the existing section or key (default true) and whether names

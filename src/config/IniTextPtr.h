@@ -1,4 +1,5 @@
 // Owning handle of an IniText document: destroys it with IniText_Destroy.
+// Thread safety: as for the document it owns (see IniText.h).
 #pragma once
 
 #include <memory>

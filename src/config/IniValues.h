@@ -1,5 +1,6 @@
 // Conversions of stored INI values: integers, booleans and floating-point numbers with their
 // exact error results, and the backslash escapes of escaped strings.
+// Thread safety: keeps no state; may run concurrently.
 #pragma once
 
 #include <cstdint>

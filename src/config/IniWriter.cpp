@@ -12,6 +12,8 @@
 #include <vector>
 
 #include "config/IniReader.h"
+#include "support/FileDescriptor.h"
+#include "support/WholeTransfer.h"
 
 namespace kest_ini {
 namespace {
@@ -121,29 +123,6 @@ int AppendKey(const IniKey& key, const WriteOptions& options, std::string& out) 
     return 0;
 }
 
-// Closes a file descriptor unless it was handed over.
-class ScopedDescriptor {
-  public:
-    explicit ScopedDescriptor(int descriptor) : descriptor_(descriptor) {}
-    ScopedDescriptor(const ScopedDescriptor&) = delete;
-    ScopedDescriptor& operator=(const ScopedDescriptor&) = delete;
-    ~ScopedDescriptor() {
-        if (descriptor_ >= 0) {
-            close(descriptor_);
-        }
-    }
-    int Get() const { return descriptor_; }
-    // Closes now; false when closing reports an error (for example a failed delayed write).
-    bool Close() {
-        int descriptor = descriptor_;
-        descriptor_ = -1;
-        return close(descriptor) == 0;
-    }
-
-  private:
-    int descriptor_;
-};
-
 std::atomic<void (*)(SaveStage)> saveStageObserver{nullptr};
 
 void Reached(SaveStage stage) {
@@ -163,26 +142,9 @@ int OpenRetrying(const char* path, int flags, mode_t mode = 0) {
 // Proves that an existing target can be written by opening it for update. A missing target is
 // left alone: creating the temporary and the rename report whether the directory takes it.
 bool TargetIsWritable(const char* path) {
-    int descriptor = OpenRetrying(path, O_RDWR | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
-    if (descriptor >= 0) {
-        close(descriptor);
-        return true;
-    }
-    return errno == ENOENT;
-}
-
-bool WriteAll(int descriptor, std::string_view text) {
-    while (!text.empty()) {
-        ssize_t written = write(descriptor, text.data(), text.size());
-        if (written < 0 && errno == EINTR) {
-            continue;
-        }
-        if (written <= 0) {
-            return false;
-        }
-        text.remove_prefix(static_cast<size_t>(written));
-    }
-    return true;
+    const kest::FileDescriptor target(
+        OpenRetrying(path, O_RDWR | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+    return target.IsOpen() || errno == ENOENT;
 }
 
 // Six characters for a temporary's name, as mkstemp would pick them: different in every process
@@ -234,16 +196,17 @@ bool SyncUnlessInterrupted(int descriptor) {
 
 // Writes the target itself, truncating it; a failed write removes the half-written target.
 int WriteInPlace(const char* path, std::string_view text, uint32_t writeFlags, FileStamp* stamp) {
-    int descriptor = OpenRetrying(path, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOCTTY, 0666);
-    if (descriptor < 0) {
+    kest::FileDescriptor output(
+        OpenRetrying(path, O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC | O_NOCTTY, 0666));
+    if (!output.IsOpen()) {
         return kIniCannotOpenOutput;
     }
-    ScopedDescriptor output(descriptor);
     struct stat written;
-    bool complete = WriteAll(descriptor, text) &&
-                    ((writeFlags & kIniWriteSync) == 0 || SyncUnlessInterrupted(descriptor)) &&
-                    fstat(descriptor, &written) == 0;
-    if (!output.Close() || !complete) {
+    bool complete = kest::WriteWhole(output.Get(), text) &&
+                    ((writeFlags & kIniWriteSync) == 0 || SyncUnlessInterrupted(output.Get())) &&
+                    fstat(output.Get(), &written) == 0;
+    // Closing reports a failed delayed write too.
+    if (output.Close() != 0 || !complete) {
         unlink(path);
         return kIniWriteFailed;
     }
@@ -263,9 +226,9 @@ int ReplaceSafely(const char* path, std::string_view text, uint32_t writeFlags, 
                                 : slash == 0                    ? std::string("/")
                                              : std::string(target.substr(0, slash));
     std::string name(slash == std::string_view::npos ? target : target.substr(slash + 1));
-    ScopedDescriptor directory(
+    const kest::FileDescriptor directory(
         OpenRetrying(directoryPath.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-    if (directory.Get() < 0) {
+    if (!directory.IsOpen()) {
         return kIniCannotCreateTemporary;
     }
     struct stat previous;
@@ -276,9 +239,9 @@ int ReplaceSafely(const char* path, std::string_view text, uint32_t writeFlags, 
     // Over an existing target the temporary is private until it has the target's owner and mode,
     // so none of the content shows to anyone the target keeps out.
     std::string temporary;
-    ScopedDescriptor output(
+    kest::FileDescriptor output(
         CreateTemporary(directory.Get(), prefix, existed ? 0600 : 0666, &temporary));
-    if (output.Get() < 0) {
+    if (!output.IsOpen()) {
         return kIniCannotCreateTemporary;
     }
     Reached(SaveStage::kTemporaryCreated);
@@ -291,9 +254,9 @@ int ReplaceSafely(const char* path, std::string_view text, uint32_t writeFlags, 
         fchmod(output.Get(), 0644);
     }
     struct stat written;
-    bool complete = WriteAll(output.Get(), text) && SyncUnlessInterrupted(output.Get()) &&
+    bool complete = kest::WriteWhole(output.Get(), text) && SyncUnlessInterrupted(output.Get()) &&
                     fstat(output.Get(), &written) == 0;
-    if (!output.Close() || !complete) {
+    if (output.Close() != 0 || !complete) {
         unlinkat(directory.Get(), temporary.c_str(), 0);
         return kIniWriteFailed;
     }

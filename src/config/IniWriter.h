@@ -1,5 +1,7 @@
 // Writing INI text: the layout of sections and keys, values split over numbered " Line" keys
 // when a line would be too long, and the file replacement that never truncates the target.
+// Thread safety: may run concurrently on distinct documents and paths; the save-stage observer is
+// an atomic pointer, and processes saving one path at once each replace it whole.
 #pragma once
 
 #include <cstdint>
@@ -15,7 +17,7 @@ namespace kest_ini {
 
 struct WriteOptions {
     int maxLineLength = kIniDefaultMaxLineLength;  // <= 0: no limit
-    char splitCharacter = 0;                       // 0: none
+    char splitCharacter = kIniNoSplitCharacter;
     uint32_t flags = kIniDefaultWriteFlags;
 };
 

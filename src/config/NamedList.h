@@ -4,6 +4,8 @@
 // long the list grows. Most sections hold a handful of keys: they need no index nodes, which keeps
 // loading large files lean. Entries live on the heap, so their addresses (and the names the index
 // points into) stay put while the list changes.
+// Thread safety: no lock of its own; a list is used by one thread at a time, under its document's
+// rule.
 #pragma once
 
 #include <cstddef>

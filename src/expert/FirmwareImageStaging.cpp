@@ -10,10 +10,11 @@
 #include <vector>
 
 #include "com/CountedPtr.h"
-#include "expert/FileDescriptor.h"
 #include "support/Exceptions.h"
+#include "support/FileDescriptor.h"
 #include "support/TextConversion.h"
 #include "support/TraceGate.h"
+#include "support/WholeTransfer.h"
 #include "uxsys/Expert.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
@@ -56,7 +57,7 @@ struct StagingPlace {
         }
     }
 
-    FileDescriptor directory;
+    kest::FileDescriptor directory;
     std::string name;
 };
 
@@ -75,10 +76,10 @@ class StagingTemporary {
     StagingTemporary& operator=(const StagingTemporary&) = delete;
 
     // Creates a new empty file of ours, mode 0600, and returns it open for writing.
-    FileDescriptor Create() {
+    kest::FileDescriptor Create() {
         for (int attempt = 0; attempt < kNameAttempts; ++attempt) {
             const std::string name = TemporaryName(place_.name);
-            FileDescriptor file(openat(
+            kest::FileDescriptor file(openat(
                 place_.directory.Get(), name.c_str(),
                 O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC, kStagingFileMode));
             if (file.IsOpen()) {
@@ -142,22 +143,15 @@ class StagingTemporary {
     std::string name_;
 };
 
+// Writes all `count` bytes; a failure raises PosixError.
 void WriteAll(int descriptor, const uint8_t* bytes, size_t count) {
-    size_t done = 0;
-    while (done < count) {
-        const ssize_t written = write(descriptor, bytes + done, count - done);
-        if (written < 0 && errno == EINTR) {
-            continue;
-        }
-        if (written <= 0) {
-            throw vq::dsc::osdep::PosixError(written < 0 ? errno : EIO);
-        }
-        done += static_cast<size_t>(written);
+    if (!kest::WriteWhole(descriptor, bytes, count)) {
+        throw vq::dsc::osdep::PosixError();
     }
 }
 
 // Syncs and closes a temporary that was written.
-void Finish(FileDescriptor& file) {
+void Finish(kest::FileDescriptor& file) {
     if (fsync(file.Get()) != 0 || file.Close() != 0) {
         throw vq::dsc::osdep::PosixError();
     }
@@ -166,7 +160,7 @@ void Finish(FileDescriptor& file) {
 // Copies the regular file `source` into `temporary`'s new file.
 void CopyImageFile(const std::string& source, StagingTemporary& temporary) {
     // Non-blocking, so that opening a pipe cannot stall; it is refused right after.
-    FileDescriptor input(open(source.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+    kest::FileDescriptor input(open(source.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
     if (!input.IsOpen()) {
         throw vq::dsc::osdep::PosixError();
     }
@@ -177,7 +171,7 @@ void CopyImageFile(const std::string& source, StagingTemporary& temporary) {
     if (!S_ISREG(status.st_mode)) {
         throw vq::dsc::osdep::PosixError("the firmware image is not a regular file", EINVAL);
     }
-    FileDescriptor output = temporary.Create();
+    kest::FileDescriptor output = temporary.Create();
     std::vector<uint8_t> block(kCopyBlockSize);
     for (;;) {
         const ssize_t count = read(input.Get(), block.data(), block.size());
@@ -226,7 +220,7 @@ HRESULT StageImageBytes(IuxSysFirmwareImageSource& source, const std::string& st
     }
     const StagingPlace place(stagingPath);
     StagingTemporary temporary(place);
-    FileDescriptor file = temporary.Create();
+    kest::FileDescriptor file = temporary.Create();
     WriteAll(file.Get(), bytes, count);
     Finish(file);
     temporary.Commit();

@@ -5,7 +5,7 @@
 
 #include <cerrno>
 
-#include "expert/FileDescriptor.h"
+#include "support/FileDescriptor.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
@@ -23,7 +23,8 @@ bool IsBlank(char c) {
 
 StatusCode ReadStatusCode(const std::string& statusFile) {
     // Non-blocking, so that a pipe put in the file's place cannot hold the caller.
-    FileDescriptor file(open(statusFile.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK));
+    kest::FileDescriptor file(
+        open(statusFile.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK));
     if (!file.IsOpen()) {
         return StatusCode{false, '0'};
     }

@@ -3,13 +3,14 @@
 #include <unistd.h>
 
 #include <boost/bind/bind.hpp>
+#include <optional>
 #include <utility>
 
 #include "expert/FirmwareImageStaging.h"
 #include "expert/FirmwareStatusFile.h"
 #include "expert/FirmwareToolRun.h"
-#include "expert/FreeDiskSpace.h"
 #include "support/CurrentExceptionToStatus.h"
+#include "support/FileSystemSpace.h"
 #include "support/Guid.h"
 #include "support/Sysroot.h"
 #include "support/TraceGate.h"
@@ -78,10 +79,9 @@ HRESULT FirmwareUpdater::Prepare(uint32_t imageSize, CvqBStr* updateId) noexcept
             busy_.store(0);
             return E_FAIL;
         }
-        uint64_t freeBytes = 0;
-        const std::string stagingDirectory = kest::paths::FirmwareStagingDirectory();
-        if (GetFreeDiskSpace(stagingDirectory.c_str(), nullptr, &freeBytes) != 0 ||
-            freeBytes < 2 * static_cast<uint64_t>(imageSize)) {
+        const std::optional<kest::FileSystemSpace> space =
+            kest::MeasureFileSystemSpace(kest::paths::FirmwareStagingDirectory());
+        if (!space || space->freeBytes < 2 * static_cast<uint64_t>(imageSize)) {
             TraceIfEnabled("Not enough free space for the firmware image", kTraceErrors);
             ReleaseUpdateLock();
             busy_.store(0);

@@ -7,6 +7,8 @@
 
 #include <string>
 
+#include "support/FileDescriptor.h"
+
 namespace vq {
 namespace dsc {
 namespace osdep {
@@ -17,13 +19,12 @@ class ExclusiveFileLock {
     // close-on-exec; it must be a regular file) and waits for its exclusive lock. A failure
     // raises vq::dsc::osdep::PosixError.
     explicit ExclusiveFileLock(const std::string& path);
-    // Releases the lock.
-    ~ExclusiveFileLock();
+    // Destroying it releases the lock.
     ExclusiveFileLock(const ExclusiveFileLock&) = delete;
     ExclusiveFileLock& operator=(const ExclusiveFileLock&) = delete;
 
   private:
-    int descriptor_;
+    kest::FileDescriptor descriptor_;
 };
 
 }  // namespace osdep

@@ -17,6 +17,7 @@
 #include "support/PathHelpers.h"
 #include "support/ProcessControl.h"
 #include "support/TextConversion.h"
+#include "support/WholeTransfer.h"
 
 namespace vq {
 namespace dsc {
@@ -50,25 +51,12 @@ int32_t ExitResultFromWaitStatus(int status) {
 // fork and exec.
 void SendReport(int descriptor, Report::Kind kind, int32_t value) {
     const Report report{kind, value};
-    while (write(descriptor, &report, sizeof report) < 0 && errno == EINTR) {
-    }
+    static_cast<void>(kest::WriteWhole(descriptor, &report, sizeof report));
 }
 
 // Reads one whole report; false at end of file or on failure.
 bool ReceiveReport(int descriptor, Report& report) {
-    char* data = reinterpret_cast<char*>(&report);
-    size_t received = 0;
-    while (received < sizeof report) {
-        const ssize_t result = read(descriptor, data + received, sizeof report - received);
-        if (result < 0 && errno == EINTR) {
-            continue;
-        }
-        if (result <= 0) {
-            return false;
-        }
-        received += static_cast<size_t>(result);
-    }
-    return true;
+    return kest::ReadWhole(descriptor, &report, sizeof report);
 }
 
 // Closes descriptors `first` to `last`. Safe between fork and exec.
@@ -139,39 +127,19 @@ class AllSignalsBlocked {
     sigset_t previous_;
 };
 
-// A pipe whose ends are closed on destruction unless released.
-class ReportPipe {
-  public:
+// A pipe whose ends are closed on destruction unless handed on.
+struct ReportPipe {
     ReportPipe() {
-        if (pipe2(ends_, O_CLOEXEC) != 0) {
+        int ends[2];
+        if (pipe2(ends, O_CLOEXEC) != 0) {
             throw PosixError();
         }
-    }
-    ~ReportPipe() {
-        CloseWriteEnd();
-        if (ends_[0] >= 0) {
-            close(ends_[0]);
-        }
-    }
-    ReportPipe(const ReportPipe&) = delete;
-    ReportPipe& operator=(const ReportPipe&) = delete;
-
-    int ReadEnd() const { return ends_[0]; }
-    int WriteEnd() const { return ends_[1]; }
-    void CloseWriteEnd() {
-        if (ends_[1] >= 0) {
-            close(ends_[1]);
-            ends_[1] = -1;
-        }
-    }
-    int ReleaseReadEnd() {
-        const int descriptor = ends_[0];
-        ends_[0] = -1;
-        return descriptor;
+        readEnd.Reset(ends[0]);
+        writeEnd.Reset(ends[1]);
     }
 
-  private:
-    int ends_[2] = {-1, -1};
+    kest::FileDescriptor readEnd;
+    kest::FileDescriptor writeEnd;
 };
 
 }  // namespace
@@ -191,11 +159,7 @@ struct ExternalApplication::LaunchPlan {
 ExternalApplication::ExternalApplication(LaunchMode mode)
     : mode_(mode == LaunchMode::Default ? LaunchMode::Vfork : mode) {}
 
-ExternalApplication::~ExternalApplication() {
-    if (reportDescriptor_ >= 0) {
-        close(reportDescriptor_);
-    }
-}
+ExternalApplication::~ExternalApplication() = default;
 
 void ExternalApplication::SetWorkingDirectory(const std::wstring& directory) {
     ScopedLock lock(mutex_);
@@ -280,7 +244,7 @@ bool ExternalApplication::StartLocked(const std::wstring& program,
     plan.inherited = inheritedDescriptors_;
 
     ReportPipe pipe;
-    plan.reportDescriptor = pipe.WriteEnd();
+    plan.reportDescriptor = pipe.writeEnd.Get();
     plan.keep = plan.inherited;
     plan.keep.push_back(plan.reportDescriptor);
     std::sort(plan.keep.begin(), plan.keep.end());
@@ -300,12 +264,12 @@ bool ExternalApplication::StartLocked(const std::wstring& program,
     if (intermediate < 0) {
         throw PosixError(forkError);
     }
-    pipe.CloseWriteEnd();
+    pipe.writeEnd.Reset();
     intermediateId_ = intermediate;
-    reportDescriptor_ = pipe.ReleaseReadEnd();
+    reportDescriptor_ = std::move(pipe.readEnd);
 
     Report report{};
-    const bool received = ReceiveReport(reportDescriptor_, report);
+    const bool received = ReceiveReport(reportDescriptor_.Get(), report);
     if (!received || report.kind != Report::Started) {
         Finish(0);
         state_.store(State::StartAttempted);
@@ -404,7 +368,7 @@ bool ExternalApplication::ReceiveExitStatus(int32_t timeoutMs) {
                     ? 0
                     : static_cast<int>(std::chrono::ceil<std::chrono::milliseconds>(left).count());
         }
-        pollfd ready{reportDescriptor_, POLLIN, 0};
+        pollfd ready{reportDescriptor_.Get(), POLLIN, 0};
         const int result = poll(&ready, 1, pollMs);
         if (result < 0 && errno != EINTR) {
             throw PosixError();
@@ -417,7 +381,7 @@ bool ExternalApplication::ReceiveExitStatus(int32_t timeoutMs) {
         }
     }
     Report report{};
-    if (!ReceiveReport(reportDescriptor_, report) || report.kind != Report::Ended) {
+    if (!ReceiveReport(reportDescriptor_.Get(), report) || report.kind != Report::Ended) {
         Finish(-SIGKILL);
         throw PosixError("The exit status of the started program was lost", ECHILD);
     }
@@ -426,8 +390,7 @@ bool ExternalApplication::ReceiveExitStatus(int32_t timeoutMs) {
 }
 
 void ExternalApplication::Finish(int32_t exitResult) {
-    close(reportDescriptor_);
-    reportDescriptor_ = -1;
+    reportDescriptor_.Reset();
     // The intermediate exits right after its last report. A host that ignores SIGCHLD has it
     // reaped by the system, and waitpid then fails with ECHILD, which is fine.
     int status = 0;

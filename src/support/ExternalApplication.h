@@ -17,6 +17,7 @@
 #include <string>
 #include <vector>
 
+#include "support/FileDescriptor.h"
 #include "support/Mutex.h"
 
 namespace vq {
@@ -99,7 +100,8 @@ class ExternalApplication {
     std::atomic<State> state_{State::Created};
     std::atomic<int32_t> exitResult_{0};
     pid_t intermediateId_ = 0;
-    int reportDescriptor_ = -1;  // read end of the intermediate's report pipe while running
+    kest::FileDescriptor
+        reportDescriptor_;  // read end of the intermediate's report pipe while running
     Mutex mutex_;
 };
 

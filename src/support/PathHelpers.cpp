@@ -8,6 +8,7 @@
 #include <cerrno>
 
 #include "support/Exceptions.h"
+#include "support/FileDescriptor.h"
 #include "support/TextConversion.h"
 
 namespace vq {
@@ -31,34 +32,6 @@ int StatRetryingInterrupts(const std::string& path, struct stat& status) {
     }
     throw PosixError(errorNumber);
 }
-
-// A directory descriptor closed when it goes out of scope.
-class DirectoryDescriptor {
-  public:
-    explicit DirectoryDescriptor(int descriptor) : descriptor_(descriptor) {}
-    ~DirectoryDescriptor() {
-        if (descriptor_ >= 0) {
-            close(descriptor_);
-        }
-    }
-    DirectoryDescriptor(const DirectoryDescriptor&) = delete;
-    DirectoryDescriptor& operator=(const DirectoryDescriptor&) = delete;
-    int Get() const { return descriptor_; }
-    int Release() {
-        const int descriptor = descriptor_;
-        descriptor_ = -1;
-        return descriptor;
-    }
-    void Reset(int descriptor) {
-        if (descriptor_ >= 0) {
-            close(descriptor_);
-        }
-        descriptor_ = descriptor;
-    }
-
-  private:
-    int descriptor_;
-};
 
 constexpr int kDirectoryOpenFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
 // The read, write and search bits of owner, group and others.
@@ -125,7 +98,7 @@ int OpenOrCreateLevel(int parent, const std::string& name, mode_t mode,
     if (descriptor < 0) {
         ThrowPathFailure(errno, requestedPath);
     }
-    DirectoryDescriptor level(descriptor);
+    kest::FileDescriptor level(descriptor);
     struct stat status {};
     if (fstat(level.Get(), &status) != 0) {
         ThrowPathFailure(errno, requestedPath);
@@ -189,7 +162,7 @@ void CreateDirectories(const std::string& path, mode_t mode) {
     // The first level is opened by its absolute name, relative to no descriptor: only root may
     // change the entries of the root directory, and user-mode emulators map a bare "/" to their
     // own library prefix.
-    DirectoryDescriptor current(-1);
+    kest::FileDescriptor current;
     std::string::size_type start = 1;
     std::string::size_type lastStart = std::string::npos;
     while (start < path.size()) {

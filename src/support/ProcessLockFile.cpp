@@ -19,36 +19,16 @@ namespace {
 constexpr mode_t kLockFileMode = S_IRUSR | S_IWUSR;
 constexpr mode_t kLockDirectoryMode = S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH;
 
-// Closes a descriptor when it goes away unless it was handed on.
-class OwnedDescriptor {
-  public:
-    explicit OwnedDescriptor(int descriptor) noexcept : descriptor_(descriptor) {}
-    ~OwnedDescriptor() {
-        if (descriptor_ >= 0) {
-            close(descriptor_);
-        }
-    }
-    OwnedDescriptor(OwnedDescriptor&& other) noexcept : descriptor_(other.Take()) {}
-    OwnedDescriptor(const OwnedDescriptor&) = delete;
-    OwnedDescriptor& operator=(const OwnedDescriptor&) = delete;
-    OwnedDescriptor& operator=(OwnedDescriptor&&) = delete;
-    int Get() const noexcept { return descriptor_; }
-    int Take() noexcept { return std::exchange(descriptor_, -1); }
-
-  private:
-    int descriptor_;
-};
-
 bool OwnedByUs(const struct stat& status) {
     return status.st_uid == 0 || status.st_uid == geteuid();
 }
 
 // The directory of the lock file, opened; nobody but root or the effective user may change it.
-OwnedDescriptor OpenTrustedDirectory(const std::string& directory) {
+kest::FileDescriptor OpenTrustedDirectory(const std::string& directory) {
     if (!IsDirectory(directory)) {
         CreateDirectories(directory, kLockDirectoryMode);
     }
-    OwnedDescriptor opened(open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    kest::FileDescriptor opened(open(directory.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (opened.Get() < 0) {
         throw PosixError();
     }
@@ -64,31 +44,16 @@ OwnedDescriptor OpenTrustedDirectory(const std::string& directory) {
 
 }  // namespace
 
-ProcessLockFile::~ProcessLockFile() {
-    Release();
-}
-
-ProcessLockFile::ProcessLockFile(ProcessLockFile&& other) noexcept
-    : descriptor_(std::exchange(other.descriptor_, -1)) {}
-
-ProcessLockFile& ProcessLockFile::operator=(ProcessLockFile&& other) noexcept {
-    if (this != &other) {
-        Release();
-        descriptor_ = std::exchange(other.descriptor_, -1);
-    }
-    return *this;
-}
-
 ProcessLockFile ProcessLockFile::TryTake(const std::string& path) {
     const std::string::size_type slash = path.rfind('/');
     if (slash == std::string::npos || slash + 1 == path.size()) {
         throw PosixError("not a file path: " + path, EINVAL);
     }
-    const OwnedDescriptor directory =
+    const kest::FileDescriptor directory =
         OpenTrustedDirectory(slash == 0 ? "/" : path.substr(0, slash));
-    OwnedDescriptor file(openat(directory.Get(), path.c_str() + slash + 1,
-                                O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC,
-                                kLockFileMode));
+    kest::FileDescriptor file(
+        openat(directory.Get(), path.c_str() + slash + 1,
+               O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, kLockFileMode));
     if (file.Get() < 0) {
         throw PosixError();
     }
@@ -109,27 +74,25 @@ ProcessLockFile ProcessLockFile::TryTake(const std::string& path) {
         }
         throw PosixError();
     }
-    ProcessLockFile lock(file.Take());
+    ProcessLockFile lock(std::move(file));
     lock.RecordHolder(getpid());
     return lock;
 }
 
 void ProcessLockFile::RecordHolder(pid_t holder) noexcept {
-    if (descriptor_ < 0) {
+    if (!descriptor_.IsOpen()) {
         return;
     }
     const std::string text = std::to_string(holder) + "\n";
     // The id is information for people and tools; the flock alone decides who holds the lock.
-    if (ftruncate(descriptor_, 0) == 0) {
-        const ssize_t written = pwrite(descriptor_, text.data(), text.size(), 0);
+    if (ftruncate(descriptor_.Get(), 0) == 0) {
+        const ssize_t written = pwrite(descriptor_.Get(), text.data(), text.size(), 0);
         static_cast<void>(written);
     }
 }
 
 void ProcessLockFile::Release() noexcept {
-    if (descriptor_ >= 0) {
-        close(std::exchange(descriptor_, -1));
-    }
+    descriptor_.Reset();
 }
 
 }  // namespace osdep

@@ -8,6 +8,9 @@
 #include <sys/types.h>
 
 #include <string>
+#include <utility>
+
+#include "support/FileDescriptor.h"
 
 namespace vq {
 namespace dsc {
@@ -15,14 +18,9 @@ namespace osdep {
 
 class ProcessLockFile {
   public:
-    // Holds nothing.
+    // Holds nothing. Destroying or moving over a held lock releases this process's hold; the
+    // lock moves with the object and cannot be copied.
     ProcessLockFile() noexcept = default;
-    // Releases this process's hold.
-    ~ProcessLockFile();
-    ProcessLockFile(ProcessLockFile&& other) noexcept;
-    ProcessLockFile& operator=(ProcessLockFile&& other) noexcept;
-    ProcessLockFile(const ProcessLockFile&) = delete;
-    ProcessLockFile& operator=(const ProcessLockFile&) = delete;
 
     // Opens the lock file `path` (created with mode 0600, its directory with 0755 when missing)
     // and takes the lock without waiting; the result holds nothing when another holds it, and
@@ -30,9 +28,9 @@ class ProcessLockFile {
     // regular file of the effective user, or a failing open raises PosixError.
     static ProcessLockFile TryTake(const std::string& path);
 
-    bool IsHeld() const noexcept { return descriptor_ >= 0; }
+    bool IsHeld() const noexcept { return descriptor_.IsOpen(); }
     // The descriptor that carries the lock; -1 when nothing is held.
-    int Descriptor() const noexcept { return descriptor_; }
+    int Descriptor() const noexcept { return descriptor_.Get(); }
 
     // Writes `holder` to the file as the process that holds the lock.
     void RecordHolder(pid_t holder) noexcept;
@@ -40,9 +38,10 @@ class ProcessLockFile {
     void Release() noexcept;
 
   private:
-    explicit ProcessLockFile(int descriptor) noexcept : descriptor_(descriptor) {}
+    explicit ProcessLockFile(kest::FileDescriptor descriptor) noexcept
+        : descriptor_(std::move(descriptor)) {}
 
-    int descriptor_ = -1;
+    kest::FileDescriptor descriptor_;
 };
 
 }  // namespace osdep

@@ -9,8 +9,10 @@
 #include <string>
 
 #include "support/Exceptions.h"
+#include "support/FileDescriptor.h"
 #include "support/PathHelpers.h"
 #include "support/Sysroot.h"
+#include "support/WholeTransfer.h"
 
 namespace kest {
 namespace {
@@ -19,17 +21,17 @@ namespace {
 constexpr mode_t kClockFileMode = S_IRUSR | S_IWUSR | S_IRGRP | S_IROTH;
 constexpr mode_t kClockDirectoryMode = S_IRWXU | S_IRGRP | S_IXGRP | S_IROTH | S_IXOTH;
 
-// Closes a descriptor and, unless released, removes the temporary file it was created for.
+// A new temporary file, removed again unless it was renamed into place.
 class TemporaryFile {
   public:
     explicit TemporaryFile(std::string pathTemplate) : path_(std::move(pathTemplate)) {
-        descriptor_ = mkostemp(&path_[0], O_CLOEXEC);
-        if (descriptor_ < 0) {
+        descriptor_.Reset(mkostemp(&path_[0], O_CLOEXEC));
+        if (!descriptor_.IsOpen()) {
             throw vq::dsc::osdep::PosixError();
         }
     }
     ~TemporaryFile() {
-        CloseDescriptor();
+        descriptor_.Reset();
         if (!renamed_) {
             unlink(path_.c_str());
         }
@@ -38,27 +40,16 @@ class TemporaryFile {
     TemporaryFile& operator=(const TemporaryFile&) = delete;
 
     void Write(const std::string& content) {
-        size_t written = 0;
-        while (written < content.size()) {
-            const ssize_t result =
-                write(descriptor_, content.data() + written, content.size() - written);
-            if (result < 0 && errno != EINTR) {
-                throw vq::dsc::osdep::PosixError();
-            }
-            if (result > 0) {
-                written += static_cast<size_t>(result);
-            }
+        if (!WriteWhole(descriptor_.Get(), content)) {
+            throw vq::dsc::osdep::PosixError();
         }
     }
 
     // Makes the file readable by everyone, flushes it and moves it to `target` atomically.
     void ReplaceFile(const std::string& target) {
-        if (fchmod(descriptor_, kClockFileMode) != 0 || fsync(descriptor_) != 0) {
+        if (fchmod(descriptor_.Get(), kClockFileMode) != 0 || fsync(descriptor_.Get()) != 0 ||
+            descriptor_.Close() != 0) {
             throw vq::dsc::osdep::PosixError();
-        }
-        const int closed = CloseDescriptor();
-        if (closed != 0) {
-            throw vq::dsc::osdep::PosixError(closed);
         }
         if (rename(path_.c_str(), target.c_str()) != 0) {
             throw vq::dsc::osdep::PosixError();
@@ -67,18 +58,8 @@ class TemporaryFile {
     }
 
   private:
-    // Closes the descriptor once; returns 0 or the error number.
-    int CloseDescriptor() {
-        if (descriptor_ < 0) {
-            return 0;
-        }
-        const int result = close(descriptor_);
-        descriptor_ = -1;
-        return result == 0 ? 0 : errno;
-    }
-
     std::string path_;
-    int descriptor_ = -1;
+    FileDescriptor descriptor_;
     bool renamed_ = false;
 };
 

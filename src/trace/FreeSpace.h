@@ -1,21 +1,17 @@
-// Free space of the file system that holds the trace log, measured in 64 bits.
+// Free space of the file system that holds the trace log, as the tracer measures it before it
+// writes: kest::MeasureFileSystemSpace unless a test has put a stand-in in its place.
 // Thread safety: the measurement may be replaced while other threads trace (it is kept atomic).
 #pragma once
 
-#include <cstdint>
-#include <string>
+#include "support/FileSystemSpace.h"
 
 namespace kest_trace {
 
-// Writes the free bytes of the file system holding `directory` (fragment size times free
-// blocks); false when it cannot be measured.
-using FreeSpaceMeasure = bool (*)(const std::string& directory, uint64_t* freeBytes);
+// Measures the file system holding a directory; nothing when it cannot be measured.
+using FreeSpaceMeasure = std::optional<kest::FileSystemSpace> (*)(const std::string& directory);
 
-// The statvfs measurement.
-bool MeasureFreeSpace(const std::string& directory, uint64_t* freeBytes);
-
-// The measurement the tracer uses: MeasureFreeSpace unless replaced (by tests, which cannot
-// shrink a real file system). Null restores MeasureFreeSpace.
+// The measurement the tracer uses: kest::MeasureFileSystemSpace unless replaced (by tests,
+// which cannot shrink a real file system). Null restores kest::MeasureFileSystemSpace.
 FreeSpaceMeasure CurrentFreeSpaceMeasure();
 void SetFreeSpaceMeasure(FreeSpaceMeasure replacement);
 

@@ -11,6 +11,7 @@
 #include <mutex>
 
 #include "support/Exceptions.h"
+#include "support/FileDescriptor.h"
 #include "support/Mutex.h"
 #include "support/PathHelpers.h"
 #include "support/Sleep.h"
@@ -34,29 +35,29 @@ int OpenRetryingInterrupts(const std::string& path, int flags, mode_t mode = 0) 
     return descriptor;
 }
 
-// A lock file this process may use: -1, or a descriptor with `created` telling whether this
-// call created the file.
-int OpenLockFile(const std::string& path, bool& created) {
+// A lock file this process may use: nothing, or the open file with `created` telling whether
+// this call created it.
+kest::FileDescriptor OpenLockFile(const std::string& path, bool& created) {
     constexpr int kFlags = O_RDWR | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
     created = false;
-    int descriptor = OpenRetryingInterrupts(path, kFlags | O_CREAT | O_EXCL, kLockFileMode);
-    if (descriptor >= 0) {
+    kest::FileDescriptor file(
+        OpenRetryingInterrupts(path, kFlags | O_CREAT | O_EXCL, kLockFileMode));
+    if (file.IsOpen()) {
         created = true;
-        return descriptor;
+        return file;
     }
     if (errno != EEXIST) {
-        return -1;
+        return file;
     }
     // Someone else's file, a link or anything but a plain file could let them hold the lock
     // for ever or make this process lock a file of their choosing.
-    descriptor = OpenRetryingInterrupts(path, kFlags);
+    file.Reset(OpenRetryingInterrupts(path, kFlags));
     struct stat status {};
-    if (descriptor >= 0 && (fstat(descriptor, &status) != 0 || !S_ISREG(status.st_mode) ||
-                            status.st_nlink != 1 || status.st_uid != geteuid())) {
-        close(descriptor);
-        return -1;
+    if (file.IsOpen() && (fstat(file.Get(), &status) != 0 || !S_ISREG(status.st_mode) ||
+                          status.st_nlink != 1 || status.st_uid != geteuid())) {
+        file.Reset();
     }
-    return descriptor;
+    return file;
 }
 
 }  // namespace
@@ -72,7 +73,7 @@ class NamedLockState {
         if (directoryTrusted) {
             descriptor_ = OpenLockFile(path, created_);
         }
-        usable_.store(descriptor_ >= 0);
+        usable_.store(descriptor_.IsOpen());
     }
     ~NamedLockState() { CloseLockFile(); }
     NamedLockState(const NamedLockState&) = delete;
@@ -86,7 +87,7 @@ class NamedLockState {
             descriptor_ = OpenLockFile(path, created_);
             openedBy_ = getpid();
         }
-        return descriptor_;
+        return descriptor_.Get();
     }
 
     // Takes the file lock within the bound; false (and no file lock from then on) otherwise.
@@ -108,7 +109,7 @@ class NamedLockState {
 
     void UnlockFile() {
         if (fileLocked_) {
-            flock(descriptor_, LOCK_UN);
+            flock(descriptor_.Get(), LOCK_UN);
             fileLocked_ = false;
         }
     }
@@ -127,21 +128,20 @@ class NamedLockState {
     // Closes the lock file, removing it when this very process created it and the name still
     // is that file.
     void CloseLockFile() {
-        if (descriptor_ < 0) {
+        if (!descriptor_.IsOpen()) {
             return;
         }
         struct stat named {};
         struct stat held {};
         if (created_ && openedBy_ == getpid() && lstat(path.c_str(), &named) == 0 &&
-            fstat(descriptor_, &held) == 0 && named.st_dev == held.st_dev &&
+            fstat(descriptor_.Get(), &held) == 0 && named.st_dev == held.st_dev &&
             named.st_ino == held.st_ino) {
             unlink(path.c_str());
         }
-        close(descriptor_);
-        descriptor_ = -1;
+        descriptor_.Reset();
     }
 
-    int descriptor_ = -1;
+    kest::FileDescriptor descriptor_;
     bool created_ = false;
     bool fileLocked_ = false;
     std::atomic<bool> usable_{true};

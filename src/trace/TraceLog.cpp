@@ -7,6 +7,8 @@
 #include <cerrno>
 #include <cstring>
 
+#include "support/FileDescriptor.h"
+#include "support/WholeTransfer.h"
 #include "trace/FreeSpace.h"
 
 namespace kest_trace {
@@ -28,49 +30,38 @@ constexpr int kRefused = -2;
 int OpenLogFile(const std::string& path) {
     constexpr int kFlags = O_WRONLY | O_APPEND | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
     constexpr int kAttempts = 3;  // an existing file may vanish before it is opened
-    int descriptor = -1;
-    for (int attempt = 0; descriptor < 0 && attempt < kAttempts; ++attempt) {
+    kest::FileDescriptor file;
+    for (int attempt = 0; !file.IsOpen() && attempt < kAttempts; ++attempt) {
+        int descriptor;
         do {
             descriptor = open(path.c_str(), kFlags | O_CREAT | O_EXCL, kLogFileMode);
         } while (descriptor < 0 && errno == EINTR);
-        if (descriptor >= 0 || errno != EEXIST) {
+        file.Reset(descriptor);
+        if (file.IsOpen() || errno != EEXIST) {
             break;
         }
         do {
             descriptor = open(path.c_str(), kFlags);
         } while (descriptor < 0 && errno == EINTR);
+        file.Reset(descriptor);
     }
-    if (descriptor < 0) {
+    if (!file.IsOpen()) {
         return -1;
     }
     struct stat status;
-    if (fstat(descriptor, &status) != 0 || !S_ISREG(status.st_mode) || status.st_nlink != 1) {
-        close(descriptor);
+    if (fstat(file.Get(), &status) != 0 || !S_ISREG(status.st_mode) || status.st_nlink != 1) {
         return -1;
     }
     if (status.st_uid != geteuid()) {
-        close(descriptor);
         return kRefused;
     }
-    return descriptor;
+    return file.Release();
 }
 
 // Writes the record (whole lines) with one call, so that appends of other processes cannot
-// split it.
+// split it; a failed write costs only the record.
 void WriteRecord(int descriptor, const std::string& record) {
-    const char* data = record.data();
-    size_t left = record.size();
-    while (left > 0) {
-        ssize_t written = write(descriptor, data, left);
-        if (written < 0 && errno == EINTR) {
-            continue;
-        }
-        if (written <= 0) {
-            return;
-        }
-        data += written;
-        left -= static_cast<size_t>(written);
-    }
+    static_cast<void>(kest::WriteWhole(descriptor, record));
 }
 
 }  // namespace
@@ -92,30 +83,30 @@ bool TraceLog::SetLocation(std::string directory, const std::string& fileName) {
 }
 
 bool TraceLog::SpaceIsShort(uint32_t threshold) const {
-    uint64_t freeBytes = 0;
-    return !CurrentFreeSpaceMeasure()(directory_.empty() ? "." : directory_, &freeBytes) ||
-           freeBytes < threshold;
+    const std::optional<kest::FileSystemSpace> space =
+        CurrentFreeSpaceMeasure()(directory_.empty() ? "." : directory_);
+    return !space || space->freeBytes < threshold;
 }
 
 const char* TraceLog::Append(const char* line, uint32_t threshold) {
     if (path_.empty()) {
         return line;
     }
-    if (descriptor_ < 0 && !aborted_) {
+    if (!descriptor_.IsOpen() && !aborted_) {
         if (threshold != 0 && SpaceIsShort(threshold)) {
             aborted_ = true;
         } else {
             Open();
         }
     }
-    if (descriptor_ < 0) {
+    if (!descriptor_.IsOpen()) {
         return line;
     }
     if (threshold != 0 && SpaceIsShort(threshold)) {
         aborted_ = true;
         line = kAbortMessage;
     }
-    WriteRecord(descriptor_, std::string(line) + '\n');
+    WriteRecord(descriptor_.Get(), std::string(line) + '\n');
     if (aborted_) {
         Close();
     }
@@ -126,32 +117,30 @@ void TraceLog::AppendTwoLines(const char* first, const char* second) {
     if (path_.empty()) {
         return;
     }
-    if (descriptor_ < 0 && !aborted_) {
+    if (!descriptor_.IsOpen() && !aborted_) {
         Open();
     }
-    if (descriptor_ < 0) {
+    if (!descriptor_.IsOpen()) {
         return;
     }
     std::string record(first);
     record += '\n';
     record += second;
     record += '\n';
-    WriteRecord(descriptor_, record);
+    WriteRecord(descriptor_.Get(), record);
 }
 
 void TraceLog::Open() {
-    descriptor_ = OpenLogFile(path_);
-    if (descriptor_ == kRefused) {
-        descriptor_ = -1;
+    const int descriptor = OpenLogFile(path_);
+    if (descriptor == kRefused) {
         aborted_ = true;
+    } else {
+        descriptor_.Reset(descriptor);
     }
 }
 
 void TraceLog::Close() {
-    if (descriptor_ >= 0) {
-        close(descriptor_);
-        descriptor_ = -1;
-    }
+    descriptor_.Reset();
 }
 
 }  // namespace kest_trace

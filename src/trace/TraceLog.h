@@ -7,6 +7,8 @@
 #include <cstdint>
 #include <string>
 
+#include "support/FileDescriptor.h"
+
 namespace kest_trace {
 
 // The last line of a log whose file system ran short of space.
@@ -50,7 +52,7 @@ class TraceLog {
 
     std::string directory_;  // where free space is measured: the directory part of the path
     std::string path_;
-    int descriptor_ = -1;
+    kest::FileDescriptor descriptor_;
     bool aborted_ = false;
 };
 

@@ -2,6 +2,7 @@
 #include <unistd.h>
 
 #include <atomic>
+#include <optional>
 #include <regex>
 #include <string>
 #include <vector>
@@ -27,10 +28,9 @@ const std::regex kStampLine(R"(  Thread = 0x[0-9A-F]+, Time = \d{8} \d{6}[.,]\d{
 std::atomic<int> measurements{0};
 std::atomic<uint64_t> reportedFreeBytes{0};
 
-bool FakeMeasure(const std::string&, uint64_t* freeBytes) {
+std::optional<kest::FileSystemSpace> FakeMeasure(const std::string&) {
     ++measurements;
-    *freeBytes = reportedFreeBytes;
-    return true;
+    return kest::FileSystemSpace{0, reportedFreeBytes};
 }
 
 std::wstring Wide(const std::string& text) {

@@ -11,7 +11,8 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "kestcfg/WholeWrite.h"
+#include "support/FileDescriptor.h"
+#include "support/WholeTransfer.h"
 
 namespace kest::hostkit {
 
@@ -128,14 +129,12 @@ void PrepareRootDirectory(const std::string& root) {
     if (!created && errno != EEXIST) {
         throw std::runtime_error(SystemError("cannot create the directory", root));
     }
-    const int descriptor = open(root.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    const kest::FileDescriptor directory(
+        open(root.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     struct stat status {};
-    const bool usable = descriptor >= 0 && fstat(descriptor, &status) == 0 &&
+    const bool usable = directory.IsOpen() && fstat(directory.Get(), &status) == 0 &&
                         status.st_uid == geteuid() && (status.st_mode & (S_IWGRP | S_IWOTH)) == 0 &&
-                        IsEmptyDirectory(descriptor);
-    if (descriptor >= 0) {
-        close(descriptor);
-    }
+                        IsEmptyDirectory(directory.Get());
     if (!usable) {
         throw std::runtime_error(
             root +
@@ -200,16 +199,15 @@ class TreeWriter {
     void Write(const std::string& systemPath, const std::string& content, mode_t mode) {
         const std::string path = root_ + systemPath;
         MakeDirectories(path.substr(0, path.rfind('/')));
-        const int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, mode);
-        if (fd < 0) {
+        kest::FileDescriptor file(
+            open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, mode));
+        if (!file.IsOpen()) {
             throw std::runtime_error(SystemError("cannot create", path));
         }
-        if (!WriteWhole(fd, content)) {
-            const std::string problem = SystemError("cannot write", path);
-            close(fd);
-            throw std::runtime_error(problem);
+        if (!kest::WriteWhole(file.Get(), content)) {
+            throw std::runtime_error(SystemError("cannot write", path));
         }
-        if (fchmod(fd, mode) != 0 || close(fd) != 0) {
+        if (fchmod(file.Get(), mode) != 0 || file.Close() != 0) {
             throw std::runtime_error(SystemError("cannot finish", path));
         }
         written_.push_back(systemPath);

@@ -33,16 +33,6 @@ std::string RunningRollbackPath() {
     return PendingRollbackPath() + ".running";
 }
 
-// Closes a descriptor on every path.
-struct OpenRecordFile {
-    int descriptor;
-    ~OpenRecordFile() {
-        if (descriptor >= 0) {
-            close(descriptor);
-        }
-    }
-};
-
 int64_t MonotonicSeconds() {
     timespec now{};
     clock_gettime(CLOCK_MONOTONIC, &now);
@@ -123,23 +113,23 @@ bool RollBack(const CommandOptions& options, int file, std::ostream& err) {
 // back then unless it was confirmed meanwhile.
 void Watch(const CommandContext& context, const std::string& id) {
     const std::string path = PendingRollbackPath();
-    const OpenRecordFile file{OpenRecord(path)};
-    if (file.descriptor < 0 || flock(file.descriptor, LOCK_EX | LOCK_NB) != 0 ||
-        ReadRecordFrom(file.descriptor, path).value("id", "") != id) {
+    const kest::FileDescriptor file = OpenRecord(path);
+    if (!file.IsOpen() || flock(file.Get(), LOCK_EX | LOCK_NB) != 0 ||
+        ReadRecordFrom(file.Get(), path).value("id", "") != id) {
         return;
     }
     // The wait is measured on the monotonic clock, so that setting the controller's clock
     // meanwhile neither hastens nor delays the rollback.
-    const int64_t deadline = ReadRecordFrom(file.descriptor, path)["deadlineSeconds"];
+    const int64_t deadline = ReadRecordFrom(file.Get(), path)["deadlineSeconds"];
     const int64_t end = MonotonicSeconds() + (deadline - static_cast<int64_t>(time(nullptr)));
     while (MonotonicSeconds() < end) {
-        if (!StillAt(file.descriptor, path)) {
+        if (!StillAt(file.Get(), path)) {
             return;  // confirmed
         }
         usleep(kWatchInterval);
     }
     const ControllerTurn turn(false, context.err);
-    RollBack(context.options, file.descriptor, context.err);
+    RollBack(context.options, file.Get(), context.err);
 }
 
 // The saved settings as lines "  ITEM: NAME = VALUE".
@@ -157,8 +147,8 @@ void PrintSettings(std::ostream& out, const Json& items) {
 
 void RunConfirm(CommandContext& context) {
     const std::string path = PendingRollbackPath();
-    const OpenRecordFile file{OpenRecord(path)};
-    if (file.descriptor < 0 || unlink(path.c_str()) != 0) {
+    const kest::FileDescriptor file = OpenRecord(path);
+    if (!file.IsOpen() || unlink(path.c_str()) != 0) {
         if (ReadRecord(RunningRollbackPath())) {
             throw Failure("too late: the rollback of the change is running");
         }
@@ -168,9 +158,9 @@ void RunConfirm(CommandContext& context) {
         }
         throw Failure("no change is pending");
     }
-    const Json pending = ReadRecordFrom(file.descriptor, path);
+    const Json pending = ReadRecordFrom(file.Get(), path);
     // The watcher notices the removal within its polling interval and ends.
-    for (int waited = 0; waited < 100 && HeldByAnother(file.descriptor); ++waited) {
+    for (int waited = 0; waited < 100 && HeldByAnother(file.Get()); ++waited) {
         usleep(kWatchInterval / 2);
     }
     context.document = {{"confirmed", true}, {"deadline", pending.value("deadline", "")}};
@@ -181,11 +171,11 @@ void RunConfirm(CommandContext& context) {
 
 void RunPending(CommandContext& context) {
     const std::string path = PendingRollbackPath();
-    const OpenRecordFile file{OpenRecord(path)};
+    const kest::FileDescriptor file = OpenRecord(path);
     context.document = Json::object();
-    if (file.descriptor >= 0) {
-        Json pending = ReadRecordFrom(file.descriptor, path);
-        const bool watched = HeldByAnother(file.descriptor);
+    if (file.IsOpen()) {
+        Json pending = ReadRecordFrom(file.Get(), path);
+        const bool watched = HeldByAnother(file.Get());
         context.document["pending"] = {{"deadline", pending["deadline"]},
                                        {"watcher", watched},
                                        {"restores", pending["items"]}};
@@ -198,9 +188,9 @@ void RunPending(CommandContext& context) {
             PrintSettings(context.out, pending["items"]);
         }
     }
-    const OpenRecordFile running{OpenRecord(RunningRollbackPath())};
-    if (running.descriptor >= 0) {
-        const bool underWay = HeldByAnother(running.descriptor);
+    const kest::FileDescriptor running = OpenRecord(RunningRollbackPath());
+    if (running.IsOpen()) {
+        const bool underWay = HeldByAnother(running.Get());
         context.document["rollback"] = {{"underWay", underWay}, {"record", RunningRollbackPath()}};
         if (!context.options.json) {
             context.out << (underWay ? "A rollback is under way.\n"
@@ -232,8 +222,8 @@ void RunRollback(CommandContext& context) {
         return;
     }
     const ControllerTurn turn(context.options.noWait, context.err);
-    const OpenRecordFile file{OpenRecord(PendingRollbackPath())};
-    if (file.descriptor < 0 || !RollBack(context.options, file.descriptor, context.err)) {
+    const kest::FileDescriptor file = OpenRecord(PendingRollbackPath());
+    if (!file.IsOpen() || !RollBack(context.options, file.Get(), context.err)) {
         throw Failure("no change is pending");
     }
     const Json last = ReadRecord(LastRollbackPath()).value_or(Json::object());

@@ -9,7 +9,6 @@
 #include <cerrno>
 #include <cstring>
 #include <string>
-#include <utility>
 
 #include "ExitCodes.h"
 
@@ -42,15 +41,17 @@ int FlockRetryingInterrupts(int descriptor, int operation) {
 
 ControllerTurn::ControllerTurn(bool noWait, std::ostream& err) {
     const std::string path = RunDirectory() + "/" + kLockFileName;
-    descriptor_ =
-        open(path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC | O_NONBLOCK, 0600);
+    descriptor_.Reset(open(
+        path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NOCTTY | O_CLOEXEC | O_NONBLOCK, 0600));
     struct stat status {};
-    if (descriptor_ < 0 || fstat(descriptor_, &status) != 0 || !S_ISREG(status.st_mode)) {
-        const std::string reason = descriptor_ < 0 ? std::strerror(errno) : "not a regular file";
+    if (!descriptor_.IsOpen() || fstat(descriptor_.Get(), &status) != 0 ||
+        !S_ISREG(status.st_mode)) {
+        const std::string reason =
+            !descriptor_.IsOpen() ? std::strerror(errno) : "not a regular file";
         End();
         throw Failure("cannot open the lock file " + path + ": " + reason);
     }
-    if (FlockRetryingInterrupts(descriptor_, LOCK_EX | LOCK_NB) == 0) {
+    if (FlockRetryingInterrupts(descriptor_.Get(), LOCK_EX | LOCK_NB) == 0) {
         return;
     }
     if (errno == EWOULDBLOCK && noWait) {
@@ -59,7 +60,7 @@ ControllerTurn::ControllerTurn(bool noWait, std::ostream& err) {
     }
     if (errno == EWOULDBLOCK) {
         err << "kestcfg: waiting for another kestcfg to finish\n" << std::flush;
-        if (FlockRetryingInterrupts(descriptor_, LOCK_EX) == 0) {
+        if (FlockRetryingInterrupts(descriptor_.Get(), LOCK_EX) == 0) {
             return;
         }
     }
@@ -73,7 +74,5 @@ ControllerTurn::~ControllerTurn() {
 }
 
 void ControllerTurn::End() {
-    if (descriptor_ >= 0) {
-        close(std::exchange(descriptor_, -1));
-    }
+    descriptor_.Reset();
 }

@@ -6,6 +6,8 @@
 
 #include <ostream>
 
+#include "support/FileDescriptor.h"
+
 class ControllerTurn {
   public:
     // Waits for the turn, saying once on `err` that it waits for another kestcfg; with `noWait`
@@ -20,5 +22,5 @@ class ControllerTurn {
     void End();
 
   private:
-    int descriptor_ = -1;
+    kest::FileDescriptor descriptor_;
 };

@@ -3,40 +3,26 @@
 #include <fcntl.h>
 #include <unistd.h>
 
-#include <cerrno>
 #include <iostream>
+
+#include "support/WholeTransfer.h"
 
 DocumentOutput::DocumentOutput(bool keep) {
     if (!keep) {
         return;
     }
     std::cout.flush();
-    descriptor_ = fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, 3);
-    if (descriptor_ >= 0) {
+    descriptor_.Reset(fcntl(STDOUT_FILENO, F_DUPFD_CLOEXEC, 3));
+    if (descriptor_.IsOpen()) {
         dup2(STDERR_FILENO, STDOUT_FILENO);
     }
 }
 
-DocumentOutput::~DocumentOutput() {
-    if (descriptor_ >= 0) {
-        close(descriptor_);
-    }
-}
-
 void DocumentOutput::Write(const std::string& text) {
-    if (descriptor_ < 0) {
+    if (!descriptor_.IsOpen()) {
         std::cout << text << std::flush;
         return;
     }
-    size_t done = 0;
-    while (done < text.size()) {
-        const ssize_t written = ::write(descriptor_, text.data() + done, text.size() - done);
-        if (written < 0 && errno == EINTR) {
-            continue;
-        }
-        if (written <= 0) {
-            return;
-        }
-        done += static_cast<size_t>(written);
-    }
+    // A reader that went away costs only the document.
+    static_cast<void>(kest::WriteWhole(descriptor_.Get(), text));
 }

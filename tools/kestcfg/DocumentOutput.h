@@ -5,11 +5,12 @@
 
 #include <string>
 
+#include "support/FileDescriptor.h"
+
 class DocumentOutput {
   public:
     // With `keep`, moves standard output aside and points descriptor 1 at standard error.
     explicit DocumentOutput(bool keep);
-    ~DocumentOutput();
     DocumentOutput(const DocumentOutput&) = delete;
     DocumentOutput& operator=(const DocumentOutput&) = delete;
 
@@ -17,5 +18,5 @@ class DocumentOutput {
     void Write(const std::string& text);
 
   private:
-    int descriptor_ = -1;  // the real standard output when it was moved aside
+    kest::FileDescriptor descriptor_;  // the real standard output when it was moved aside
 };

@@ -20,6 +20,7 @@
 #include "StatusNames.h"
 #include "hostkit/HostText.h"
 #include "hostkit/InterfaceRef.h"
+#include "support/FileDescriptor.h"
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
@@ -135,18 +136,18 @@ std::string UpdateLockHolder() {
     const char* root = getenv("KEST_SYSROOT");
     const std::string path =
         std::string(root != nullptr && root[0] == '/' ? root : "") + kUpdateLockFile;
-    const int file = open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
-    if (file < 0) {
+    const kest::FileDescriptor file(
+        open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+    if (!file.IsOpen()) {
         return std::string();
     }
     std::string holder;
-    if (flock(file, LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK) {
+    if (flock(file.Get(), LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK) {
         char text[32] = {};
-        const ssize_t count = pread(file, text, sizeof text - 1, 0);
+        const ssize_t count = pread(file.Get(), text, sizeof text - 1, 0);
         holder = count > 0 ? std::string(text, static_cast<size_t>(count)) : "?";
         holder.erase(holder.find_last_not_of(" \n") + 1);
     }
-    close(file);
     return holder;
 }
 

@@ -40,14 +40,13 @@ std::string KindOf(mode_t mode) {
 }  // namespace
 
 HostFirmwareImage::HostFirmwareImage(const std::string& path) {
-    descriptor_ = open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC);
-    if (descriptor_ < 0) {
+    descriptor_.Reset(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_NOCTTY | O_CLOEXEC));
+    if (!descriptor_.IsOpen()) {
         throw UsageError("cannot open the firmware image " + path + ": " + std::strerror(errno));
     }
     struct stat status {};
-    if (fstat(descriptor_, &status) != 0) {
+    if (fstat(descriptor_.Get(), &status) != 0) {
         const std::string reason = std::strerror(errno);
-        close(descriptor_);
         throw UsageError("cannot examine the firmware image " + path + ": " + reason);
     }
     std::string problem;
@@ -64,7 +63,6 @@ HostFirmwareImage::HostFirmwareImage(const std::string& path) {
         problem = std::string("cannot be resolved: ") + std::strerror(errno);
     }
     if (!problem.empty()) {
-        close(descriptor_);
         throw UsageError("the firmware image " + path + " " + problem);
     }
     path_ = absolute;
@@ -75,7 +73,6 @@ HostFirmwareImage::~HostFirmwareImage() {
     if (mapped_ != nullptr) {
         munmap(mapped_, size_);
     }
-    close(descriptor_);
 }
 
 HRESULT HostFirmwareImage::QueryInterface(const IID& iid, void** object) {
@@ -106,7 +103,7 @@ uint32_t HostFirmwareImage::GetImageSize() {
 
 const uint8_t* HostFirmwareImage::GetImageBytes() {
     if (mapped_ == nullptr) {
-        void* bytes = mmap(nullptr, size_, PROT_READ, MAP_PRIVATE, descriptor_, 0);
+        void* bytes = mmap(nullptr, size_, PROT_READ, MAP_PRIVATE, descriptor_.Get(), 0);
         mapped_ = bytes == MAP_FAILED ? nullptr : bytes;
     }
     return static_cast<const uint8_t*>(mapped_);

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <string>
 
+#include "support/FileDescriptor.h"
 #include "uxsys/Expert.h"
 
 class HostFirmwareImage : public IuxSysFirmwareImageFile {
@@ -32,7 +33,7 @@ class HostFirmwareImage : public IuxSysFirmwareImageFile {
     HRESULT GetImageFilePath(CvqBStr* path) override;
 
   private:
-    int descriptor_ = -1;
+    kest::FileDescriptor descriptor_;
     std::string path_;  // absolute
     uint32_t size_ = 0;
     void* mapped_ = nullptr;

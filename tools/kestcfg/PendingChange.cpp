@@ -12,7 +12,7 @@
 
 #include "ControllerPath.h"
 #include "ExitCodes.h"
-#include "WholeWrite.h"
+#include "support/WholeTransfer.h"
 
 namespace {
 
@@ -22,30 +22,16 @@ std::string SystemError(const std::string& what, const std::string& path) {
     return what + " " + path + ": " + std::strerror(errno);
 }
 
-// Closes a descriptor on every path.
-struct Descriptor {
-    int value;
-    ~Descriptor() {
-        if (value >= 0) {
-            close(value);
-        }
-    }
-};
-
 // Opens the run directory, refusing one that another user owns or may write.
-int OpenRunDirectory() {
+kest::FileDescriptor OpenRunDirectory() {
     const std::string path = ControllerPath(kRunDirectory);
-    const int directory = open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    kest::FileDescriptor directory(
+        open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     struct stat status {};
-    if (directory < 0 || fstat(directory, &status) != 0) {
-        const std::string message = SystemError("cannot open the run directory", path);
-        if (directory >= 0) {
-            close(directory);
-        }
-        throw Failure(message);
+    if (!directory.IsOpen() || fstat(directory.Get(), &status) != 0) {
+        throw Failure(SystemError("cannot open the run directory", path));
     }
     if ((status.st_uid != 0 && status.st_uid != geteuid()) || (status.st_mode & 022) != 0) {
-        close(directory);
         throw Failure("the run directory " + path +
                       " belongs to another user or others may write it");
     }
@@ -67,40 +53,39 @@ std::string LastRollbackPath() {
 }
 
 void WriteRecord(const std::string& path, const Json& record) {
-    const Descriptor directory{OpenRunDirectory()};
+    const kest::FileDescriptor directory = OpenRunDirectory();
     const std::string text = JsonText(record, 2) + "\n";
     const std::string name = BaseName(path);
     std::string temporary;
-    int file = -1;
-    for (int attempt = 0; file < 0 && attempt < 100; ++attempt) {
+    kest::FileDescriptor file;
+    for (int attempt = 0; !file.IsOpen() && attempt < 100; ++attempt) {
         temporary = "." + name + "." + NewChangeId();
-        file = openat(directory.value, temporary.c_str(),
-                      O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600);
-        if (file < 0 && errno != EEXIST) {
+        file.Reset(openat(directory.Get(), temporary.c_str(),
+                          O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0600));
+        if (!file.IsOpen() && errno != EEXIST) {
             break;
         }
     }
-    if (file < 0) {
+    if (!file.IsOpen()) {
         throw Failure(SystemError("cannot create a temporary beside", path));
     }
-    const Descriptor written{file};
-    if (!WriteWhole(file, text)) {
+    if (!kest::WriteWhole(file.Get(), text)) {
         const std::string message = SystemError("cannot write", path);
-        unlinkat(directory.value, temporary.c_str(), 0);
+        unlinkat(directory.Get(), temporary.c_str(), 0);
         throw Failure(message);
     }
-    if (fsync(file) != 0 ||
-        renameat(directory.value, temporary.c_str(), directory.value, name.c_str()) != 0) {
+    if (fsync(file.Get()) != 0 ||
+        renameat(directory.Get(), temporary.c_str(), directory.Get(), name.c_str()) != 0) {
         const std::string message = SystemError("cannot save", path);
-        unlinkat(directory.value, temporary.c_str(), 0);
+        unlinkat(directory.Get(), temporary.c_str(), 0);
         throw Failure(message);
     }
-    fsync(directory.value);
+    fsync(directory.Get());
 }
 
-int OpenRecord(const std::string& path) {
-    const int file = open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
-    if (file < 0 && errno != ENOENT) {
+kest::FileDescriptor OpenRecord(const std::string& path) {
+    kest::FileDescriptor file(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    if (!file.IsOpen() && errno != ENOENT) {
         throw Failure(SystemError("cannot open", path));
     }
     return file;
@@ -131,22 +116,17 @@ Json ReadRecordFrom(int descriptor, const std::string& path) {
 }
 
 std::optional<Json> ReadRecord(const std::string& path) {
-    const Descriptor file{OpenRecord(path)};
-    if (file.value < 0) {
+    const kest::FileDescriptor file = OpenRecord(path);
+    if (!file.IsOpen()) {
         return std::nullopt;
     }
-    return ReadRecordFrom(file.value, path);
+    return ReadRecordFrom(file.Get(), path);
 }
 
 bool HeldByAnother(int descriptor) {
-    const int probe = open(("/proc/self/fd/" + std::to_string(descriptor)).c_str(),
-                           O_RDONLY | O_NONBLOCK | O_CLOEXEC);
-    if (probe < 0) {
-        return false;
-    }
-    const bool held = flock(probe, LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK;
-    close(probe);
-    return held;
+    const kest::FileDescriptor probe(open(("/proc/self/fd/" + std::to_string(descriptor)).c_str(),
+                                          O_RDONLY | O_NONBLOCK | O_CLOEXEC));
+    return probe.IsOpen() && flock(probe.Get(), LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK;
 }
 
 bool StillAt(int descriptor, const std::string& path) {

@@ -11,6 +11,7 @@
 #include <string>
 
 #include "JsonOutput.h"
+#include "support/FileDescriptor.h"
 
 // "/run/kest/pending-rollback.json" and "/run/kest/last-rollback.json" under the sysroot.
 std::string PendingRollbackPath();
@@ -26,8 +27,9 @@ std::optional<Json> ReadRecord(const std::string& path);
 // The record held by an open descriptor.
 Json ReadRecordFrom(int descriptor, const std::string& path);
 
-// Opens `path` close-on-exec without following a symbolic link; -1 when it does not exist.
-int OpenRecord(const std::string& path);
+// Opens `path` close-on-exec without following a symbolic link; nothing is open when it does
+// not exist.
+kest::FileDescriptor OpenRecord(const std::string& path);
 
 // True while a process holds the lock on the file `descriptor` refers to.
 bool HeldByAnother(int descriptor);
