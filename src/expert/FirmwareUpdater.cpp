@@ -10,7 +10,7 @@
 #include "expert/FirmwareStatusFile.h"
 #include "expert/FirmwareToolRun.h"
 #include "support/CurrentExceptionToStatus.h"
-#include "support/FileSystemSpace.h"
+#include "support/FreeDiskSpace.h"
 #include "support/Guid.h"
 #include "support/Sysroot.h"
 #include "support/TraceGate.h"
@@ -79,9 +79,10 @@ HRESULT FirmwareUpdater::Prepare(uint32_t imageSize, CvqBStr* updateId) noexcept
             busy_.store(0);
             return E_FAIL;
         }
-        const std::optional<kest::FileSystemSpace> space =
-            kest::MeasureFileSystemSpace(kest::paths::FirmwareStagingDirectory());
-        if (!space || space->freeBytes < 2 * static_cast<uint64_t>(imageSize)) {
+        uint64_t freeBytes = 0;
+        if (kest::GetFreeDiskSpace(kest::paths::FirmwareStagingDirectory().c_str(), nullptr,
+                                   &freeBytes) != 0 ||
+            freeBytes < 2 * static_cast<uint64_t>(imageSize)) {
             TraceIfEnabled("Not enough free space for the firmware image", kTraceErrors);
             ReleaseUpdateLock();
             busy_.store(0);

@@ -5,7 +5,7 @@
 namespace kest_trace {
 namespace {
 
-std::atomic<FreeSpaceMeasure> measure{&kest::MeasureFileSystemSpace};
+std::atomic<FreeSpaceMeasure> measure{&kest::GetFreeDiskSpace};
 
 }  // namespace
 
@@ -14,7 +14,7 @@ FreeSpaceMeasure CurrentFreeSpaceMeasure() {
 }
 
 void SetFreeSpaceMeasure(FreeSpaceMeasure replacement) {
-    measure.store(replacement != nullptr ? replacement : &kest::MeasureFileSystemSpace,
+    measure.store(replacement != nullptr ? replacement : &kest::GetFreeDiskSpace,
                   std::memory_order_release);
 }
 

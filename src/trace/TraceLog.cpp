@@ -83,9 +83,10 @@ bool TraceLog::SetLocation(std::string directory, const std::string& fileName) {
 }
 
 bool TraceLog::SpaceIsShort(uint32_t threshold) const {
-    const std::optional<kest::FileSystemSpace> space =
-        CurrentFreeSpaceMeasure()(directory_.empty() ? "." : directory_);
-    return !space || space->freeBytes < threshold;
+    uint64_t freeBytes = 0;
+    return CurrentFreeSpaceMeasure()(directory_.empty() ? "." : directory_.c_str(), nullptr,
+                                     &freeBytes) != 0 ||
+           freeBytes < threshold;
 }
 
 const char* TraceLog::Append(const char* line, uint32_t threshold) {

@@ -28,9 +28,10 @@ const std::regex kStampLine(R"(  Thread = 0x[0-9A-F]+, Time = \d{8} \d{6}[.,]\d{
 std::atomic<int> measurements{0};
 std::atomic<uint64_t> reportedFreeBytes{0};
 
-std::optional<kest::FileSystemSpace> FakeMeasure(const std::string&) {
+int32_t FakeMeasure(const char*, uint64_t*, uint64_t* freeBytes) {
     ++measurements;
-    return kest::FileSystemSpace{0, reportedFreeBytes};
+    *freeBytes = reportedFreeBytes;
+    return 0;
 }
 
 std::wstring Wide(const std::string& text) {
