@@ -7,7 +7,7 @@
 
 #include "common/TempSysroot.h"
 
-namespace kest_bench {
+namespace kest::bench {
 namespace {
 
 constexpr int kKeysPerSection = 10;
@@ -73,4 +73,4 @@ const IniFile& IniFileOfSize(size_t bytes) {
     return found->second;
 }
 
-}  // namespace kest_bench
+}  // namespace kest::bench

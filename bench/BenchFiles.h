@@ -7,7 +7,7 @@
 #include <utility>
 #include <vector>
 
-namespace kest_bench {
+namespace kest::bench {
 
 // The run's temporary sysroot directory, created on first use and removed at exit.
 const std::string& ScratchDirectory();
@@ -22,4 +22,4 @@ struct IniFile {
 // comment lines and quoted values as configuration files have.
 const IniFile& IniFileOfSize(size_t bytes);
 
-}  // namespace kest_bench
+}  // namespace kest::bench

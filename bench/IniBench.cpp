@@ -21,7 +21,7 @@
 
 namespace {
 
-using kest_bench::IniFileOfSize;
+using kest::bench::IniFileOfSize;
 
 constexpr int64_t kSmall = 1024;
 constexpr int64_t kMedium = 100 * 1024;
@@ -96,7 +96,7 @@ BENCHMARK(SimpleIni_Load)->Apply(ApplyLargeSize);
 
 // One look-up per iteration, cycling through keys spread over the medium file.
 void IniText_Lookup(benchmark::State& state) {
-    const kest_bench::IniFile& file = IniFileOfSize(kMedium);
+    const kest::bench::IniFile& file = IniFileOfSize(kMedium);
     IniTextPtr ini(IniText_Create());
     IniText_Load(ini.get(), file.path.c_str());
     size_t next = 0;
@@ -114,7 +114,7 @@ void IniText_Lookup(benchmark::State& state) {
 BENCHMARK(IniText_Lookup);
 
 void SimpleIni_Lookup(benchmark::State& state) {
-    const kest_bench::IniFile& file = IniFileOfSize(kMedium);
+    const kest::bench::IniFile& file = IniFileOfSize(kMedium);
     CSimpleIniA ini;
     ini.LoadFile(file.path.c_str());
     size_t next = 0;

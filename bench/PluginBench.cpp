@@ -17,9 +17,9 @@
 
 namespace {
 
+using kest::bench::kEthernetItemName;
+using kest::bench::kSystemItemName;
 using kest::hostkit::InterfaceRef;
-using kest_bench::kEthernetItemName;
-using kest_bench::kSystemItemName;
 
 // The item's properties as a changes bag with nothing modified yet.
 InterfaceRef<IuxSysPropertyBag2> ChangesOf(IuxSysExpert3& expert, const wchar_t* item) {
@@ -94,8 +94,8 @@ int Run(int argc, char** argv) {
         libraryDouble.emplace(KEST_LIBRARY_DOUBLE_PATH, "the library double");
     }
     kest::test::TempSysroot sysroot;
-    kest_bench::WriteControllerSysroot(sysroot);
-    kest_bench::LoadedExpert loaded;
+    kest::bench::WriteControllerSysroot(sysroot);
+    kest::bench::LoadedExpert loaded;
     IuxSysExpert3& expert = loaded.Expert();
 
     const InterfaceRef<IuxSysPropertyBag2> systemChanges = ChangesOf(expert, kSystemItemName);

@@ -7,7 +7,7 @@
 
 #include "hostkit/DemoController.h"
 
-namespace kest_bench {
+namespace kest::bench {
 namespace {
 
 constexpr char kControllerState[] =
@@ -55,4 +55,4 @@ LoadedExpert::~LoadedExpert() {
     expert_->Uninitialize();
 }
 
-}  // namespace kest_bench
+}  // namespace kest::bench

@@ -8,7 +8,7 @@
 #include "hostkit/Plugin.h"
 #include "uxsys/Interfaces.h"
 
-namespace kest_bench {
+namespace kest::bench {
 
 constexpr wchar_t kSystemItemName[] = L"VQ KEST Chassis";
 constexpr wchar_t kEthernetItemName[] = L"eth0";
@@ -33,4 +33,4 @@ class LoadedExpert {
     kest::hostkit::InterfaceRef<IuxSysExpert3> expert_;
 };
 
-}  // namespace kest_bench
+}  // namespace kest::bench

@@ -35,15 +35,15 @@ Resident MeasureResident() {
 int main() {
     try {
         kest::test::TempSysroot sysroot;
-        kest_bench::WriteControllerSysroot(sysroot);
+        kest::bench::WriteControllerSysroot(sysroot);
         const Resident before = MeasureResident();
         Resident afterInitialize;
         Resident afterProperties;
         {
-            kest_bench::LoadedExpert loaded;
+            kest::bench::LoadedExpert loaded;
             afterInitialize = MeasureResident();
             for (const wchar_t* item :
-                 {kest_bench::kSystemItemName, kest_bench::kEthernetItemName}) {
+                 {kest::bench::kSystemItemName, kest::bench::kEthernetItemName}) {
                 kest::hostkit::InterfaceRef<IuxSysPropertyBag> properties;
                 if (loaded.Expert().GetPropertiesOfItem(item, properties.Receive()) != S_OK) {
                     throw std::runtime_error("GetPropertiesOfItem failed");

@@ -24,7 +24,7 @@ constexpr uint32_t kMask = kTraceErrors | kTraceIniCache;
 void StartFileTracing() {
     static const bool started = [] {
         InitializeTracing(kMask, kTraceToLogFile,
-                          vq::dsc::WideFromNarrow(kest_bench::ScratchDirectory()), 0);
+                          vq::dsc::WideFromNarrow(kest::bench::ScratchDirectory()), 0);
         return true;
     }();
     benchmark::DoNotOptimize(started);
@@ -61,7 +61,7 @@ BENCHMARK(Trace_RecordToFile);
 void Spdlog_LineToFile(benchmark::State& state) {
     static const std::shared_ptr<spdlog::logger> logger = [] {
         auto created =
-            spdlog::basic_logger_mt("bench", kest_bench::ScratchDirectory() + "/spdlog.log");
+            spdlog::basic_logger_mt("bench", kest::bench::ScratchDirectory() + "/spdlog.log");
         created->flush_on(spdlog::level::trace);
         return created;
     }();
@@ -78,7 +78,7 @@ struct FileCloser {
 
 void Fprintf_LineToFile(benchmark::State& state) {
     static const std::unique_ptr<FILE, FileCloser> file(
-        std::fopen((kest_bench::ScratchDirectory() + "/fprintf.log").c_str(), "a"));
+        std::fopen((kest::bench::ScratchDirectory() + "/fprintf.log").c_str(), "a"));
     if (!file) {
         state.SkipWithError("cannot open the log file");
         return;

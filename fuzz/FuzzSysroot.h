@@ -9,7 +9,7 @@
 #include <cstdio>
 #include <string>
 
-namespace fuzz_sysroot {
+namespace kest::fuzz {
 
 inline std::string& Root() {
     static std::string root;
@@ -51,4 +51,4 @@ inline void WriteFile(const std::string& systemPath, const std::string& content)
     std::fclose(file);
 }
 
-}  // namespace fuzz_sysroot
+}  // namespace kest::fuzz

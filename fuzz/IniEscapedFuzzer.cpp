@@ -58,7 +58,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     // it, which the cache's read options strip.
     const int raw = IniText_SetRaw(ini.get(), kSection, kRawKey, text.c_str(), 0);
     const bool hasLineBreak = text.find_first_of("\r\n") != std::string::npos;
-    const std::string_view trimmed = kest_ini::TrimIniSpace(text);
+    const std::string_view trimmed = kest::ini::TrimIniSpace(text);
     const bool quoted = trimmed.size() >= 2 && trimmed.front() == '"' && trimmed.back() == '"';
     FUZZ_CHECK(raw == (hasLineBreak || quoted ? kIniInvalidArgument : kIniFound));
     if (raw == kIniFound) {

@@ -178,17 +178,17 @@ void CheckAgainstPrediction(IuxSysPropertyBag4* bag, HRESULT status,
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int* /*argc*/, char*** /*argv*/) {
-    fuzz_sysroot::Create();
-    fuzz_sysroot::WriteFile("/etc/korvane/version", "22.5.0\n");
-    fuzz_sysroot::WriteFile("/var/lib/vqtargetcfg/state.ini",
-                            "[System]\nHostName = kest-01\nLanguageName = English\n"
-                            "SupportedLanguages = English,German,French\n"
-                            "TimeZone = Europe/Berlin\n");
-    fuzz_sysroot::WriteFile("/usr/share/vqsysapi/timezone.ini",
-                            "[LegacyToOlson]\nCST6CDT = America/Chicago\n"
-                            "[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n");
-    fuzz_sysroot::WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
-    fuzz_sysroot::WriteFile("/usr/share/zoneinfo/America/Chicago", "TZif");
+    kest::fuzz::Create();
+    kest::fuzz::WriteFile("/etc/korvane/version", "22.5.0\n");
+    kest::fuzz::WriteFile("/var/lib/vqtargetcfg/state.ini",
+                          "[System]\nHostName = kest-01\nLanguageName = English\n"
+                          "SupportedLanguages = English,German,French\n"
+                          "TimeZone = Europe/Berlin\n");
+    kest::fuzz::WriteFile("/usr/share/vqsysapi/timezone.ini",
+                          "[LegacyToOlson]\nCST6CDT = America/Chicago\n"
+                          "[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n");
+    kest::fuzz::WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
+    kest::fuzz::WriteFile("/usr/share/zoneinfo/America/Chicago", "TZif");
     Handler();
     return 0;
 }
@@ -196,7 +196,7 @@ extern "C" int LLVMFuzzerInitialize(int* /*argc*/, char*** /*argv*/) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     static int iterations = 0;
     if (++iterations % kIterationsPerLogTruncation == 0) {
-        truncate((fuzz_sysroot::Root() + kCallLog).c_str(), 0);
+        truncate((kest::fuzz::Root() + kCallLog).c_str(), 0);
     }
     FuzzedDataProvider input(data, size);
     const CountedPtr<IuxSysPropertyBag4> changes = CreatePropertyBag();

@@ -3,7 +3,7 @@
 #include <cinttypes>
 #include <cstdio>
 
-namespace vqsim {
+namespace kest::sim {
 
 CallArguments& CallArguments::Text(const std::string& text) {
     fields_ += '\t';
@@ -64,4 +64,4 @@ std::string CallLogLine(const timespec& monotonic, const char* callName, int32_t
            arguments.Fields() + '\n';
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -9,7 +9,7 @@
 
 #include "vq/dsc/IPAddress.h"
 
-namespace vqsim {
+namespace kest::sim {
 
 // The input arguments of one call, formatted for its log line.
 class CallArguments {
@@ -36,4 +36,4 @@ std::string FormatMonotonicMs(const timespec& monotonic);
 std::string CallLogLine(const timespec& monotonic, const char* callName, int32_t status,
                         const CallArguments& arguments);
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <utility>
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 constexpr char kDevicePrefix[] = "Device";
@@ -211,4 +211,4 @@ std::string ControllerState::FindDeviceWith(const std::string& key,
     return std::string();
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -10,7 +10,7 @@
 #include "StateDocument.h"
 #include "vq/dsc/IPAddress.h"
 
-namespace vqsim {
+namespace kest::sim {
 
 // A value in the state file is not of its key's kind; what() names section, key and value.
 class MalformedState : public std::runtime_error {
@@ -66,4 +66,4 @@ class ControllerState {
     bool modified_ = false;
 };
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -3,7 +3,7 @@
 #include <new>
 #include <utility>
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 int32_t AssignText(vq::targetcfg::NarrowString& target, const std::string& text) noexcept {
@@ -44,4 +44,4 @@ int32_t DeviceObject::GetMACAddress(vq::targetcfg::NarrowString& macAddress) {
     return AssignText(macAddress, macAddress_);
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -7,7 +7,7 @@
 
 #include "vq/targetcfg/DeviceHandler.h"
 
-namespace vqsim {
+namespace kest::sim {
 
 // Describes one device as it was when listed. Created with one reference (the caller's); deletes
 // itself when the last reference is released.
@@ -33,4 +33,4 @@ class DeviceObject final : public vq::targetcfg::IDeviceHandler {
     const uint32_t index_;
 };
 
-}  // namespace vqsim
+}  // namespace kest::sim

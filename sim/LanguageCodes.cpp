@@ -1,6 +1,6 @@
 #include "LanguageCodes.h"
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 struct Language {
@@ -32,4 +32,4 @@ std::string LanguageNameForCode(const ControllerState& state, const std::string&
     return std::string();
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -12,10 +12,10 @@ namespace targetcfg {
 namespace network {
 namespace {
 
-using vqsim::CallArguments;
-using vqsim::ControllerState;
-using vqsim::NoInputs;
-using vqsim::RunCall;
+using kest::sim::CallArguments;
+using kest::sim::ControllerState;
+using kest::sim::NoInputs;
+using kest::sim::RunCall;
 
 // Runs a call on the device with `index`: its log line has the index, then `moreInputs`; with no
 // such device the result is status::kInvalidArgument, otherwise body(state, deviceSection).

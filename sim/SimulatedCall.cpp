@@ -11,7 +11,7 @@
 #include "StateStore.h"
 #include "vq/targetcfg/Types.h"
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 namespace status = vq::targetcfg::status;
@@ -79,4 +79,4 @@ int32_t RunCall(const char* callName, SimulatedCall& call) noexcept {
     }
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

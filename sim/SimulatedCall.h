@@ -11,7 +11,7 @@
 #include "CallLog.h"
 #include "ControllerState.h"
 
-namespace vqsim {
+namespace kest::sim {
 
 // One library call: its logged inputs and its work on the controller state.
 class SimulatedCall {
@@ -60,4 +60,4 @@ int32_t RunCall(const char* callName, Inputs inputs, Body body) noexcept {
 // The inputs of a call without input arguments.
 inline void NoInputs(CallArguments&) {}
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -2,7 +2,7 @@
 
 #include <cctype>
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 std::string Trim(const std::string& text) {
@@ -225,4 +225,4 @@ std::string StateDocument::Serialize() const {
     return text;
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

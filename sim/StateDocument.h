@@ -6,7 +6,7 @@
 #include <utility>
 #include <vector>
 
-namespace vqsim {
+namespace kest::sim {
 
 class StateDocument {
   public:
@@ -61,4 +61,4 @@ std::string UnescapeIniValue(const std::string& text);
 // ASCII case-insensitive equality.
 bool EqualsIgnoringCase(const std::string& a, const std::string& b);
 
-}  // namespace vqsim
+}  // namespace kest::sim

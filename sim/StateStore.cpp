@@ -12,7 +12,7 @@
 #include "support/FileDescriptor.h"
 #include "support/WholeTransfer.h"
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 // The state directories and files are readable by everyone, writable by their owner.
@@ -125,4 +125,4 @@ FileLock::FileLock(const std::string& path) : fd_(OpenRetrying(path, O_RDWR | O_
     }
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

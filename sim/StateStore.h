@@ -11,7 +11,7 @@
 #include "StateDocument.h"
 #include "support/FileDescriptor.h"
 
-namespace vqsim {
+namespace kest::sim {
 
 // A file operation of the store failed; what() names the operation, the path and the reason.
 class StoreFailure : public std::runtime_error {
@@ -59,4 +59,4 @@ class FileLock {
     kest::FileDescriptor fd_;
 };
 
-}  // namespace vqsim
+}  // namespace kest::sim

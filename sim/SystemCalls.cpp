@@ -13,10 +13,10 @@ namespace targetcfg {
 namespace system {
 namespace {
 
-using vqsim::CallArguments;
-using vqsim::ControllerState;
-using vqsim::NoInputs;
-using vqsim::RunCall;
+using kest::sim::CallArguments;
+using kest::sim::ControllerState;
+using kest::sim::NoInputs;
+using kest::sim::RunCall;
 
 constexpr char kSystem[] = "System";
 
@@ -140,7 +140,7 @@ int32_t SetLanguageName(NarrowString localeCode) {
     return RunCall(
         "SetLanguageName", [&](CallArguments& arguments) { arguments.Text(localeCode.str()); },
         [&](ControllerState& state) {
-            const std::string name = vqsim::LanguageNameForCode(state, localeCode.str());
+            const std::string name = kest::sim::LanguageNameForCode(state, localeCode.str());
             if (name.empty()) {
                 return status::kValueInvalid;
             }
@@ -157,7 +157,8 @@ int32_t ValidateTimeZone(NarrowString timeZone) {
     return RunCall(
         "ValidateTimeZone", [&](CallArguments& arguments) { arguments.Text(timeZone.str()); },
         [&](ControllerState&) {
-            return vqsim::ZoneFileExists(vqsim::CurrentSysroot().value_or(""), timeZone.str())
+            return kest::sim::ZoneFileExists(kest::sim::CurrentSysroot().value_or(""),
+                                             timeZone.str())
                        ? status::kSuccess
                        : status::kValueInvalid;
         });

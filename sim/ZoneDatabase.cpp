@@ -2,7 +2,7 @@
 
 #include <sys/stat.h>
 
-namespace vqsim {
+namespace kest::sim {
 namespace {
 
 // A zone name may not leave the database directory.
@@ -44,4 +44,4 @@ bool ZoneFileExists(const std::string& sysroot, const std::string& zoneName) {
     return ::stat(path.c_str(), &info) == 0 && S_ISREG(info.st_mode);
 }
 
-}  // namespace vqsim
+}  // namespace kest::sim

@@ -3,7 +3,7 @@
 
 #include <string>
 
-namespace vqsim {
+namespace kest::sim {
 
 // True when `zoneName` is a relative path of non-empty components other than "." and "..",
 // without zero characters, that names a regular file (links followed) in the sysroot's
@@ -11,4 +11,4 @@ namespace vqsim {
 // directory.
 bool ZoneFileExists(const std::string& sysroot, const std::string& zoneName);
 
-}  // namespace vqsim
+}  // namespace kest::sim

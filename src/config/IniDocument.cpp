@@ -4,7 +4,7 @@
 
 #include "config/IniText.h"
 
-namespace kest_ini {
+namespace kest::ini {
 
 IniDocument::IniDocument(bool uniqueNames, bool caseSensitive)
     : uniqueNames_(uniqueNames), rules_(caseSensitive), sections_(rules_) {}
@@ -110,4 +110,4 @@ void IniDocument::ResetKeys(IniSection& section, std::vector<std::unique_ptr<Ini
     section.keys.Reset(std::move(keys), rules_);
 }
 
-}  // namespace kest_ini
+}  // namespace kest::ini

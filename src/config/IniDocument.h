@@ -13,7 +13,7 @@
 #include "config/IniNames.h"
 #include "config/NamedList.h"
 
-namespace kest_ini {
+namespace kest::ini {
 
 struct IniKey {
     std::string name;
@@ -73,4 +73,4 @@ class IniDocument {
     NamedList<IniSection> sections_;
 };
 
-}  // namespace kest_ini
+}  // namespace kest::ini

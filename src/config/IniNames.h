@@ -9,7 +9,7 @@
 #include <cstdint>
 #include <string_view>
 
-namespace kest_ini {
+namespace kest::ini {
 
 // True for the characters the INI format treats as whitespace.
 constexpr bool IsIniSpace(char c) {
@@ -69,4 +69,4 @@ class NameRules {
     bool caseSensitive_;
 };
 
-}  // namespace kest_ini
+}  // namespace kest::ini

@@ -14,7 +14,7 @@
 #include "support/FileDescriptor.h"
 #include "support/WholeTransfer.h"
 
-namespace kest_ini {
+namespace kest::ini {
 namespace {
 
 constexpr std::string_view kLineSuffix = " Line";
@@ -293,4 +293,4 @@ int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, Fil
     return 0;
 }
 
-}  // namespace kest_ini
+}  // namespace kest::ini

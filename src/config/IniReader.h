@@ -11,7 +11,7 @@
 
 #include "config/IniDocument.h"
 
-namespace kest_ini {
+namespace kest::ini {
 
 // True when the reader treats a key of this name as a piece of a split value: its name ends in
 // " Line" and a number that fits 32 bits.
@@ -47,4 +47,4 @@ struct FileStamp {
 // a device gives -5001 rather than a hang. Returns 0 or an engine failure.
 int ReadIniFile(const char* path, uint32_t readFlags, IniDocument& document, FileStamp* stamp);
 
-}  // namespace kest_ini
+}  // namespace kest::ini

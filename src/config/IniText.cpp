@@ -18,20 +18,20 @@
 #include "config/IniWriter.h"
 
 struct IniText {
-    kest_ini::IniDocument document;
+    kest::ini::IniDocument document;
     uint32_t readFlags = kIniDefaultReadFlags;
-    kest_ini::WriteOptions writeOptions;
+    kest::ini::WriteOptions writeOptions;
     bool hasFile = false;  // a file was loaded or saved: `path` and `stamp` describe it
     std::string path;
-    kest_ini::FileStamp stamp;  // of the version loaded or saved
-    std::string decoded;        // scratch buffer of IniText_GetEscapedString
+    kest::ini::FileStamp stamp;  // of the version loaded or saved
+    std::string decoded;         // scratch buffer of IniText_GetEscapedString
 };
 
 namespace {
 
-using kest_ini::IniKey;
-using kest_ini::IniSection;
-using kest_ini::TrimIniSpace;
+using kest::ini::IniKey;
+using kest::ini::IniSection;
+using kest::ini::TrimIniSpace;
 
 // Scratch buffers larger than the need by more than this are given back.
 constexpr size_t kScratchSlack = 1024;
@@ -126,9 +126,9 @@ void IniText_SetNameOptions(IniText* ini, bool uniqueNames, bool caseSensitive) 
 
 int IniText_Load(IniText* ini, const char* path) {
     return Guarded([&] {
-        kest_ini::IniDocument fresh(ini->document.UniqueNames(), ini->document.CaseSensitive());
-        kest_ini::FileStamp stamp;
-        int result = kest_ini::ReadIniFile(path, ini->readFlags, fresh, &stamp);
+        kest::ini::IniDocument fresh(ini->document.UniqueNames(), ini->document.CaseSensitive());
+        kest::ini::FileStamp stamp;
+        int result = kest::ini::ReadIniFile(path, ini->readFlags, fresh, &stamp);
         if (result < 0) {
             return result;
         }
@@ -146,10 +146,10 @@ int IniText_Save(IniText* ini, const char* path) {
     }
     return Guarded([&] {
         std::string text;
-        int result = kest_ini::FormatIni(ini->document, ini->writeOptions, text);
-        kest_ini::FileStamp stamp;
+        int result = kest::ini::FormatIni(ini->document, ini->writeOptions, text);
+        kest::ini::FileStamp stamp;
         if (result == 0) {
-            result = kest_ini::WriteIniFile(path, text, ini->writeOptions.flags, &stamp);
+            result = kest::ini::WriteIniFile(path, text, ini->writeOptions.flags, &stamp);
         }
         if (result < 0) {
             return result;
@@ -169,7 +169,7 @@ int IniText_HasFileChanged(const IniText* ini) {
     if (stat(ini->path.c_str(), &status) != 0) {
         return errno == ENOENT ? kIniInvalidArgument : kIniCannotOpenForReading;
     }
-    return kest_ini::FileStamp::Of(status) == ini->stamp ? 0 : 1;
+    return kest::ini::FileStamp::Of(status) == ini->stamp ? 0 : 1;
 }
 
 int IniText_GetString(const IniText* ini, const char* section, const char* key,
@@ -223,26 +223,26 @@ int IniText_GetEscapedString(IniText* ini, const char* section, const char* key,
             smaller.reserve(std::max(needed, kScratchMinimum));
             ini->decoded.swap(smaller);
         }
-        kest_ini::DecodeEscapes(found->value, ini->decoded);
+        kest::ini::DecodeEscapes(found->value, ini->decoded);
         *value = ini->decoded.c_str();
         return kIniFound;
     });
 }
 
 int IniText_GetUInt32(const IniText* ini, const char* section, const char* key, uint32_t* value) {
-    return GetConverted(ini, section, key, value, kest_ini::ParseUInt32);
+    return GetConverted(ini, section, key, value, kest::ini::ParseUInt32);
 }
 
 int IniText_GetInt32(const IniText* ini, const char* section, const char* key, int32_t* value) {
-    return GetConverted(ini, section, key, value, kest_ini::ParseInt32);
+    return GetConverted(ini, section, key, value, kest::ini::ParseInt32);
 }
 
 int IniText_GetBoolean(const IniText* ini, const char* section, const char* key, bool* value) {
-    return GetConverted(ini, section, key, value, kest_ini::ParseBoolean);
+    return GetConverted(ini, section, key, value, kest::ini::ParseBoolean);
 }
 
 int IniText_GetDouble(const IniText* ini, const char* section, const char* key, double* value) {
-    return GetConverted(ini, section, key, value, kest_ini::ParseDouble);
+    return GetConverted(ini, section, key, value, kest::ini::ParseDouble);
 }
 
 int IniText_SetRaw(IniText* ini, const char* section, const char* key, const char* value,
@@ -270,7 +270,7 @@ int IniText_SetString(IniText* ini, const char* section, const char* key, const 
         return IniText_SetRaw(ini, section, key, value, '"');
     }
     return Guarded([&] {
-        std::string encoded = kest_ini::EncodeEscapes(value);
+        std::string encoded = kest::ini::EncodeEscapes(value);
         return IniText_SetRaw(ini, section, key, encoded.c_str(), '"');
     });
 }

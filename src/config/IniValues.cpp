@@ -9,7 +9,7 @@
 #include "config/IniNames.h"
 #include "config/IniText.h"
 
-namespace kest_ini {
+namespace kest::ini {
 namespace {
 
 constexpr uint64_t kMaxMagnitude = UINT32_MAX;
@@ -177,4 +177,4 @@ std::string EncodeEscapes(std::string_view text) {
     return encoded;
 }
 
-}  // namespace kest_ini
+}  // namespace kest::ini

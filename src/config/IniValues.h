@@ -7,7 +7,7 @@
 #include <string>
 #include <string_view>
 
-namespace kest_ini {
+namespace kest::ini {
 
 // Each returns 1 and the value, 0 for an empty or blank text, or the engine failure of its type.
 int ParseUInt32(std::string_view text, uint32_t* value);
@@ -20,4 +20,4 @@ void DecodeEscapes(std::string_view text, std::string& out);
 // `text` with backslash, double quote and control characters written as escapes.
 std::string EncodeEscapes(std::string_view text);
 
-}  // namespace kest_ini
+}  // namespace kest::ini

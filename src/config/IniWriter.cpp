@@ -15,7 +15,7 @@
 #include "support/FileDescriptor.h"
 #include "support/WholeTransfer.h"
 
-namespace kest_ini {
+namespace kest::ini {
 namespace {
 
 // Room taken on a split line by the name suffix and the separator.
@@ -339,4 +339,4 @@ int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, F
                : WriteInPlace(path, text, writeFlags, stamp);
 }
 
-}  // namespace kest_ini
+}  // namespace kest::ini

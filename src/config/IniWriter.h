@@ -13,7 +13,7 @@
 #include "config/IniReader.h"
 #include "config/IniText.h"
 
-namespace kest_ini {
+namespace kest::ini {
 
 struct WriteOptions {
     int maxLineLength = kIniDefaultMaxLineLength;  // <= 0: no limit
@@ -44,4 +44,4 @@ void SetSaveStageObserver(void (*observer)(SaveStage));
 // Returns 0 or an engine failure.
 int WriteIniFile(const char* path, std::string_view text, uint32_t writeFlags, FileStamp* stamp);
 
-}  // namespace kest_ini
+}  // namespace kest::ini

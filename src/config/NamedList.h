@@ -17,7 +17,7 @@
 
 #include "config/IniNames.h"
 
-namespace kest_ini {
+namespace kest::ini {
 
 // `Entry` must have a std::string member `name`.
 template <class Entry>
@@ -156,4 +156,4 @@ class NamedList {
     Index index_;
 };
 
-}  // namespace kest_ini
+}  // namespace kest::ini

@@ -1,6 +1,6 @@
 #include "support/TraceGate.h"
 
-namespace kest_detail {
+namespace kest::detail {
 std::atomic<uint32_t> traceMask{0};
 namespace {
 std::atomic<TraceLineWriter> traceWriter{nullptr};
@@ -17,22 +17,22 @@ void WriteRecord(const char* text, bool withStamp) {
     }
 }
 }  // namespace
-}  // namespace kest_detail
+}  // namespace kest::detail
 
 void SetTraceGate(uint32_t mask, TraceLineWriter writer) {
-    kest_detail::traceWriter.store(writer, std::memory_order_release);
-    kest_detail::traceMask.store(mask, std::memory_order_relaxed);
+    kest::detail::traceWriter.store(writer, std::memory_order_release);
+    kest::detail::traceMask.store(mask, std::memory_order_relaxed);
 }
 
 void TraceIfEnabled(const char* text, uint32_t bits) {
     if (IsTraceEnabled(bits)) {
-        kest_detail::WriteRecord(text, true);
+        kest::detail::WriteRecord(text, true);
     }
 }
 
 void TraceLineIfEnabled(const char* text, uint32_t bits) {
     if (IsTraceEnabled(bits)) {
-        kest_detail::WriteRecord(text, false);
+        kest::detail::WriteRecord(text, false);
     }
 }
 
@@ -45,7 +45,7 @@ void TraceStatus(const char* text, HRESULT status) {
         line += '(';
         line += std::to_string(status);
         line += ')';
-        kest_detail::WriteRecord(line.c_str(), true);
+        kest::detail::WriteRecord(line.c_str(), true);
     } catch (...) {
         // Out of memory while tracing: the record is dropped, the status stands.
     }

@@ -19,13 +19,13 @@ constexpr uint32_t kTraceLibraryCalls = 0x20;
 // Writes one trace record: the text line and, when withStamp is set, the thread/time line.
 using TraceLineWriter = void (*)(char kind, const char* text, bool withStamp);
 
-namespace kest_detail {
+namespace kest::detail {
 extern std::atomic<uint32_t> traceMask;
-}
+}  // namespace kest::detail
 
 // The current trace mask (0 until the tracer is initialised).
 inline uint32_t CurrentTraceMask() {
-    return kest_detail::traceMask.load(std::memory_order_relaxed);
+    return kest::detail::traceMask.load(std::memory_order_relaxed);
 }
 
 // True when `bits` shares at least one bit with the trace mask.

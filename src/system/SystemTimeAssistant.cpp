@@ -119,7 +119,7 @@ std::string SystemTimeAssistant::GetLegacyTimeZone() {
 HRESULT SystemTimeAssistant::FindLegacyOffset(const std::string& text, int32_t& seconds) const {
     // The time-zone table finds its keys ignoring case and surrounding blanks; so does this
     // look-up, so every text the table accepts gets its offset.
-    const kest_ini::NameRules sameName;
+    const kest::ini::NameRules sameName;
     for (const LegacyTimeZone& zone : legacyTable_) {
         if (sameName(zone.standardText, text) || sameName(zone.daylightText, text)) {
             seconds = zone.offset * kSecondsPerLegacyOffsetUnit;

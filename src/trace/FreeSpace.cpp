@@ -2,7 +2,7 @@
 
 #include <atomic>
 
-namespace kest_trace {
+namespace kest::trace {
 namespace {
 
 std::atomic<FreeSpaceMeasure> measure{&kest::GetFreeDiskSpace};
@@ -18,4 +18,4 @@ void SetFreeSpaceMeasure(FreeSpaceMeasure replacement) {
                   std::memory_order_release);
 }
 
-}  // namespace kest_trace
+}  // namespace kest::trace

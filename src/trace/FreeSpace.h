@@ -5,7 +5,7 @@
 
 #include "support/FreeDiskSpace.h"
 
-namespace kest_trace {
+namespace kest::trace {
 
 // Measures the file system holding a path, with the contract of kest::GetFreeDiskSpace.
 using FreeSpaceMeasure = int32_t (*)(const char* path, uint64_t* totalBytes, uint64_t* freeBytes);
@@ -15,4 +15,4 @@ using FreeSpaceMeasure = int32_t (*)(const char* path, uint64_t* totalBytes, uin
 FreeSpaceMeasure CurrentFreeSpaceMeasure();
 void SetFreeSpaceMeasure(FreeSpaceMeasure replacement);
 
-}  // namespace kest_trace
+}  // namespace kest::trace

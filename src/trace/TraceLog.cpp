@@ -11,7 +11,7 @@
 #include "support/WholeTransfer.h"
 #include "trace/FreeSpace.h"
 
-namespace kest_trace {
+namespace kest::trace {
 
 const char* const kAbortMessage =
     "** Available disk space is below the desired threshold. Aborting tracing. **";
@@ -144,4 +144,4 @@ void TraceLog::Close() {
     descriptor_.Reset();
 }
 
-}  // namespace kest_trace
+}  // namespace kest::trace

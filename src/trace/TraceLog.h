@@ -9,7 +9,7 @@
 
 #include "support/FileDescriptor.h"
 
-namespace kest_trace {
+namespace kest::trace {
 
 // The last line of a log whose file system ran short of space.
 extern const char* const kAbortMessage;
@@ -56,4 +56,4 @@ class TraceLog {
     bool aborted_ = false;
 };
 
-}  // namespace kest_trace
+}  // namespace kest::trace

@@ -28,7 +28,7 @@ struct TracerState {
     std::mutex lockSlot;       // guards `lock` itself
     std::shared_ptr<vq::dsc::NamedMutex> lock;
     std::string logFileName;
-    kest_trace::TraceLog log;
+    kest::trace::TraceLog log;
 };
 
 TracerState& State() {
@@ -61,7 +61,7 @@ std::string BuildLogFileName() {
     if (stamp.size() > 8) {
         stamp[8] = '_';
     }
-    char name[kest_trace::kMaxLogPathLength + 1];
+    char name[kest::trace::kMaxLogPathLength + 1];
     std::snprintf(name, sizeof name, "%s-uxTracer-%08lX.log", stamp.c_str(),
                   static_cast<unsigned long>(getpid()));
     return name;

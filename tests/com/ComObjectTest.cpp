@@ -7,6 +7,8 @@
 #include "TestComponents.h"
 #include "com/CountedPtr.h"
 
+namespace kest::test::com {
+
 namespace {
 
 using TestObject = CVQComObject<TestComponent>;
@@ -119,3 +121,5 @@ TEST_F(ComObjectTest, ConcurrentReferencesDestroyTheObjectExactlyOnce) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::com

@@ -6,6 +6,8 @@
 #include "TestComponents.h"
 #include "com/CountedPtr.h"
 
+namespace kest::test::com {
+
 namespace {
 
 // A counted object outside the component model: the counter types of the plug-in look like this.
@@ -83,3 +85,5 @@ TEST(CountedPtrTest, QueryCountedConvertsBetweenInterfacesOfOneObject) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::com

@@ -10,6 +10,8 @@
 #include "com/CVQComObjectRootEx.h"
 #include "uxsys/IUnknown.h"
 
+namespace kest::test::com {
+
 inline constexpr IID IID_ITestBase = {
     0x11111111, 0x2222, 0x3333, {0x44, 0x44, 0x55, 0x55, 0x55, 0x55, 0x55, 0x01}};
 inline constexpr IID IID_ITestDerived = {
@@ -75,3 +77,5 @@ class TestComponent : public ITestDerived,
   private:
     std::atomic<int>* destructions_;
 };
+
+}  // namespace kest::test::com

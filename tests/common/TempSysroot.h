@@ -22,8 +22,7 @@
 #include <stdexcept>
 #include <string>
 
-namespace kest {
-namespace test {
+namespace kest::test {
 
 class TempSysroot {
   public:
@@ -109,5 +108,4 @@ class TempSysroot {
     bool hadPrevious_ = false;
 };
 
-}  // namespace test
-}  // namespace kest
+}  // namespace kest::test

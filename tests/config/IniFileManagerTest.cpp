@@ -7,6 +7,8 @@
 #include "config/IniFileManager.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::test::config {
+
 using kest::test::TempSysroot;
 
 namespace {
@@ -114,3 +116,5 @@ TEST_F(IniFileManagerTest, FailedFlushKeepsTheChangeForTheNextTry) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::config

@@ -27,6 +27,8 @@
 #include "IniTestSupport.h"
 #include "config/IniReader.h"
 
+namespace kest::test::config {
+
 using kest::test::TempSysroot;
 
 namespace {
@@ -274,7 +276,7 @@ bool NormaliseLine(std::string& line, bool& afterKey, std::set<Rule>& rules) {
 Normalised Normalise(const std::string& raw) {
     Normalised result;
     std::string text = raw;
-    const int start = kest_ini::TextStart(text);
+    const int start = kest::ini::TextStart(text);
     if (start < 0) {
         result.rules.insert(kWideByteOrderMark);
         result.skip = true;
@@ -512,3 +514,5 @@ TEST(IniInihDifferentialTest, MachineFilesDifferOnlyByTheKnownRules) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::config

@@ -6,6 +6,8 @@
 
 #include "IniTestSupport.h"
 
+namespace kest::test::config {
+
 using kest::test::TempSysroot;
 
 namespace {
@@ -155,3 +157,5 @@ TEST(IniReadBackPromiseTest, AcceptedValuesReadBackAndRefusedOnesWouldNot) {
         }
     }
 }
+
+}  // namespace kest::test::config

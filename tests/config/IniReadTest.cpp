@@ -6,6 +6,8 @@
 
 #include "IniTestSupport.h"
 
+namespace kest::test::config {
+
 using kest::test::TempSysroot;
 using std::string_literals::operator""s;  // NOLINT(misc-unused-using-decls): used by "..."s
 
@@ -152,3 +154,5 @@ TEST(IniReadTest, CommentsAreKeptAndWrittenOnlyWhenAskedFor) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::config

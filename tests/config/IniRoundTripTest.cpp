@@ -7,6 +7,8 @@
 
 #include "IniTestSupport.h"
 
+namespace kest::test::config {
+
 using kest::test::TempSysroot;
 
 namespace {
@@ -111,3 +113,5 @@ TEST(IniRoundTripTest, SaveThenLoadGivesBackTheDocument) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::config

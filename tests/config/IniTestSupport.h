@@ -12,6 +12,8 @@
 #include "config/IniText.h"
 #include "config/IniTextPtr.h"
 
+namespace kest::test::config {
+
 inline void WriteBytes(const std::string& path, const std::string& bytes) {
     std::ofstream(path, std::ios::binary | std::ios::trunc) << bytes;
 }
@@ -55,3 +57,5 @@ inline std::string SavedText(const kest::test::TempSysroot& dir, IniText* ini, u
     EXPECT_EQ(IniText_Save(ini, path.c_str()), 0);
     return ReadBytes(path);
 }
+
+}  // namespace kest::test::config

@@ -3,6 +3,8 @@
 
 #include "IniTestSupport.h"
 
+namespace kest::test::config {
+
 namespace {
 
 // A document holding the key "k" of section "s" with the given stored value.
@@ -97,3 +99,5 @@ TEST(IniValueTest, EscapesDecodeAsWrittenAndEncodedStringsRoundTrip) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::config

@@ -16,6 +16,8 @@
 #include "IniTestSupport.h"
 #include "config/IniWriter.h"
 
+namespace kest::test::config {
+
 using kest::test::TempSysroot;
 
 namespace {
@@ -62,7 +64,7 @@ TEST(IniWriteTest, ValueWithoutACleanCutStaysOnOneLongerLine) {
 }
 
 TEST(IniWriteTest, TemporaryNameReplacesOrAppendsTheExtension) {
-    using kest_ini::TemporaryPathFor;
+    using kest::ini::TemporaryPathFor;
     EXPECT_EQ(TemporaryPathFor("/dir/name.ini"), "/dir/name.TMP");
     EXPECT_EQ(TemporaryPathFor("/dir/name"), "/dir/name.TMP");
     EXPECT_EQ(TemporaryPathFor("/dir/name.TMP"), "/dir/name.TMP.TMP");
@@ -186,3 +188,5 @@ TEST(IniWriteTest, UnwritableTargetsAndUnreadableNamesOrValuesAreRefused) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::config

@@ -8,7 +8,7 @@
 
 #include "config/NamedList.h"
 
-namespace kest_ini {
+namespace kest::ini {
 namespace {
 
 struct Named {
@@ -75,4 +75,4 @@ INSTANTIATE_TEST_SUITE_P(Lengths, NamedListTest,
                                            40));
 
 }  // namespace
-}  // namespace kest_ini
+}  // namespace kest::ini

@@ -9,7 +9,7 @@
 
 #include "ExpertHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 namespace {
 
 using ::testing::ElementsAre;
@@ -153,4 +153,4 @@ TEST_F(EthernetItemTest, PersistingAgainWaitsForTheRunningRestart) {
 }
 
 }  // namespace
-}  // namespace e2e
+}  // namespace kest::test::e2e

@@ -17,7 +17,7 @@
 #include "uxsys/HostString.h"
 #include "uxsys/Interfaces.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 
 using kest::hostkit::InterfaceRef;
 using kest::hostkit::kControllerCallLogPath;
@@ -118,4 +118,4 @@ class ExpertHostTest : public ::testing::Test {
     InterfaceRef<IuxSysExpert3> expert;
 };
 
-}  // namespace e2e
+}  // namespace kest::test::e2e

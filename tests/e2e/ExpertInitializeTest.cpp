@@ -15,7 +15,7 @@
 
 #include "ExpertHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 namespace {
 
 constexpr char kSettingsPath[] = "/etc/korvane/share/vqsysdiag.ini";
@@ -184,4 +184,4 @@ TEST_F(ExpertInitializeTest, PlantedEntriesInSharedDirectoriesLeaveTracingWithou
 }
 
 }  // namespace
-}  // namespace e2e
+}  // namespace kest::test::e2e

@@ -6,7 +6,7 @@
 
 #include "ExpertHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 namespace {
 
 using Names = std::vector<std::wstring>;
@@ -145,4 +145,4 @@ TEST_F(ExpertItemsTest, ExpertsShareOneItemManagerUntilTheLastIsReleased) {
 }
 
 }  // namespace
-}  // namespace e2e
+}  // namespace kest::test::e2e

@@ -10,6 +10,8 @@
 #include "hostkit/Plugin.h"
 #include "uxsys/Interfaces.h"
 
+namespace kest::test::e2e {
+
 namespace {
 
 // The operation at `slot` of an interface's virtual table, called without arguments.
@@ -186,3 +188,5 @@ TEST_F(ExpertObjectModelTest, ConcurrentHostThreadsKeepTheCountConsistent) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::e2e

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace kest::test::e2e {
+
 namespace {
 
 struct PipeCloser {
@@ -44,3 +46,5 @@ TEST(ExportedSymbolsTest, OnlyTheFactoryIsDefined) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::e2e

@@ -13,7 +13,7 @@
 
 #include "ExpertHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 
 constexpr char kToolPath[] = "/usr/local/korvane/bin/fwupdate";
 constexpr char kStatusFilePath[] = "/var/run/firmware_update/status";
@@ -168,4 +168,4 @@ class FirmwareHostTest : public ExpertHostTest {
     InterfaceRef<IuxSysExpertFirmware> firmware;
 };
 
-}  // namespace e2e
+}  // namespace kest::test::e2e

@@ -17,7 +17,7 @@
 
 #include "FirmwareHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 namespace {
 
 constexpr char kImage[] = "new firmware image";
@@ -519,4 +519,4 @@ TEST_F(FirmwareUpdateTest, DestroyingTheExpertWaitsForTheRunningTool) {
 }
 
 }  // namespace
-}  // namespace e2e
+}  // namespace kest::test::e2e

@@ -9,7 +9,7 @@
 
 #include "ExpertHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 namespace {
 
 constexpr int kGetImportableTagsSlot = 21;
@@ -143,4 +143,4 @@ TEST_F(ImportAndPlugPlayTest, PlugPlayCallbackIsHeldOnceUntilReplacedOrTheExpert
 }
 
 }  // namespace
-}  // namespace e2e
+}  // namespace kest::test::e2e

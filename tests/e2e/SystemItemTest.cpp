@@ -16,7 +16,7 @@
 
 #include "ExpertHost.h"
 
-namespace e2e {
+namespace kest::test::e2e {
 namespace {
 
 constexpr uint32_t kHostNameTag = 0x0101F000;
@@ -305,4 +305,4 @@ TEST_F(SystemItemTest, RejectsBadValuesWithTheirMessages) {
 }
 
 }  // namespace
-}  // namespace e2e
+}  // namespace kest::test::e2e

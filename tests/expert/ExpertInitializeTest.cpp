@@ -12,6 +12,8 @@
 #include "support/TraceGate.h"
 #include "trace/Tracer.h"
 
+namespace kest::test::expert {
+
 namespace {
 
 using nVQKESTSYSAPICHASSISEXPERT100::KestItemManager;
@@ -46,3 +48,5 @@ TEST(ExpertInitializeTest, WithoutSettingsFileTracesIniCacheFailuresToTheLogFile
 }
 
 }  // namespace
+
+}  // namespace kest::test::expert

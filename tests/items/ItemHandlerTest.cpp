@@ -5,7 +5,7 @@
 #include "property/BagAccess.h"
 #include "property/CuxDynamicPropertyBag.h"
 
-namespace items_test {
+namespace kest::test::items {
 namespace {
 
 TEST(ItemHandlerTest, BaseRowsCarryTheIdentityWithTheirTypes) {
@@ -66,4 +66,4 @@ INSTANTIATE_TEST_SUITE_P(
                       NameCase{L"eth0", L"eth1", false}, NameCase{L"eth0", L"", false}));
 
 }  // namespace
-}  // namespace items_test
+}  // namespace kest::test::items

@@ -8,7 +8,7 @@
 #include "ItemTestSupport.h"
 #include "property/CuxDynamicPropertyBag.h"
 
-namespace items_test {
+namespace kest::test::items {
 namespace {
 
 class ItemManagerBaseTest : public ::testing::Test {
@@ -137,4 +137,4 @@ INSTANTIATE_TEST_SUITE_P(
     [](const ::testing::TestParamInfo<RequestCase>& param) { return param.param.name; });
 
 }  // namespace
-}  // namespace items_test
+}  // namespace kest::test::items

@@ -12,7 +12,7 @@
 #include "items/ItemManagerBase.h"
 #include "uxsys/StatusCodes.h"
 
-namespace items_test {
+namespace kest::test::items {
 
 // A handler with the base behaviour that counts its destructions.
 class TestHandler : public ItemHandler {
@@ -62,4 +62,4 @@ class TestManager : public ItemManagerBase {
     std::atomic<int> enumerations{0};
 };
 
-}  // namespace items_test
+}  // namespace kest::test::items

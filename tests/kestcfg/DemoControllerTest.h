@@ -11,7 +11,7 @@
 #include "hostkit/DemoController.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace kestcfg_test {
+namespace kest::test::cfg {
 
 class DemoControllerTest : public testing::Test {
   protected:
@@ -29,4 +29,4 @@ class DemoControllerTest : public testing::Test {
     kest::test::TempSysroot sysroot_;
 };
 
-}  // namespace kestcfg_test
+}  // namespace kest::test::cfg

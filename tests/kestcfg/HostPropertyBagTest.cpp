@@ -9,6 +9,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -115,3 +117,5 @@ TEST(HostPropertyBagTest, CallerLockKeepsOtherThreadsOutUntilUnlocked) {
 }
 
 }  // namespace
+
+}  // namespace kest::cfg

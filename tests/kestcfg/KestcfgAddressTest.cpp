@@ -10,12 +10,11 @@
 #include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
+namespace kest::test::cfg {
+
 namespace {
 
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunResult;
-
-class KestcfgAddressTest : public kestcfg_test::DemoControllerTest {
+class KestcfgAddressTest : public kest::test::cfg::DemoControllerTest {
   protected:
     // The logged library calls that change the controller, without their times.
     std::vector<std::string> ControllerChanges() const {
@@ -88,3 +87,5 @@ TEST_F(KestcfgAddressTest, PairsThatDoNotFitTheGatewayAreRefusedWithTheirMessage
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

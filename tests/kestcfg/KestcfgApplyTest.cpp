@@ -8,13 +8,11 @@
 #include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
+namespace kest::test::cfg {
+
 namespace {
 
-using kestcfg_test::FlattenJson;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunResult;
-
-class KestcfgApplyTest : public kestcfg_test::DemoControllerTest {
+class KestcfgApplyTest : public kest::test::cfg::DemoControllerTest {
   protected:
     // Runs kestcfg on the second controller.
     RunResult OnSecond(std::vector<std::string> arguments) {
@@ -123,3 +121,5 @@ TEST_F(KestcfgApplyTest, FilesThatCannotBeAppliedAreUsageErrorsNamingTheProblem)
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

@@ -16,22 +16,15 @@
 #include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace {
+namespace kest::test::cfg {
 
-using kestcfg_test::CountOf;
-using kestcfg_test::FinishProgram;
-using kestcfg_test::FlattenJson;
-using kestcfg_test::PollUntil;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunningProgram;
-using kestcfg_test::RunResult;
-using kestcfg_test::StartKestcfg;
+namespace {
 
 constexpr char kPending[] = "/run/kest/pending-rollback.json";
 constexpr char kLastRollback[] = "/run/kest/last-rollback.json";
 constexpr char kInterfaceUp[] = "SetNetworkInterfaceState\t0\teth0\t1";
 
-class KestcfgConfirmTest : public kestcfg_test::DemoControllerTest {
+class KestcfgConfirmTest : public kest::test::cfg::DemoControllerTest {
   protected:
     // The process ids of watchers of this controller.
     std::vector<pid_t> Watchers() const {
@@ -41,7 +34,7 @@ class KestcfgConfirmTest : public kestcfg_test::DemoControllerTest {
             const pid_t pid = atoi(entry->d_name);
             std::string line =
                 pid > 0
-                    ? kestcfg_test::ReadWhole("/proc/" + std::string(entry->d_name) + "/cmdline")
+                    ? kest::test::cfg::ReadWhole("/proc/" + std::string(entry->d_name) + "/cmdline")
                     : "";
             std::replace(line.begin(), line.end(), '\0', ' ');
             if (line.find(sysroot_.Root() + " rollback --watch") != std::string::npos) {
@@ -60,7 +53,7 @@ class KestcfgConfirmTest : public kestcfg_test::DemoControllerTest {
 };
 
 TEST_F(KestcfgConfirmTest, ConfirmedInTimeTheChangeStaysAndOnlyOneChangeIsPending) {
-    if (!kestcfg_test::KestcfgStartsItself()) {
+    if (!kest::test::cfg::KestcfgStartsItself()) {
         GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
     }
     const RunResult set =
@@ -107,7 +100,7 @@ class KestcfgExpiryTest : public KestcfgConfirmTest,
                           public testing::WithParamInterface<ExpiryCase> {};
 
 TEST_P(KestcfgExpiryTest, UnconfirmedTheSavedSettingsReturnOnce) {
-    if (!kestcfg_test::KestcfgStartsItself()) {
+    if (!kest::test::cfg::KestcfgStartsItself()) {
         GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
     }
     sysroot_.WriteFile("/settings.json",
@@ -144,7 +137,7 @@ class KestcfgWatcherSurvivesTest : public KestcfgConfirmTest,
 
 // The signal goes to the starting kestcfg's process group, as a dropped session or a kill does.
 TEST_P(KestcfgWatcherSurvivesTest, TheStarterEndingByASignal) {
-    if (!kestcfg_test::KestcfgStartsItself()) {
+    if (!kest::test::cfg::KestcfgStartsItself()) {
         GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
     }
     RunningProgram starter =
@@ -164,7 +157,7 @@ INSTANTIATE_TEST_SUITE_P(Signals, KestcfgWatcherSurvivesTest, testing::Values(SI
 
 // The failing rollback is run at once, so that the fault cannot race the deadline.
 TEST_F(KestcfgConfirmTest, ARollbackThatFailsIsRecordedWithItsReasonAndNotRetried) {
-    if (!kestcfg_test::KestcfgStartsItself()) {
+    if (!kest::test::cfg::KestcfgStartsItself()) {
         GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
     }
     ASSERT_EQ(
@@ -187,7 +180,7 @@ TEST_F(KestcfgConfirmTest, ARollbackThatFailsIsRecordedWithItsReasonAndNotRetrie
 
 // A remote shell waits until every holder of the command's output has closed it.
 TEST_F(KestcfgConfirmTest, ACallerReadingThroughAPipeIsNotKeptWaiting) {
-    if (!kestcfg_test::KestcfgStartsItself()) {
+    if (!kest::test::cfg::KestcfgStartsItself()) {
         GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
     }
     int pipeEnds[2];
@@ -252,3 +245,5 @@ TEST_F(KestcfgConfirmTest, UsageErrors) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

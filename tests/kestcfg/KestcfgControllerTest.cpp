@@ -11,14 +11,12 @@
 #include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
+namespace kest::test::cfg {
+
 namespace {
 
-using kestcfg_test::FlattenJson;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunResult;
-
 const char kChassis[] = "VQ KEST Chassis";
-class KestcfgControllerTest : public kestcfg_test::DemoControllerTest {};
+class KestcfgControllerTest : public kest::test::cfg::DemoControllerTest {};
 
 // True when `text` has a table row: the tag, the name, the type and the value, blank-separated.
 bool HasRow(const std::string& text, const std::string& tag, const std::string& name,
@@ -436,3 +434,5 @@ TEST_F(KestcfgControllerTest, SetCommandLineMistakesAreUsageErrorsThatChangeNoth
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

@@ -11,15 +11,9 @@
 #include "common/TempSysroot.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace {
+namespace kest::test::cfg {
 
-using kestcfg_test::FinishProgram;
-using kestcfg_test::FlattenJson;
-using kestcfg_test::PollUntil;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunningProgram;
-using kestcfg_test::RunResult;
-using kestcfg_test::StartKestcfg;
+namespace {
 
 constexpr char kImage[] = "demo firmware\n";
 constexpr char kToolPath[] = "/usr/local/korvane/bin/fwupdate";
@@ -195,7 +189,7 @@ TEST_P(KestcfgFirmwareInterruptTest, TheToolFinishesItsStages) {
     ASSERT_TRUE(PollUntil([&] { return ToolHas("started"); }));
     ASSERT_EQ(0, kill(-running.pid, SIGINT));
     ASSERT_TRUE(PollUntil([&] {
-        return kestcfg_test::ErrorOutputSoFar(running).find("cannot be cancelled") !=
+        return kest::test::cfg::ErrorOutputSoFar(running).find("cannot be cancelled") !=
                std::string::npos;
     }));
     ASSERT_EQ(0, kill(-running.pid, GetParam()));
@@ -213,3 +207,5 @@ INSTANTIATE_TEST_SUITE_P(SecondSignal, KestcfgFirmwareInterruptTest,
                          });
 
 }  // namespace
+
+}  // namespace kest::test::cfg

@@ -7,12 +7,9 @@
 #include "common/TempSysroot.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace {
+namespace kest::test::cfg {
 
-using kestcfg_test::ReadWhole;
-using kestcfg_test::RunKestcfgAt;
-using kestcfg_test::RunProgram;
-using kestcfg_test::RunResult;
+namespace {
 
 TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorKeptApart) {
     kest::test::TempSysroot prefix;
@@ -71,3 +68,5 @@ TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorK
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

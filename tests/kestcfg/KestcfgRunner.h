@@ -16,7 +16,7 @@
 
 extern char** environ;
 
-namespace kestcfg_test {
+namespace kest::test::cfg {
 
 struct RunResult {
     int exitCode = -1;
@@ -198,4 +198,4 @@ inline std::string FlattenJson(const std::string& json) {
     return parsed.out;
 }
 
-}  // namespace kestcfg_test
+}  // namespace kest::test::cfg

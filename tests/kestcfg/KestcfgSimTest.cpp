@@ -11,13 +11,9 @@
 #include "common/TempSysroot.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace {
+namespace kest::test::cfg {
 
-using kestcfg_test::FlattenJson;
-using kestcfg_test::ReadWhole;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunProgram;
-using kestcfg_test::RunResult;
+namespace {
 
 mode_t PermissionsOf(const std::string& path) {
     struct stat status {};
@@ -93,7 +89,7 @@ TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {
         {"--sysroot", root, "firmware", "eth0", root + "/etc/korvane/version"},
         {"--sysroot", root, "firmware-status"},
     };
-    if (kestcfg_test::KestcfgStartsItself()) {
+    if (kest::test::cfg::KestcfgStartsItself()) {
         steps.push_back(
             {"--sysroot", root, "set", "eth0", "polling-interval=260", "--confirm-within", "60"});
         steps.push_back({"--sysroot", root, "confirm"});
@@ -137,3 +133,5 @@ TEST(KestcfgSimTest, FirmwareToolStandInLogsItsArgumentsAndEndsAtTheLastStage) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

@@ -4,11 +4,9 @@
 #include "common/TempSysroot.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace {
+namespace kest::test::cfg {
 
-using kestcfg_test::FlattenJson;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunResult;
+namespace {
 
 TEST(KestcfgTest, InfoPrintsTheExpertsIdentity) {
     const std::string expected =
@@ -144,3 +142,5 @@ TEST(KestcfgTest, EveryCommandHasItsOwnHelp) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::cfg

@@ -13,15 +13,9 @@
 #include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
-namespace {
+namespace kest::test::cfg {
 
-using kestcfg_test::CountOf;
-using kestcfg_test::FinishProgram;
-using kestcfg_test::PollUntil;
-using kestcfg_test::RunKestcfg;
-using kestcfg_test::RunningProgram;
-using kestcfg_test::RunResult;
-using kestcfg_test::StartKestcfg;
+namespace {
 
 constexpr char kChassis[] = "VQ KEST Chassis";
 constexpr char kLockPath[] = "/run/kest/kestcfg.lock";
@@ -32,7 +26,7 @@ struct Change {
     const char* stored;  // "Key=value" as the controller's state holds it afterwards
 };
 
-class KestcfgTurnsTest : public kestcfg_test::DemoControllerTest {
+class KestcfgTurnsTest : public kest::test::cfg::DemoControllerTest {
   protected:
     // Whether the controller's state holds the line "Key=value" (blanks around "=" allowed).
     bool StateHas(const std::string& keyAndValue) const {
@@ -99,7 +93,7 @@ TEST_F(KestcfgTurnsTest, AnotherKestcfgWaitsForItsTurnOrGivesUpWithNoWait) {
 
     RunningProgram waiting = StartKestcfg({"set", "eth0", "polling-interval=300"});
     ASSERT_TRUE(PollUntil([&] {
-        return kestcfg_test::ErrorOutputSoFar(waiting).find("waiting for another kestcfg") !=
+        return kest::test::cfg::ErrorOutputSoFar(waiting).find("waiting for another kestcfg") !=
                std::string::npos;
     }));
     EXPECT_TRUE(StateHas("PollingInterval=100")) << State();
@@ -143,3 +137,5 @@ INSTANTIATE_TEST_SUITE_P(Signals, KestcfgInterruptedSetTest,
                          });
 
 }  // namespace
+
+}  // namespace kest::test::cfg

@@ -11,6 +11,8 @@
 #include "hostkit/HostText.h"
 #include "hostkit/TimestampText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -138,3 +140,5 @@ TEST(PropertyCatalogueTest, NamesAndNumbersBothFindTags) {
 }
 
 }  // namespace
+
+}  // namespace kest::cfg

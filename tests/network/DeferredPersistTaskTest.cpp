@@ -7,7 +7,7 @@
 #include "NetworkTestSupport.h"
 #include "items/DeferredPersistTask.h"
 
-namespace network_test {
+namespace kest::test::network {
 namespace {
 
 using ::testing::ElementsAre;
@@ -114,4 +114,4 @@ TEST_F(DeferredTaskTest, FailuresOnTheTaskThreadAreOnlyTraced) {
 }
 
 }  // namespace
-}  // namespace network_test
+}  // namespace kest::test::network

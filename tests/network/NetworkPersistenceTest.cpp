@@ -9,7 +9,7 @@
 #include "NetworkTestSupport.h"
 #include "network/InterfaceSettings.h"
 
-namespace network_test {
+namespace kest::test::network {
 namespace {
 
 using ::testing::ElementsAre;
@@ -216,4 +216,4 @@ TEST_F(PersistenceTest, OtherTagsChangeNothingAndPollingIsSetAlone) {
 }
 
 }  // namespace
-}  // namespace network_test
+}  // namespace kest::test::network

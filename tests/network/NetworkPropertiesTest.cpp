@@ -4,7 +4,7 @@
 
 #include "NetworkTestSupport.h"
 
-namespace network_test {
+namespace kest::test::network {
 namespace {
 
 using ::testing::ElementsAre;
@@ -165,4 +165,4 @@ TEST_F(PropertiesTest, DescriptionsMatchByNameOrKindAndAdapterStateIsRead) {
 }
 
 }  // namespace
-}  // namespace network_test
+}  // namespace kest::test::network

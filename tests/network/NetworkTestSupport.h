@@ -38,7 +38,7 @@ constexpr uint32_t kPrimaryAdapter = 0x0D126000;
 constexpr uint32_t kEtherCATFlag = 0x0D155000;
 }  // namespace NetworkTag
 
-namespace network_test {
+namespace kest::test::network {
 
 constexpr char kStatePath[] = "/var/lib/vqtargetcfg/state.ini";
 constexpr char kCallLogPath[] = "/var/lib/vqtargetcfg/calls.log";
@@ -194,4 +194,4 @@ class NetworkTest : public ::testing::Test {
     kest::test::TempSysroot sysroot_;
 };
 
-}  // namespace network_test
+}  // namespace kest::test::network

@@ -4,7 +4,7 @@
 
 #include "NetworkTestSupport.h"
 
-namespace network_test {
+namespace kest::test::network {
 namespace {
 
 using ::testing::ElementsAre;
@@ -140,4 +140,4 @@ TEST_F(NetworkTest, RejectionsWriteTheirTraceLines) {
 }
 
 }  // namespace
-}  // namespace network_test
+}  // namespace kest::test::network

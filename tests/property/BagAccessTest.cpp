@@ -6,6 +6,8 @@
 #include "property/CuxDynamicPropertyBag.h"
 #include "property/PropertyTagEnumerator.h"
 
+namespace kest::test::property {
+
 namespace {
 
 TEST(BagAccessTest, BooleansAndStringsRoundTripAndFailuresClearTheResult) {
@@ -46,3 +48,5 @@ TEST(BagAccessTest, EnumeratorHasTagSearchesFromTheStart) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::property

@@ -8,6 +8,8 @@
 #include "property/ItemNameEnumerator.h"
 #include "property/PropertyTagEnumerator.h"
 
+namespace kest::test::property {
+
 namespace {
 
 // The names an enumerator yields from its position to the end, one Next at a time.
@@ -116,3 +118,5 @@ TEST(EnumeratorTest, FailedNameCopyFreesTheCallsStringsAndLosesNoName) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::property

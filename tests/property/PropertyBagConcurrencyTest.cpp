@@ -7,6 +7,8 @@
 #include "PropertyTestSupport.h"
 #include "property/CuxDynamicPropertyBag.h"
 
+namespace kest::test::property {
+
 namespace {
 
 constexpr uint32_t kCounterTag = 1;
@@ -99,3 +101,5 @@ TEST(PropertyBagConcurrencyTest, LockedSequencesAreSeenWholeAndNoWriteIsLost) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::property

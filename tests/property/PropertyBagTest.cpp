@@ -15,6 +15,8 @@
 #include "property/CuxDynamicPropertyBag.h"
 #include "uxsys/HostString.h"
 
+namespace kest::test::property {
+
 namespace {
 
 constexpr GUID kGuid = {0x12345678, 0x9abc, 0xdef0, {1, 2, 3, 4, 5, 6, 7, 8}};
@@ -261,3 +263,5 @@ TEST(PropertyBagTest, CallerLockMustBeHeldToBeReleased) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::property

@@ -7,6 +7,8 @@
 #include "uxsys/Enumerators.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::test::property {
+
 // The tags an enumerator yields from its position to the end (none for a null enumerator).
 inline std::vector<uint32_t> DrainTags(IuxSysEnumPropertyTag* tags) {
     std::vector<uint32_t> drained;
@@ -16,3 +18,5 @@ inline std::vector<uint32_t> DrainTags(IuxSysEnumPropertyTag* tags) {
     }
     return drained;
 }
+
+}  // namespace kest::test::property

@@ -12,7 +12,7 @@
 
 #include "SimFixture.h"
 
-namespace vqsim_test {
+namespace kest::test::sim {
 namespace {
 
 namespace tc = vq::targetcfg;
@@ -258,4 +258,4 @@ TEST(SimLibrary, IsLoadedUnderItsSoname) {
 }
 
 }  // namespace
-}  // namespace vqsim_test
+}  // namespace kest::test::sim

@@ -4,7 +4,7 @@
 
 #include "SimFixture.h"
 
-namespace vqsim_test {
+namespace kest::test::sim {
 namespace {
 
 namespace tc = vq::targetcfg;
@@ -274,4 +274,4 @@ TEST_F(SimTest, ValidateTimeZoneFallsBackToTheMachineDatabase) {
 }
 
 }  // namespace
-}  // namespace vqsim_test
+}  // namespace kest::test::sim

@@ -6,7 +6,7 @@
 
 #include "SimFixture.h"
 
-namespace vqsim_test {
+namespace kest::test::sim {
 namespace {
 
 namespace tc = vq::targetcfg;
@@ -172,4 +172,4 @@ TEST_F(SimTest, LanguageCodesMapToNamesIncludingAddedLanguages) {
 }
 
 }  // namespace
-}  // namespace vqsim_test
+}  // namespace kest::test::sim

@@ -12,7 +12,7 @@
 #include "common/TempSysroot.h"
 #include "vq/targetcfg/TargetConfig.h"
 
-namespace vqsim_test {
+namespace kest::test::sim {
 
 using vq::targetcfg::IPAddress;
 using vq::targetcfg::NarrowString;
@@ -50,4 +50,4 @@ class SimSysroot {
 
 class SimTest : public ::testing::Test, public SimSysroot {};
 
-}  // namespace vqsim_test
+}  // namespace kest::test::sim

@@ -11,6 +11,8 @@
 #include "com/CountedPtr.h"
 #include "property/CuxDynamicPropertyBag.h"
 
+namespace kest::test::stress {
+
 namespace {
 
 constexpr uint32_t kGroupTags[] = {0x100, 0x200, 0x300, 0x400};
@@ -125,3 +127,5 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::stress

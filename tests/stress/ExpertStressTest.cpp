@@ -13,10 +13,12 @@
 
 #include "e2e/ExpertHost.h"
 
+namespace kest::test::stress {
+
 namespace {
 
-using e2e::InterfaceRef;
-using e2e::kSystemItemName;
+using kest::test::e2e::InterfaceRef;
+using kest::test::e2e::kSystemItemName;
 
 constexpr uint32_t kHostNameTag = 0x0101F000;
 constexpr uint32_t kCommentTag = 0x0103D000;
@@ -42,10 +44,10 @@ class Failures {
     std::set<std::string> failed_;
 };
 
-class StressExpertTest : public e2e::ExpertHostTest {
+class StressExpertTest : public kest::test::e2e::ExpertHostTest {
   protected:
     void SetUp() override {
-        WriteControllerState(std::string(e2e::kSystemState) +
+        WriteControllerState(std::string(kest::test::e2e::kSystemState) +
                              "UserComment = initial\n[Device0]\nType = 1\nInterfaceName = eth0\n");
         sysroot.MakeDirectory("/etc/korvane/share");
         ExpertHostTest::SetUp();
@@ -61,7 +63,7 @@ class StressExpertTest : public e2e::ExpertHostTest {
         }
         CvqBStr text = nullptr;
         failures.Check(bag->GetString(tag, &text) == S_OK, "GetString");
-        return e2e::TakeWideHostString(text);
+        return kest::test::e2e::TakeWideHostString(text);
     }
 
     // A bag of changes made from the system item's properties with `write` applied.
@@ -99,7 +101,8 @@ TEST_F(StressExpertTest, ThreadsCreateQueryAndReleaseExperts) {
                 IuxSysEnumStringList* names = nullptr;
                 failures.Check(own->SearchForItemNames(&names) == S_OK, "SearchForItemNames");
                 if (names != nullptr) {
-                    failures.Check(e2e::TakeNames(names) == expectedNames, "item names");
+                    failures.Check(kest::test::e2e::TakeNames(names) == expectedNames,
+                                   "item names");
                 }
                 failures.Check(ReadText(own, kHostNameTag, failures) == L"kest-1", "host name");
                 const InterfaceRef<IuxSysPropertyBag> changes =
@@ -143,7 +146,7 @@ TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
             while (persisting || rounds < 5) {
                 ++rounds;
                 if (r % 2 == 0) {
-                    e2e::RecordingSink sink(S_OK);
+                    kest::test::e2e::RecordingSink sink(S_OK);
                     failures.Check(own->SearchForItemsAndProperties(&sink) == S_OK, "search");
                     failures.Check(sink.names.size() == 2, "items found");
                 }
@@ -175,3 +178,5 @@ TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::stress

@@ -20,6 +20,8 @@
 #include "config/IniTextPtr.h"
 #include "config/IniWriter.h"
 
+namespace kest::test::stress {
+
 namespace {
 
 constexpr int kKills = 60;
@@ -131,10 +133,10 @@ INSTANTIATE_TEST_SUITE_P(
     [](const ::testing::TestParamInfo<CrashCase>& param) { return std::string(param.param.name); });
 
 // The point at which the saving child kills itself.
-kest_ini::SaveStage killStage;
+kest::ini::SaveStage killStage;
 
 TEST(IniCrashSafetyStagesTest, SavesKilledAtFixedPointsLeaveOneWholeDocument) {
-    using kest_ini::SaveStage;
+    using kest::ini::SaveStage;
     for (uint32_t flags : {kIniWriteSafeReplacement,
                            kIniWriteSafeReplacement | kIniWriteUniqueTemporary | kIniWriteSync}) {
         for (SaveStage stage :
@@ -153,7 +155,7 @@ TEST(IniCrashSafetyStagesTest, SavesKilledAtFixedPointsLeaveOneWholeDocument) {
                 killStage = stage;
                 const pid_t child = fork();
                 if (child == 0) {
-                    kest_ini::SetSaveStageObserver([](SaveStage reached) {
+                    kest::ini::SetSaveStageObserver([](SaveStage reached) {
                         if (reached == killStage) {
                             raise(SIGKILL);
                         }
@@ -178,3 +180,5 @@ TEST(IniCrashSafetyStagesTest, SavesKilledAtFixedPointsLeaveOneWholeDocument) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::stress

@@ -17,6 +17,8 @@
 #include "config/IniTextPtr.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::test::stress {
+
 namespace {
 
 constexpr int kVersions = 3;
@@ -168,3 +170,5 @@ TEST(StressIniCacheTest, CachedReadsRaceSetsAndFlushes) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::stress

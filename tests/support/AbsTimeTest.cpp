@@ -7,6 +7,8 @@
 #include "support/AbsTime.h"
 #include "support/Exceptions.h"
 
+namespace kest::test::support {
+
 using vq::dsc::AbsTime;
 using vq::dsc::AbsTimeFormat;
 using vq::dsc::AbsTimeToString;
@@ -110,3 +112,5 @@ TEST(LocalDateTimeToAbsTime, NormalisesAndRoundTripsThroughLocalFormatting) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -5,6 +5,8 @@
 
 #include "support/Exceptions.h"
 
+namespace kest::test::support {
+
 using namespace vq::dsc;
 
 TEST(Exceptions, FixedTextsAndCodes) {
@@ -54,3 +56,5 @@ TEST(Exceptions, DerivedClassesAreCaughtThroughTheirBase) {
         EXPECT_STREQ("Out of range: cut", e.what());
     }
 }
+
+}  // namespace kest::test::support

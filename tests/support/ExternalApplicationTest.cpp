@@ -20,6 +20,8 @@
 #include "support/Exceptions.h"
 #include "support/TextConversion.h"
 
+namespace kest::test::support {
+
 namespace {
 
 using vq::dsc::WideFromNarrow;
@@ -268,3 +270,5 @@ TEST_F(HostStateTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSig
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -13,6 +13,8 @@
 #include "support/Guid.h"
 #include "support/HostInfo.h"
 
+namespace kest::test::support {
+
 using vq::dsc::Guid;
 using vq::dsc::GuidToString;
 
@@ -92,3 +94,5 @@ TEST(Guid, ProcessesStartDifferentClockSequences) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -5,6 +5,8 @@
 
 #include "vq/dsc/IPAddress.h"
 
+namespace kest::test::support {
+
 namespace {
 
 using vq::dsc::osdep::IPAddress;
@@ -21,3 +23,5 @@ TEST(IPAddressEmbeddedZeroTest, TextWithAZeroCharacterIsNoAddress) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -8,6 +8,8 @@
 
 #include "support/Exceptions.h"
 
+namespace kest::test::support {
+
 namespace {
 
 using vq::dsc::exception::InvalidArgument;
@@ -108,3 +110,5 @@ TEST(IPAddressTest, EqualityComparesFamilyZoneAndBytes) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

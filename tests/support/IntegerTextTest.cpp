@@ -6,6 +6,8 @@
 #include "support/Exceptions.h"
 #include "support/IntegerText.h"
 
+namespace kest::test::support {
+
 using vq::dsc::IntegerToString;
 using vq::dsc::StringToInteger;
 using vq::dsc::exception::UnableToConvert;
@@ -87,3 +89,5 @@ TEST(StringToInteger, StrictnessSignsAndPrefixes) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -15,6 +15,8 @@
 #include "support/ProcessControl.h"
 #include "support/TextConversion.h"
 
+namespace kest::test::support {
+
 namespace {
 
 using namespace vq::dsc::osdep;
@@ -165,3 +167,5 @@ TEST(KillProcessTest, KillsRunningProcessesOnly) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

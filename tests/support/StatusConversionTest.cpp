@@ -13,6 +13,8 @@
 #include "support/Exceptions.h"
 #include "support/StatusHolder.h"
 
+namespace kest::test::support {
+
 namespace {
 
 using Lines = std::vector<std::string>;
@@ -112,3 +114,5 @@ TEST_F(StatusConversion, EntryGuardConvertsEveryExceptionWithItsTrace) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -11,6 +11,8 @@
 #include "vq/dsc/StringBase.h"
 #include "vq/dsc/Vector.h"
 
+namespace kest::test::support {
+
 using vq::dsc::NarrowString;
 using vq::dsc::WideString;
 using vq::dsc::exception::OutOfRange;
@@ -206,3 +208,5 @@ TEST(Vector, ThreePointerLayoutGrowthAndOwnElements) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

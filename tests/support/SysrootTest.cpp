@@ -13,6 +13,8 @@
 #include "support/Exceptions.h"
 #include "support/SystemClock.h"
 
+namespace kest::test::support {
+
 namespace {
 
 // Sets or unsets an environment variable for one test and restores it afterwards.
@@ -126,3 +128,5 @@ TEST(SystemClockTest, ATimeBeyondTimeTIsRefusedNotWrapped) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -13,6 +13,8 @@
 #include "support/Sleep.h"
 #include "support/Thread.h"
 
+namespace kest::test::support {
+
 namespace {
 
 using vq::dsc::Mutex;
@@ -162,3 +164,5 @@ TEST(SleepTest, SignalDoesNotCutTheSleepShort) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::support

@@ -8,6 +8,8 @@
 
 #include "support/TraceGate.h"
 
+namespace kest::test::support {
+
 class TraceCaptureTest : public ::testing::Test {
   protected:
     // The texts written since the last CaptureWithMask, in order.
@@ -21,3 +23,5 @@ class TraceCaptureTest : public ::testing::Test {
     }
     void TearDown() override { SetTraceGate(0, nullptr); }
 };
+
+}  // namespace kest::test::support

@@ -19,8 +19,8 @@
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
-using test::kWebServicePath;
-using test::ThrownStatus;
+using kest::test::system::kWebServicePath;
+using kest::test::system::ThrownStatus;
 
 constexpr char kEnabledFile[] = "[WebService]\nEnable = 1\n\n";
 constexpr char kDisabledFile[] = "[WebService]\nEnable = 0\n\n";

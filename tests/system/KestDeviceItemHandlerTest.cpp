@@ -15,7 +15,7 @@
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
-using test::ThrownStatus;
+using kest::test::system::ThrownStatus;
 using Value = std::variant<bool, int32_t, uint32_t, std::wstring>;
 
 struct Row {
@@ -65,7 +65,8 @@ std::vector<uint32_t> Tags(IuxSysPropertyBag4* bag) {
     return tags;
 }
 
-class KestDeviceItemHandlerTest : public ::testing::Test, public test::SystemItemSysroot {
+class KestDeviceItemHandlerTest : public ::testing::Test,
+                                  public kest::test::system::SystemItemSysroot {
   protected:
     // The catalogue of a new handler (read into a new bag) and the status of the read.
     HRESULT ReadCatalogue() {
@@ -123,7 +124,7 @@ TEST_F(KestDeviceItemHandlerTest, ReportsEveryCatalogueRowWithItsTypeAndValue) {
     std::sort(expectedTags.begin(), expectedTags.end());
     EXPECT_EQ(expectedTags, Tags(bag_.Get()));
 
-    sysroot_.WriteFile(test::kWebServicePath, "[WebService]\nEnable = 1\n");
+    sysroot_.WriteFile(kest::test::system::kWebServicePath, "[WebService]\nEnable = 1\n");
     ASSERT_EQ(S_OK, ReadCatalogue());
     EXPECT_EQ(Value(true), ReadValue(bag_.Get(), 0x21004000));
 }
@@ -143,7 +144,7 @@ TEST_F(KestDeviceItemHandlerTest, PrefixesTheDescriptionAndFormatsTheSerialNumbe
         {"", "16", L"VQ ", L"00000010"},
     };
     for (const Case& c : cases) {
-        WriteState(test::SystemState(
+        WriteState(kest::test::system::SystemState(
             {{"DeviceDescription", c.description}, {"SerialNumber", c.serialNumber}}));
         ASSERT_EQ(S_OK, ReadCatalogue()) << c.description;
         EXPECT_EQ(c.reportedDescription, Text(0x01006000));
@@ -166,8 +167,8 @@ TEST_F(KestDeviceItemHandlerTest, BuildsLocaleCodesInTheLibrarysOrder) {
         {"", "Chinese", L"", L"zh"},
     };
     for (const Case& c : cases) {
-        WriteState(
-            test::SystemState({{"SupportedLanguages", c.supported}, {"LanguageName", c.current}}));
+        WriteState(kest::test::system::SystemState(
+            {{"SupportedLanguages", c.supported}, {"LanguageName", c.current}}));
         ASSERT_EQ(S_OK, ReadCatalogue()) << c.supported;
         EXPECT_EQ(c.codes, Text(0x0D11E000)) << c.supported;
         EXPECT_EQ(c.currentCode, Text(0x0D11D000)) << c.supported;
@@ -175,7 +176,7 @@ TEST_F(KestDeviceItemHandlerTest, BuildsLocaleCodesInTheLibrarysOrder) {
 }
 
 TEST_F(KestDeviceItemHandlerTest, AnUnknownCurrentLanguageFailsAfterTheComment) {
-    WriteState(test::SystemState({{"LanguageName", "Klingon"}}));
+    WriteState(kest::test::system::SystemState({{"LanguageName", "Klingon"}}));
     EXPECT_EQ(E_FAIL, ReadCatalogue());
     EXPECT_TRUE(bag_->HasTag(0x0103D000) == S_OK) << "row 15 is written";
     EXPECT_EQ(S_FALSE, bag_->HasTag(0x0D11D000));
@@ -195,7 +196,8 @@ TEST_F(KestDeviceItemHandlerTest, TestedLibraryFailuresEndTheCatalogue) {
         {"GetTimeZone", 0x0D12B000, 0x0D120000},
     };
     for (const Case& c : cases) {
-        WriteState(test::SystemState({}, std::string("[Faults]\n") + c.call + " = -375501\n"));
+        WriteState(kest::test::system::SystemState(
+            {}, std::string("[Faults]\n") + c.call + " = -375501\n"));
         EXPECT_EQ(ConvertStatusCode(-375501), ReadCatalogue()) << c.call;
         EXPECT_EQ(S_OK, bag_->HasTag(c.lastWritten)) << c.call;
         EXPECT_EQ(S_FALSE, bag_->HasTag(c.firstMissing)) << c.call;
@@ -256,7 +258,8 @@ TEST_F(KestDeviceItemHandlerTest, RefreshWritesTheRequestedTimeAndDnsNameBeforeT
 }
 
 TEST_F(KestDeviceItemHandlerTest, ARefreshWhoseDnsNameFailsWritesNoCatalogue) {
-    WriteState(test::SystemState({}, "[Faults]\nGetFullyQualifiedDNSName = -375501\n"));
+    WriteState(
+        kest::test::system::SystemState({}, "[Faults]\nGetFullyQualifiedDNSName = -375501\n"));
     ASSERT_EQ(S_OK, ReadCatalogue());
     CountedPtr<IuxSysPropertyBag4> refreshed = CreatePropertyBag();
     const uint32_t requested[] = {0x0D114000};

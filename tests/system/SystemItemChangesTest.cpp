@@ -17,7 +17,7 @@ namespace {
 constexpr int64_t kEpoch = vq::dsc::AbsTime::kUnixEpochSeconds;
 constexpr uxSysAttrTimestampUTC k2023{0, kEpoch + 1700000000};
 
-class SystemItemChangesTest : public ::testing::Test, public test::SystemItemSysroot {
+class SystemItemChangesTest : public ::testing::Test, public kest::test::system::SystemItemSysroot {
   protected:
     SystemItemChangesTest() {
         sysroot_.WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
@@ -39,7 +39,7 @@ class SystemItemChangesTest : public ::testing::Test, public test::SystemItemSys
                                                 adapterDisabled);
     }
     std::wstring Message() const { return message_.Get() ? message_.Get() : L"(none)"; }
-    std::string Clock() const { return sysroot_.ReadFile(test::kClockFile); }
+    std::string Clock() const { return sysroot_.ReadFile(kest::test::system::kClockFile); }
 
     CountedPtr<KestDeviceItemHandler> handler_ = MakeCounted<KestDeviceItemHandler>();
     CountedPtr<IuxSysPropertyBag4> changes_ = CreatePropertyBag();
@@ -124,7 +124,7 @@ TEST_F(SystemItemChangesTest, StopsAtTheFirstRejectionWithItsStatusAndMessage) {
 }
 
 TEST_F(SystemItemChangesTest, NothingModifiedIsNothingToDo) {
-    sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+    sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
     changes_->SetString(SystemTag::kHostName, L"kest-02");
     changes_->ClearAllModified();
     EXPECT_EQ(S_FALSE, Validate());
@@ -181,8 +181,8 @@ TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
     };
     sysroot_.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
-        WriteState(test::SystemState({}, c.faults));
-        sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+        WriteState(kest::test::system::SystemState({}, c.faults));
+        sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
         changes_ = CreatePropertyBag();
         for (const auto& [tag, text] : c.texts) {
             changes_->SetString(tag, text);
@@ -195,12 +195,13 @@ TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
 }
 
 TEST_F(SystemItemChangesTest, RewritesTheWebServiceSwitchEvenWhenUnchanged) {
-    sysroot_.WriteFile(test::kWebServicePath, "; old\n[WebService]\nEnable = 0\n");
+    sysroot_.WriteFile(kest::test::system::kWebServicePath, "; old\n[WebService]\nEnable = 0\n");
     handler_ = MakeCounted<KestDeviceItemHandler>();
     changes_->SetBool(SystemTag::kWebServiceEnabled, 0);
     EXPECT_EQ(S_OK, Persist());
     EXPECT_EQ(1, persistFlag_);
-    EXPECT_EQ("[WebService]\nEnable = 0\n\n", sysroot_.ReadFile(test::kWebServicePath));
+    EXPECT_EQ("[WebService]\nEnable = 0\n\n",
+              sysroot_.ReadFile(kest::test::system::kWebServicePath));
 }
 
 TEST_F(SystemItemChangesTest, SetsTheClockLastAfterTheWebServiceSwitch) {
@@ -208,7 +209,8 @@ TEST_F(SystemItemChangesTest, SetsTheClockLastAfterTheWebServiceSwitch) {
     changes_->SetBool(SystemTag::kWebServiceEnabled, 1);
     EXPECT_EQ(S_OK, Persist());
     EXPECT_EQ("1700000000 0\n", Clock()) << "no legacy zone change, no correction";
-    EXPECT_EQ("[WebService]\nEnable = 1\n\n", sysroot_.ReadFile(test::kHardwareClockLog))
+    EXPECT_EQ("[WebService]\nEnable = 1\n\n",
+              sysroot_.ReadFile(kest::test::system::kHardwareClockLog))
         << "the switch was saved when the hardware clock was written";
     EXPECT_EQ(1, persistFlag_);
 }
@@ -230,8 +232,8 @@ TEST_F(SystemItemChangesTest, CorrectsTheClockByTheLegacyOffsetDifference) {
         {"EST5EDT", L"  Pst8Pdt ", "1700010800 0\n", "SetTimeZone\t0\tAmerica/Los_Angeles"},
     };
     for (const Case& c : cases) {
-        WriteState(test::SystemState({{"TimeZone", c.currentZone}}));
-        sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+        WriteState(kest::test::system::SystemState({{"TimeZone", c.currentZone}}));
+        sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
         changes_ = CreatePropertyBag();
         changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
         changes_->SetString(SystemTag::kLegacyTimeZone, c.newLegacyText);

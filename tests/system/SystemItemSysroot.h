@@ -12,8 +12,7 @@
 #include "sim/SimFixture.h"
 #include "uxsys/StatusCodes.h"
 
-namespace nVQKESTSYSAPICHASSISEXPERT100 {
-namespace test {
+namespace kest::test::system {
 
 constexpr char kTimeZoneTablePath[] = "/usr/share/vqsysapi/timezone.ini";
 constexpr char kWebServicePath[] = "/etc/korvane/share/vqkest.ini";
@@ -71,7 +70,7 @@ HRESULT ThrownStatus(Call&& call) {
     return S_OK;
 }
 
-class SystemItemSysroot : public vqsim_test::SimSysroot {
+class SystemItemSysroot : public kest::test::sim::SimSysroot {
   public:
     SystemItemSysroot() {
         WriteState(SystemState());
@@ -111,7 +110,9 @@ class SystemItemSysroot : public vqsim_test::SimSysroot {
     }
 };
 
-}  // namespace test
+}  // namespace kest::test::system
+
+namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
 // The system item's setting tags, written out here as an independent check of the plug-in's.
 namespace SystemTag {

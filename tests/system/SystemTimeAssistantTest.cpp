@@ -14,11 +14,12 @@
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
-using test::ThrownStatus;
+using kest::test::system::ThrownStatus;
 
 constexpr int64_t kEpoch = vq::dsc::AbsTime::kUnixEpochSeconds;
 
-class SystemTimeAssistantTest : public ::testing::Test, public test::SystemItemSysroot {
+class SystemTimeAssistantTest : public ::testing::Test,
+                                public kest::test::system::SystemItemSysroot {
   protected:
     SystemTimeAssistant assistant_;
 };
@@ -71,14 +72,14 @@ TEST_F(SystemTimeAssistantTest, TranslatesTheCurrentZoneThroughTheTable) {
 }
 
 TEST_F(SystemTimeAssistantTest, WithoutTableEveryZoneIsCut0AndEveryLegacyTextUnknown) {
-    sysroot_.WriteFile(test::kTimeZoneTablePath, "");
+    sysroot_.WriteFile(kest::test::system::kTimeZoneTablePath, "");
     EXPECT_EQ("CUT0", assistant_.GetLegacyTimeZone());
     EXPECT_EQ(UX_E_VALUE_INVALID,
               assistant_.ValidateOlsonOrLegacyTimeZone("CST6CDT", false, nullptr));
 }
 
 TEST_F(SystemTimeAssistantTest, AnEmptyTableEntryCountsAsMissing) {
-    sysroot_.WriteFile(test::kTimeZoneTablePath, "[LegacyToOlson]\nPST8PDT =\n");
+    sysroot_.WriteFile(kest::test::system::kTimeZoneTablePath, "[LegacyToOlson]\nPST8PDT =\n");
     std::string olsonName = "untouched";
     EXPECT_EQ(S_FALSE, assistant_.LookupLegacyToOlson("PST8PDT", olsonName));
     EXPECT_EQ("untouched", olsonName);
@@ -130,8 +131,8 @@ TEST_F(SystemTimeAssistantTest, PersistsATimeZoneOnlyWhenItChangesToAKnownName) 
          nullptr},
     };
     for (const Case& c : cases) {
-        WriteState(test::SystemState());
-        sysroot_.WriteFile(vqsim_test::kCallLogPath, "");
+        WriteState(kest::test::system::SystemState());
+        sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
         CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
         if (c.value != nullptr) {
             bag->SetString(c.tag, c.value);
@@ -165,8 +166,10 @@ TEST_F(SystemTimeAssistantTest, PersistingATimeZoneRejectsOtherTagsAndNullBags) 
 
 class ClockTest : public SystemTimeAssistantTest {
   protected:
-    std::string Clock() const { return sysroot_.ReadFile(test::kClockFile); }
-    std::string HardwareClockCalls() const { return sysroot_.ReadFile(test::kHardwareClockLog); }
+    std::string Clock() const { return sysroot_.ReadFile(kest::test::system::kClockFile); }
+    std::string HardwareClockCalls() const {
+        return sysroot_.ReadFile(kest::test::system::kHardwareClockLog);
+    }
 };
 
 TEST_F(ClockTest, SetsTheSystemClockInUnixSecondsAndWholeMicroseconds) {
@@ -192,14 +195,15 @@ TEST_F(ClockTest, CopiesToTheHardwareClockWhenARealTimeClockNodeIsReadable) {
         {"/dev/misc/rtc", false, "--systohc --noadjfile --utc\n"},
     };
     for (const Case& c : cases) {
-        test::SystemItemSysroot fresh;
+        kest::test::system::SystemItemSysroot fresh;
         fresh.sysroot_.WriteFile(c.node, "");
         if (c.adjtime) {
             fresh.sysroot_.WriteFile("/etc/adjtime", "0.0 0 0.0\n0\nUTC\n");
         }
         SystemTimeAssistant::SetCurrentSystemTime(vq::dsc::AbsTime{0, kEpoch + 60});
-        EXPECT_EQ("60 0\n", fresh.sysroot_.ReadFile(test::kClockFile)) << c.node;
-        EXPECT_EQ(c.arguments, fresh.sysroot_.ReadFile(test::kHardwareClockLog)) << c.node;
+        EXPECT_EQ("60 0\n", fresh.sysroot_.ReadFile(kest::test::system::kClockFile)) << c.node;
+        EXPECT_EQ(c.arguments, fresh.sysroot_.ReadFile(kest::test::system::kHardwareClockLog))
+            << c.node;
         EXPECT_TRUE(SystemTimeAssistant::HasRealTimeClock());
     }
     EXPECT_FALSE(SystemTimeAssistant::HasRealTimeClock());

@@ -41,7 +41,7 @@ class TimeZoneTableTest : public ::testing::Test {
         return seconds;
     }
 
-    test::SystemItemSysroot sysroot_;
+    kest::test::system::SystemItemSysroot sysroot_;
     SystemTimeAssistant assistant_;
     IniTextPtr table_{IniText_Create()};
     std::map<std::string, std::string> legacyToOlson_;

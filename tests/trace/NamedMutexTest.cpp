@@ -13,6 +13,8 @@
 #include "support/Exceptions.h"
 #include "trace/NamedMutex.h"
 
+namespace kest::test::trace {
+
 using kest::test::TempSysroot;
 using vq::dsc::NamedMutex;
 using vq::dsc::ScopedNamedLock;
@@ -186,3 +188,5 @@ TEST(NamedMutexTest, FileLockIsHeldUntilTheOutermostUnlock) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::trace

@@ -16,6 +16,8 @@
 #include <string>
 #include <vector>
 
+namespace kest::test::trace {
+
 // Runs `body` in a forked child so that it starts with a fresh tracer; failures are reported by
 // the child and make the test fail here.
 inline void RunInChild(const std::function<void()>& body) {
@@ -100,3 +102,5 @@ inline std::vector<std::string> LinesOf(const std::string& text) {
     }
     return lines;
 }
+
+}  // namespace kest::test::trace

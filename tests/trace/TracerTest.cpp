@@ -18,6 +18,8 @@
 #include "trace/Tracer.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::test::trace {
+
 using kest::test::TempSysroot;
 
 namespace {
@@ -95,7 +97,7 @@ TEST(TracerTest, NothingBeforeInitialisationOrUnderMaskZeroThenWholeRecords) {
 TEST(TracerTest, ShortSpaceAtTheFirstLineCreatesNoFileButStandardErrorGoesOn) {
     RunInChild([] {
         TracerFixture fixture;
-        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        kest::trace::SetFreeSpaceMeasure(&FakeMeasure);
         reportedFreeBytes = 1000;
         InitializeTracing(kTraceErrors, kTraceToLogFile | kTraceToStandardError,
                           Wide(fixture.LogDirectory()), 2000);
@@ -110,7 +112,7 @@ TEST(TracerTest, ShortSpaceAtTheFirstLineCreatesNoFileButStandardErrorGoesOn) {
 TEST(TracerTest, ThresholdZeroNeverMeasuresAndTheAbortMessageEndsTheFile) {
     RunInChild([] {
         TracerFixture fixture;
-        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        kest::trace::SetFreeSpaceMeasure(&FakeMeasure);
         reportedFreeBytes = 0;
         uint32_t outputs = kTraceToLogFile | kTraceToStandardError;
         InitializeTracing(kTraceErrors, outputs, Wide(fixture.LogDirectory()), 0);
@@ -123,7 +125,7 @@ TEST(TracerTest, ThresholdZeroNeverMeasuresAndTheAbortMessageEndsTheFile) {
         TraceLine(' ', "short", false);
         reportedFreeBytes = 1u << 30;
         TraceLine(' ', "later", false);
-        const std::string abort = kest_trace::kAbortMessage;
+        const std::string abort = kest::trace::kAbortMessage;
         EXPECT_EQ(fixture.LogText(), "  unmeasured\n  enough\n" + abort + "\n");
         EXPECT_EQ(fixture.Errors().Text(), "  unmeasured\n  enough\n" + abort + "\n  later\n");
     });
@@ -132,7 +134,7 @@ TEST(TracerTest, ThresholdZeroNeverMeasuresAndTheAbortMessageEndsTheFile) {
 TEST(TracerTest, WithAThresholdEveryLineOfARecordIsMeasuredBeforeItIsWritten) {
     RunInChild([] {
         TracerFixture fixture;
-        kest_trace::SetFreeSpaceMeasure(&FakeMeasure);
+        kest::trace::SetFreeSpaceMeasure(&FakeMeasure);
         reportedFreeBytes = 4096;
         InitializeTracing(kTraceErrors, kTraceToLogFile, Wide(fixture.LogDirectory()), 4096);
         TraceIfEnabled("record", kTraceErrors);
@@ -209,7 +211,7 @@ TEST(TracerTest, OverlongPathTurnsFileOutputOffAndOtherOutputsGoOn) {
     RunInChild([] {
         TracerFixture fixture;
         std::string deep = fixture.LogDirectory();
-        while (deep.size() < kest_trace::kMaxLogPathLength - 30) {
+        while (deep.size() < kest::trace::kMaxLogPathLength - 30) {
             deep += "/abcdefghij";
         }
         vq::dsc::osdep::CreateDirectories(deep, 0755);
@@ -306,3 +308,5 @@ TEST(TracerTest, ProcessesTracingToOneLogNeverInterleaveInsideARecord) {
 }
 
 }  // namespace
+
+}  // namespace kest::test::trace

@@ -22,6 +22,8 @@
 #include "ValueText.h"
 #include "hostkit/HostText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -283,3 +285,5 @@ void ApplySettings(CommandContext& context, const Json& desired, const std::stri
         context.out << "The change takes full effect after the controller restarts.\n";
     }
 }
+
+}  // namespace kest::cfg

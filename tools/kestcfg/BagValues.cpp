@@ -6,6 +6,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 HRESULT ReadBagValue(IuxSysPropertyBag2* bag, uint32_t tag, PropertyValue* value) {
@@ -110,3 +112,5 @@ std::vector<uint32_t> AllTags(IuxSysPropertyBag* bag) {
     }
     return RemainingTags(tags.Get());
 }
+
+}  // namespace kest::cfg

@@ -8,6 +8,8 @@
 #include "uxsys/Enumerators.h"
 #include "uxsys/PropertyBag.h"
 
+namespace kest::cfg {
+
 // Reads the tag's value with the bag's getter for the tag's type code. Returns the status of the
 // failing bag operation, E_UNEXPECTED for a type code outside 1 to 7, or S_OK.
 HRESULT ReadBagValue(IuxSysPropertyBag2* bag, uint32_t tag, kest::hostkit::PropertyValue* value);
@@ -22,3 +24,5 @@ std::vector<uint32_t> RemainingTags(IuxSysEnumPropertyTag* tags);
 
 // All tags of the bag in the bag's order. Throws a failure when the bag reports an error.
 std::vector<uint32_t> AllTags(IuxSysPropertyBag* bag);
+
+}  // namespace kest::cfg

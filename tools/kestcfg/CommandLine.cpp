@@ -7,6 +7,8 @@
 #include "ConfirmOptions.h"
 #include "ExitCodes.h"
 
+namespace kest::cfg {
+
 namespace {
 
 constexpr char kFooter[] =
@@ -154,3 +156,5 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
     }
     return line;
 }
+
+}  // namespace kest::cfg

@@ -8,6 +8,8 @@
 
 #include "Commands.h"
 
+namespace kest::cfg {
+
 struct CommandLine {
     CommandOptions options;
     bool version = false;
@@ -19,3 +21,5 @@ struct CommandLine {
 // Parses argv. A mistake throws a usage error whose message ends with a hint at the help of the
 // command concerned.
 CommandLine ParseCommandLine(int argc, const char* const* argv);
+
+}  // namespace kest::cfg

@@ -1,5 +1,7 @@
 #include "Commands.h"
 
+namespace kest::cfg {
+
 const std::vector<CommandDescription>& AllCommands() {
     static const char kItemHelp[] = "the item: its name as 'kestcfg items' lists it, or chassis";
     static const std::vector<CommandDescription> commands = {
@@ -73,3 +75,5 @@ const std::vector<CommandDescription>& AllCommands() {
     };
     return commands;
 }
+
+}  // namespace kest::cfg

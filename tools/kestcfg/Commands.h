@@ -11,6 +11,8 @@
 #include "JsonOutput.h"
 #include "uxsys/Expert.h"
 
+namespace kest::cfg {
+
 // What a command needs of the plug-in.
 enum class ExpertUse {
     kNone,      // the plug-in is not loaded
@@ -80,3 +82,5 @@ void RunSim(CommandContext& context);
 void RunConfirm(CommandContext& context);
 void RunPending(CommandContext& context);
 void RunRollback(CommandContext& context);
+
+}  // namespace kest::cfg

@@ -21,6 +21,8 @@
 #include "support/Sysroot.h"
 #include "trace/Tracer.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -239,3 +241,5 @@ void RunRollback(CommandContext& context) {
         throw CommandFailure(kExitFailure, "the saved settings were not restored");
     }
 }
+
+}  // namespace kest::cfg

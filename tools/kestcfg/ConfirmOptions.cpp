@@ -1,5 +1,7 @@
 #include "ConfirmOptions.h"
 
+namespace kest::cfg {
+
 void AddConfirmOptions(const std::string& name, CLI::App& command, CommandOptions& options) {
     if (name == "set" || name == "apply") {
         command
@@ -22,3 +24,5 @@ void AddConfirmOptions(const std::string& name, CLI::App& command, CommandOption
         command.add_option("--watch", options.watch)->group("");
     }
 }
+
+}  // namespace kest::cfg

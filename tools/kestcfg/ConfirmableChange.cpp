@@ -17,6 +17,8 @@
 #include "hostkit/HostText.h"
 #include "support/ExternalApplication.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -169,3 +171,5 @@ ConfirmWatch PrepareConfirmableChange(CommandContext& context,
                                         {"items", ExportSettings(context.expert, items)["items"]}});
     return ConfirmWatch(&context, id, deadline);
 }
+
+}  // namespace kest::cfg

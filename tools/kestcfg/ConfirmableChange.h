@@ -11,6 +11,8 @@
 #include "Commands.h"
 #include "hostkit/PropertyValue.h"
 
+namespace kest::cfg {
+
 // The values a command is about to persist on one item.
 struct ItemRequest {
     std::wstring item;
@@ -39,3 +41,5 @@ class ConfirmWatch {
 // has a pending change, which its rollback will undo.
 ConfirmWatch PrepareConfirmableChange(CommandContext& context,
                                       const std::vector<ItemRequest>& requests);
+
+}  // namespace kest::cfg

@@ -3,6 +3,8 @@
 #include <stdlib.h>
 #include <sys/stat.h>
 
+namespace kest::cfg {
+
 std::string ControllerPath(const std::string& systemPath) {
     const char* root = getenv("KEST_SYSROOT");
     return (root != nullptr ? std::string(root) : std::string()) + systemPath;
@@ -18,3 +20,5 @@ std::vector<std::string> MissingControllerFiles() {
     }
     return missing;
 }
+
+}  // namespace kest::cfg

@@ -12,6 +12,8 @@
 
 #include "ExitCodes.h"
 
+namespace kest::cfg {
+
 namespace {
 
 constexpr char kRunDirectory[] = "/run/kest";
@@ -76,3 +78,5 @@ ControllerTurn::~ControllerTurn() {
 void ControllerTurn::End() {
     descriptor_.Reset();
 }
+
+}  // namespace kest::cfg

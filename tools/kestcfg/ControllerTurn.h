@@ -8,6 +8,8 @@
 
 #include "support/FileDescriptor.h"
 
+namespace kest::cfg {
+
 class ControllerTurn {
   public:
     // Waits for the turn, saying once on `err` that it waits for another kestcfg; with `noWait`
@@ -24,3 +26,5 @@ class ControllerTurn {
   private:
     kest::FileDescriptor descriptor_;
 };
+
+}  // namespace kest::cfg

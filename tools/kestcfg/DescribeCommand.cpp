@@ -14,6 +14,8 @@
 #include "kest/ChassisTags.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -160,3 +162,5 @@ void RunDescribe(CommandContext& context) {
         }
     }
 }
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 
 #include "support/WholeTransfer.h"
 
+namespace kest::cfg {
+
 DocumentOutput::DocumentOutput(bool keep) {
     if (!keep) {
         return;
@@ -26,3 +28,5 @@ void DocumentOutput::Write(const std::string& text) {
     // A reader that went away costs only the document.
     static_cast<void>(kest::WriteWhole(descriptor_.Get(), text));
 }
+
+}  // namespace kest::cfg

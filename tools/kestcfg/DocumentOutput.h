@@ -7,6 +7,8 @@
 
 #include "support/FileDescriptor.h"
 
+namespace kest::cfg {
+
 class DocumentOutput {
   public:
     // With `keep`, moves standard output aside and points descriptor 1 at standard error.
@@ -20,3 +22,5 @@ class DocumentOutput {
   private:
     kest::FileDescriptor descriptor_;  // the real standard output when it was moved aside
 };
+
+}  // namespace kest::cfg

@@ -1,5 +1,7 @@
 #include "ExitCodes.h"
 
+namespace kest::cfg {
+
 CommandFailure UsageError(const std::string& message) {
     return CommandFailure(kExitUsageError, message);
 }
@@ -7,3 +9,5 @@ CommandFailure UsageError(const std::string& message) {
 CommandFailure Failure(const std::string& message) {
     return CommandFailure(kExitFailure, message);
 }
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 
 #include "uxsys/Types.h"
 
+namespace kest::cfg {
+
 enum ExitCode : int {
     kExitSuccess = 0,
     kExitRejectedValue = 1,  // a value rejected by validation
@@ -40,3 +42,5 @@ class CommandFailure : public std::runtime_error {
 CommandFailure UsageError(const std::string& message);
 // The plug-in or the system failed (exit code 3).
 CommandFailure Failure(const std::string& message);
+
+}  // namespace kest::cfg

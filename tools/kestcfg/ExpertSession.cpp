@@ -3,6 +3,8 @@
 #include "ExitCodes.h"
 #include "StatusNames.h"
 
+namespace kest::cfg {
+
 ExpertSession::ExpertSession(IuxSysExpert3* expert) : expert_(expert) {
     const HRESULT status = expert_->Initialize();
     if (status < 0) {
@@ -13,3 +15,5 @@ ExpertSession::ExpertSession(IuxSysExpert3* expert) : expert_(expert) {
 ExpertSession::~ExpertSession() {
     expert_->Uninitialize();
 }
+
+}  // namespace kest::cfg

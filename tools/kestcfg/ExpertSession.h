@@ -3,6 +3,8 @@
 
 #include "uxsys/Expert.h"
 
+namespace kest::cfg {
+
 class ExpertSession {
   public:
     // Calls Initialize; throws a failure with the status when it fails.
@@ -15,3 +17,5 @@ class ExpertSession {
   private:
     IuxSysExpert3* expert_;
 };
+
+}  // namespace kest::cfg

@@ -10,6 +10,8 @@
 #include "ValueText.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 Json ExportSettings(IuxSysExpert3* expert, const std::vector<std::wstring>& items) {
@@ -49,3 +51,5 @@ void RunExport(CommandContext& context) {
         context.out << JsonText(context.document, 2) << "\n";
     }
 }
+
+}  // namespace kest::cfg

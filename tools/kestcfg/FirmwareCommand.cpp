@@ -24,6 +24,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -253,3 +255,5 @@ void RunFirmwareStatus(CommandContext& context) {
                          : std::string("none"))
                 << "\n";
 }
+
+}  // namespace kest::cfg

@@ -10,6 +10,8 @@
 #include <fstream>
 #include <sstream>
 
+namespace kest::cfg {
+
 namespace {
 
 constexpr char kStatusFile[] = "/var/run/firmware_update/status";
@@ -69,3 +71,5 @@ UpdateLock ReadUpdateLock() {
     }
     return lock;
 }
+
+}  // namespace kest::cfg

@@ -6,6 +6,8 @@
 #include <optional>
 #include <string>
 
+namespace kest::cfg {
+
 // The first non-blank character of the tool's status file; nothing when there is none.
 std::optional<char> StatusFileCode();
 
@@ -20,3 +22,5 @@ struct UpdateLock {
 
 // The update lock's state, found without taking the lock.
 UpdateLock ReadUpdateLock();
+
+}  // namespace kest::cfg

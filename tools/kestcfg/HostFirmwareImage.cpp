@@ -16,6 +16,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -120,3 +122,5 @@ HRESULT HostFirmwareImage::GetImageFilePath(CvqBStr* path) {
     *path = CvqBStrAllocLen(wide->data(), wide->size());
     return *path != nullptr ? S_OK : E_OUTOFMEMORY;
 }
+
+}  // namespace kest::cfg

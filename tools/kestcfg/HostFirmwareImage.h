@@ -10,6 +10,8 @@
 #include "support/FileDescriptor.h"
 #include "uxsys/Expert.h"
 
+namespace kest::cfg {
+
 class HostFirmwareImage : public IuxSysFirmwareImageFile {
   public:
     // Opens the file at `path` without blocking (a FIFO must not hang kestcfg) and checks it:
@@ -39,3 +41,5 @@ class HostFirmwareImage : public IuxSysFirmwareImageFile {
     void* mapped_ = nullptr;
     std::atomic<uint32_t> references_{1};
 };
+
+}  // namespace kest::cfg

@@ -4,6 +4,8 @@
 #include "StatusNames.h"
 #include "hostkit/HostText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -49,3 +51,5 @@ void RunInfo(CommandContext& context) {
                 << "Version:           " << PrintableText(version) << "\n"
                 << "Programmatic name: " << PrintableText(programmaticName) << "\n";
 }
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 #include "ProgramLocation.h"
 #include "hostkit/DemoController.h"
 
+namespace kest::cfg {
+
 using kest::hostkit::kPluginFileName;
 
 std::string DefaultPluginPath() {
@@ -36,3 +38,5 @@ SimulatorLibrary::SimulatorLibrary(bool asked) {
     }
     library_.emplace(path, "the simulated controller library");
 }
+
+}  // namespace kest::cfg

@@ -6,6 +6,8 @@
 
 #include "hostkit/Plugin.h"
 
+namespace kest::cfg {
+
 // The simulated controller library's file name: the real library's soname.
 inline constexpr char kSimulatorFileName[] = "libvqtargetcfg.so.1";
 
@@ -26,3 +28,5 @@ class SimulatorLibrary {
   private:
     std::optional<kest::hostkit::GlobalLibrary> library_;
 };
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 
 #include "ExitCodes.h"
 
+namespace kest::cfg {
+
 namespace {
 
 constexpr int kHandledSignals[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT, SIGPIPE};
@@ -69,3 +71,5 @@ void EndInterruptionHandling() {
 int RecordedInterruption() {
     return recordedSignal;
 }
+
+}  // namespace kest::cfg

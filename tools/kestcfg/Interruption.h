@@ -3,6 +3,8 @@
 // that the plug-in starts meanwhile begin with default signals.
 #pragma once
 
+namespace kest::cfg {
+
 // From now until EndInterruptionHandling, the signals are only recorded: the first one says on
 // standard error that kestcfg is finishing the interface restart, and kestcfg ends with
 // ExitCodeAfterSignal once the plug-in has finished (Uninitialize has returned).
@@ -18,3 +20,5 @@ void EndInterruptionHandling();
 
 // The first signal recorded by DeferInterruptions, or 0.
 int RecordedInterruption();
+
+}  // namespace kest::cfg

@@ -9,6 +9,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 std::wstring ItemArgument(const std::string& text) {
@@ -68,3 +70,5 @@ HRESULT CurrentProperties(IuxSysExpert3* expert, const std::wstring& item,
 std::string ItemText(const std::wstring& item) {
     return Utf8FromWide(item.data(), item.size());
 }
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 #include "hostkit/InterfaceRef.h"
 #include "uxsys/Expert.h"
 
+namespace kest::cfg {
+
 // The chassis item's name, and the short name users may type for it.
 inline constexpr wchar_t kChassisItem[] = L"VQ KEST Chassis";
 inline constexpr char kChassisAlias[] = "chassis";
@@ -26,3 +28,5 @@ HRESULT CurrentProperties(IuxSysExpert3* expert, const std::wstring& item,
 
 // The item name as UTF-8 for output.
 std::string ItemText(const std::wstring& item);
+
+}  // namespace kest::cfg

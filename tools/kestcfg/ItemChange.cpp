@@ -17,6 +17,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -220,3 +222,5 @@ void CheckValidation(Json& document, const ItemChange& change, const Validation&
                                                      "; nothing was changed");
     }
 }
+
+}  // namespace kest::cfg

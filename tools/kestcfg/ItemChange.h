@@ -14,6 +14,8 @@
 #include "hostkit/PropertyValue.h"
 #include "uxsys/Expert.h"
 
+namespace kest::cfg {
+
 // What became of one requested value, judged by reading the item afterwards.
 enum class Outcome {
     kStored,             // the item reports the value asked for
@@ -93,3 +95,5 @@ size_t ReportOutcomes(const std::string& item, const std::vector<ChangeOutcome>&
 // Ends the command like RefuseChange when the validation failed or left a requested value
 // unaccepted (exit status 1).
 void CheckValidation(Json& document, const ItemChange& change, const Validation& validation);
+
+}  // namespace kest::cfg

@@ -11,6 +11,8 @@
 #include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -168,3 +170,5 @@ void RunRefresh(CommandContext& context) {
     }
     ReportMissing(context, ItemText(item), missing, "did not provide");
 }
+
+}  // namespace kest::cfg

@@ -4,6 +4,8 @@
 #include <nlohmann/json.hpp>
 #include <string>
 
+namespace kest::cfg {
+
 using Json = nlohmann::ordered_json;
 
 // The document as text without a final newline; on one line unless `indent` is not negative.
@@ -11,3 +13,5 @@ using Json = nlohmann::ordered_json;
 inline std::string JsonText(const Json& document, int indent = -1) {
     return document.dump(indent, ' ', false, Json::error_handler_t::replace);
 }
+
+}  // namespace kest::cfg

@@ -6,6 +6,8 @@
 
 #include "kest/ChassisTags.h"
 
+namespace kest::cfg {
+
 namespace {
 
 std::string Hex(uint32_t value) {
@@ -99,3 +101,5 @@ std::vector<std::string> OfferedModes(const ModeProperty& mode, uint32_t mask) {
     }
     return offered;
 }
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace kest::cfg {
+
 struct NamedMode {
     uint32_t value;
     const char* name;
@@ -31,3 +33,5 @@ std::string ModeText(uint32_t tag, uint32_t value);
 
 // The modes a mask offers, "0x02 tcpip" each, in ascending order.
 std::vector<std::string> OfferedModes(const ModeProperty& mode, uint32_t mask);
+
+}  // namespace kest::cfg

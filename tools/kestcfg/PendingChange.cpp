@@ -14,6 +14,8 @@
 #include "ExitCodes.h"
 #include "support/WholeTransfer.h"
 
+namespace kest::cfg {
+
 namespace {
 
 constexpr char kRunDirectory[] = "/run/kest";
@@ -153,3 +155,5 @@ std::string UtcText(int64_t seconds) {
     }
     return text;
 }
+
+}  // namespace kest::cfg

@@ -13,6 +13,8 @@
 #include "JsonOutput.h"
 #include "support/FileDescriptor.h"
 
+namespace kest::cfg {
+
 // "/run/kest/pending-rollback.json" and "/run/kest/last-rollback.json" under the sysroot.
 std::string PendingRollbackPath();
 std::string LastRollbackPath();
@@ -42,3 +44,5 @@ std::string NewChangeId();
 
 // Seconds since the epoch as "2030-01-02T03:04:05Z".
 std::string UtcText(int64_t seconds);
+
+}  // namespace kest::cfg

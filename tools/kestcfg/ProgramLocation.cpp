@@ -5,6 +5,8 @@
 
 #include "ExitCodes.h"
 
+namespace kest::cfg {
+
 std::string ProgramDirectory() {
     char program[PATH_MAX];
     const ssize_t length = readlink("/proc/self/exe", program, sizeof program - 1);
@@ -14,3 +16,5 @@ std::string ProgramDirectory() {
     const std::string path(program, static_cast<size_t>(length));
     return path.substr(0, path.rfind('/') + 1);
 }
+
+}  // namespace kest::cfg

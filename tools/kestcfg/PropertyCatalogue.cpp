@@ -10,6 +10,8 @@
 #include "kest/ChassisTags.h"
 #include "uxsys/PropertyBag.h"
 
+namespace kest::cfg {
+
 namespace {
 
 constexpr uint32_t kBool = UX_PROPERTY_TYPE_BOOL;
@@ -222,3 +224,5 @@ std::string TagDisplayName(uint32_t tag) {
     const PropertyDescription* description = FindProperty(tag);
     return description != nullptr ? description->name : TagText(tag);
 }
+
+}  // namespace kest::cfg

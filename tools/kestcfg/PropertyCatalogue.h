@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace kest::cfg {
+
 // How an unsigned value is shown: most as decimal numbers, masks and bit-valued modes in
 // hexadecimal (they are compared bit by bit).
 enum class NumberStyle { kDecimal, kHexadecimal };
@@ -53,3 +55,5 @@ std::string TagText(uint32_t tag);
 
 // The name kestcfg shows for `tag`: its catalogue name, or its number for an unknown tag.
 std::string TagDisplayName(uint32_t tag);
+
+}  // namespace kest::cfg

@@ -9,6 +9,8 @@
 #include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 std::vector<PropertyEntry> ReadProperties(IuxSysPropertyBag2* bag,
@@ -53,3 +55,5 @@ Json PropertiesAsJson(const std::vector<PropertyEntry>& entries) {
     }
     return json;
 }
+
+}  // namespace kest::cfg

@@ -10,6 +10,8 @@
 #include "hostkit/PropertyValue.h"
 #include "uxsys/PropertyBag.h"
 
+namespace kest::cfg {
+
 struct PropertyEntry {
     uint32_t tag;
     HRESULT status;                      // of reading the value; S_OK when it was read
@@ -28,3 +30,5 @@ void WritePropertyTable(std::ostream& out, const std::vector<PropertyEntry>& ent
 // {"host-name":{"tag":"0x0101F000","type":"text","value":"kest-demo"},...}; a property that
 // could not be read has "error" instead of "type" and "value".
 Json PropertiesAsJson(const std::vector<PropertyEntry>& entries);
+
+}  // namespace kest::cfg

@@ -4,6 +4,8 @@
 #include "PropertyCatalogue.h"
 #include "ValueText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 std::string PropertyValueText(uint32_t tag, const PropertyValue& value) {
@@ -37,3 +39,5 @@ std::string AcceptedPropertyForm(uint32_t tag, uint32_t type) {
     }
     return "a mode name (" + names + ") or number";
 }
+
+}  // namespace kest::cfg

@@ -7,6 +7,8 @@
 
 #include "hostkit/PropertyValue.h"
 
+namespace kest::cfg {
+
 // The value of `tag` for people: modes and mode masks with their names ("0x02 tcpip"), masks in
 // hexadecimal, everything else as ValueForPeople shows it.
 std::string PropertyValueText(uint32_t tag, const kest::hostkit::PropertyValue& value);
@@ -19,3 +21,5 @@ std::optional<kest::hostkit::PropertyValue> ParsePropertyValue(uint32_t tag,
 
 // What ParsePropertyValue accepts for `tag`, for error messages.
 std::string AcceptedPropertyForm(uint32_t tag, uint32_t type);
+
+}  // namespace kest::cfg

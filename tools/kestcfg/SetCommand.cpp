@@ -12,6 +12,8 @@
 #include "StatusNames.h"
 #include "hostkit/HostText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -105,3 +107,5 @@ void RunSet(CommandContext& context) {
         context.out << "The change takes full effect after the controller restarts.\n";
     }
 }
+
+}  // namespace kest::cfg

@@ -9,6 +9,8 @@
 #include "hostkit/DemoController.h"
 #include "hostkit/HostText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -71,3 +73,5 @@ void RunSim(CommandContext& context) {
     context.out << "Use it with: kestcfg --sysroot " << PrintableText(root) << " items\n"
                 << "         or: export KEST_SYSROOT=" << PrintableText(root) << "\n";
 }
+
+}  // namespace kest::cfg

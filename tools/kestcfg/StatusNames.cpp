@@ -3,6 +3,8 @@
 #include "hostkit/HostText.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -74,3 +76,5 @@ bool IsValueRejection(HRESULT status) {
             return false;
     }
 }
+
+}  // namespace kest::cfg

@@ -5,6 +5,8 @@
 
 #include "uxsys/Types.h"
 
+namespace kest::cfg {
+
 // The status's symbolic name ("UX_E_VALUE_INVALID"), or empty for a code kestcfg does not know.
 std::string StatusName(HRESULT status);
 
@@ -14,3 +16,5 @@ std::string StatusWithName(HRESULT status);
 
 // True for the statuses with which the plug-in rejects a property value as unacceptable.
 bool IsValueRejection(HRESULT status);
+
+}  // namespace kest::cfg

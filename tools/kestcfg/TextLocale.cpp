@@ -6,6 +6,8 @@
 #include <clocale>
 #include <initializer_list>
 
+namespace kest::cfg {
+
 namespace {
 
 bool IsUtf8Locale() {
@@ -26,3 +28,5 @@ void UseTextLocale() {
         }
     }
 }
+
+}  // namespace kest::cfg

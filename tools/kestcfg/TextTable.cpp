@@ -5,6 +5,8 @@
 
 #include "hostkit/HostText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -50,3 +52,5 @@ void TextTable::Write(std::ostream& out, const std::string& indent) const {
         out << line << "\n";
     }
 }
+
+}  // namespace kest::cfg

@@ -6,6 +6,8 @@
 #include <string>
 #include <vector>
 
+namespace kest::cfg {
+
 class TextTable {
   public:
     explicit TextTable(std::vector<std::string> headings);
@@ -20,3 +22,5 @@ class TextTable {
   private:
     std::vector<std::vector<std::string>> rows_;  // the headings first
 };
+
+}  // namespace kest::cfg

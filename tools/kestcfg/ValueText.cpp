@@ -11,6 +11,8 @@
 #include "hostkit/HostText.h"
 #include "hostkit/TimestampText.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -266,3 +268,5 @@ std::string AcceptedForm(uint32_t type) {
             return "a value of a known type";
     }
 }
+
+}  // namespace kest::cfg

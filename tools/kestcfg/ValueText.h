@@ -8,6 +8,8 @@
 #include "PropertyCatalogue.h"
 #include "hostkit/PropertyValue.h"
 
+namespace kest::cfg {
+
 // The value for people: true/false, numbers (unsigned ones in hexadecimal when `style` says so),
 // text as it is, GUIDs in registry form, timestamps in ISO 8601 UTC or "(no time)".
 std::string ValueForPeople(const kest::hostkit::PropertyValue& value, NumberStyle style);
@@ -29,3 +31,5 @@ std::string TypeCodeName(uint32_t type);
 
 // What ParseValue accepts for `type`, for error messages ("true or false", ...).
 std::string AcceptedForm(uint32_t type);
+
+}  // namespace kest::cfg

@@ -23,6 +23,8 @@
 #include "hostkit/HostText.h"
 #include "uxsys/HostString.h"
 
+namespace kest::cfg {
+
 using namespace kest::hostkit;
 
 namespace {
@@ -144,8 +146,11 @@ int ExitCodeUnlessInterrupted(int code) {
 
 }  // namespace
 
+}  // namespace kest::cfg
+
 // NOLINTNEXTLINE(bugprone-exception-escape): only allocation failures escape, ending kestcfg
 int main(int argc, char** argv) {
+    using namespace kest::cfg;
     UseTextLocale();
     const bool json = AsksForJson(argc, argv);
     DocumentOutput output(json);
