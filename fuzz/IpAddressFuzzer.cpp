@@ -13,6 +13,8 @@
 #include "network/IPv4Text.h"
 #include "vq/dsc/IPAddress.h"
 
+using namespace kest::network;
+
 namespace {
 
 using vq::dsc::osdep::IPAddress;

@@ -18,6 +18,9 @@
 #include "support/TraceGate.h"
 #include "trace/Tracer.h"
 
+using namespace kest::expert;
+using namespace kest::property;
+
 namespace {
 // 722d1d51-1c1d-42fe-aeef-5cf6c711ffa7
 constexpr CLSID kFrameworkExpertClassId = {

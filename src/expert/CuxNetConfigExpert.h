@@ -68,6 +68,7 @@ class CuxNetConfigExpert : public IuxSysExpert3,
   private:
     // Interface restarts started by the last persist, kept until the next persist,
     // Uninitialize or destruction (whichever comes first).
+    using DeferredPersistTask = kest::items::DeferredPersistTask;
     using PendingTaskList = std::vector<CountedPtr<DeferredPersistTask>>;
 
     // Initialize's work once the expert lock is held: the log directory, the diagnostics

@@ -5,6 +5,8 @@
 #include "support/Sysroot.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::expert {
+
 namespace {
 
 constexpr const char* kSettingsSections[] = {"vqsyscfg", "AllComponents"};
@@ -76,3 +78,5 @@ std::string ChooseLogDirectory() {
     }
     return directory;
 }
+
+}  // namespace kest::expert

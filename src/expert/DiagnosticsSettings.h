@@ -8,6 +8,7 @@
 
 class IniFileManager;
 
+namespace kest::expert {
 struct DiagnosticsSettings {
     uint32_t severity = 1;
     uint32_t target = 1;
@@ -26,3 +27,5 @@ std::optional<uint32_t> ParseDiagnosticsValue(const std::string& text);
 // The log directory with a final '/': "vqsyslog" in the shared settings directory when that
 // directory exists, otherwise the fallback "vqsyslog" directory.
 std::string ChooseLogDirectory();
+
+}  // namespace kest::expert

@@ -11,6 +11,8 @@
 #include "support/TraceGate.h"
 #include "uxsys/HostString.h"
 
+using namespace kest::property;
+
 HRESULT CuxNetConfigExpert::GetImportableTags(const wchar_t* item, IuxSysEnumPropertyTag** tags) {
     TraceIfEnabled("CuxNetConfigExpert::GetImportableTags()", kTraceEntry);
     if (item == nullptr || tags == nullptr) {

@@ -5,6 +5,8 @@
 #include "support/Sysroot.h"
 #include "support/TraceGate.h"
 
+using namespace kest::property;
+
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 
 namespace {

@@ -9,6 +9,10 @@
 #include "support/TraceGate.h"
 #include "vq/targetcfg/Network.h"
 
+using namespace kest::property;
+
+namespace kest::items {
+
 namespace {
 constexpr char kThreadName[] = "ToggleNIC";
 }  // namespace
@@ -71,3 +75,5 @@ void DeferredPersistTask::ReapplyLinkSpeed() {
     ThrowIfLibraryCallFailed(vq::targetcfg::network::SetDeviceSettings(
         deviceHandler_->GetDeviceIndex(), mediaMode, 0, 0));
 }
+
+}  // namespace kest::items

@@ -13,6 +13,8 @@
 #include "uxsys/PropertyBag.h"
 #include "vq/targetcfg/DeviceHandler.h"
 
+namespace kest::items {
+
 // Thread safety: no lock; after the constructor starts the thread only Run touches the members,
 // and the destructor (any thread) joins the thread before it drops them.
 class DeferredPersistTask : public vq::dsc::osdep::Thread,
@@ -43,3 +45,5 @@ class DeferredPersistTask : public vq::dsc::osdep::Thread,
     CountedPtr<ItemHandler> itemHandler_;
     CountedPtr<IuxSysPropertyBag2> changes_;
 };
+
+}  // namespace kest::items

@@ -7,11 +7,14 @@
 #include "support/StatusHolder.h"
 #include "uxsys/StatusCodes.h"
 
+using namespace kest::items;
+
 namespace {
 // The value of the fixed unsigned row every item reports.
 constexpr uint32_t kFixedValue = 0x150000;
 }  // namespace
 
+namespace kest::items {
 bool EqualIgnoringCase(const std::wstring& a, const std::wstring& b) {
     if (a.size() != b.size()) {
         return false;
@@ -23,6 +26,7 @@ bool EqualIgnoringCase(const std::wstring& a, const std::wstring& b) {
     }
     return true;
 }
+}  // namespace kest::items
 
 ItemHandler::ItemHandler(std::wstring itemName, std::wstring secondName, uint32_t numericAttribute)
     : itemName_(std::move(itemName)),

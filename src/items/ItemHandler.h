@@ -69,6 +69,8 @@ class ItemHandler : public vq::dsc::RefCountedThreadSafePolicy {
     const uint32_t numericAttribute_;
 };
 
+namespace kest::items {
 // True when `a` and `b` have the same length and agree character by character after wide
 // upper-case mapping.
 bool EqualIgnoringCase(const std::wstring& a, const std::wstring& b);
+}  // namespace kest::items

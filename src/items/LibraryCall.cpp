@@ -4,6 +4,8 @@
 #include "support/StatusHolder.h"
 #include "support/TraceGate.h"
 
+namespace kest::items {
+
 void ThrowIfLibraryCallFailed(int32_t libraryStatus) {
     StatusHolder status;
     status = ConvertStatusCode(libraryStatus);
@@ -20,3 +22,5 @@ void TraceLibraryCall(const char* label, const std::string& value) {
         TraceIfEnabled(std::string(label) + "(" + value + ")", kTraceLibraryCalls);
     }
 }
+
+}  // namespace kest::items

@@ -5,6 +5,8 @@
 #include <cstdint>
 #include <string>
 
+namespace kest::items {
+
 // Converts a tested call's status; a negative result is thrown as a status (long).
 void ThrowIfLibraryCallFailed(int32_t libraryStatus);
 
@@ -12,3 +14,5 @@ void ThrowIfLibraryCallFailed(int32_t libraryStatus);
 // unsigned decimal, text unchanged.
 void TraceLibraryCall(const char* label, uint32_t value);
 void TraceLibraryCall(const char* label, const std::string& value);
+
+}  // namespace kest::items

@@ -1,5 +1,7 @@
 #include "network/AddressRules.h"
 
+namespace kest::network {
+
 namespace {
 
 // True when the host part of `address` under `mask` is all 0 or all 1.
@@ -33,3 +35,5 @@ AddressPairFault CheckAddressAndGateway(uint32_t address, uint32_t mask, uint32_
     }
     return AddressPairFault::kNone;
 }
+
+}  // namespace kest::network

@@ -4,6 +4,8 @@
 
 #include <cstdint>
 
+namespace kest::network {
+
 // True when the mask's one-bits run contiguously from the top bit (0.0.0.0 included).
 bool IsContiguousSubnetMask(uint32_t mask);
 
@@ -20,3 +22,5 @@ enum class AddressPairFault {
 
 // Checks the address first, then the gateway; a gateway of 0.0.0.0 (none) passes its checks.
 AddressPairFault CheckAddressAndGateway(uint32_t address, uint32_t mask, uint32_t gateway);
+
+}  // namespace kest::network

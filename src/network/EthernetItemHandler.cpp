@@ -11,6 +11,9 @@
 #include "uxsys/StatusCodes.h"
 #include "vq/targetcfg/Network.h"
 
+using namespace kest::items;
+using namespace kest::property;
+
 namespace {
 
 namespace network = vq::targetcfg::network;

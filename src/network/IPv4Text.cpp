@@ -4,6 +4,8 @@
 
 #include "support/TextConversion.h"
 
+namespace kest::network {
+
 namespace {
 
 // Longest dotted-decimal text, "255.255.255.255".
@@ -62,3 +64,5 @@ vq::dsc::osdep::IPAddress ZeroIPv4Address() {
     const uint8_t zero[4] = {};
     return vq::dsc::osdep::IPAddress(zero, sizeof(zero), vq::dsc::osdep::IPFamily::IPv4);
 }
+
+}  // namespace kest::network

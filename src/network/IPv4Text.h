@@ -9,6 +9,8 @@
 
 #include "vq/dsc/IPAddress.h"
 
+namespace kest::network {
+
 // The host-order value of 255.255.255.255, which is also what an unparsable text gives.
 constexpr uint32_t kIPv4Broadcast = 0xFFFFFFFF;
 constexpr uint32_t kIPv4Loopback = 0x7F000001;
@@ -25,3 +27,5 @@ uint32_t ParseIPv4(const std::wstring& text);
 
 // The IPv4 address 0.0.0.0 (an address of family IPv4, unlike the unset address).
 vq::dsc::osdep::IPAddress ZeroIPv4Address();
+
+}  // namespace kest::network

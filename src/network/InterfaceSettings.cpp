@@ -12,6 +12,11 @@
 #include "uxsys/StatusCodes.h"
 #include "vq/targetcfg/Network.h"
 
+using namespace kest::items;
+using namespace kest::property;
+
+namespace kest::network {
+
 namespace {
 
 using vq::dsc::osdep::IPAddress;
@@ -176,3 +181,5 @@ HRESULT ApplyInterfaceSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, boo
                                                                address, mask, gateway, dnsServer));
     return S_OK;
 }
+
+}  // namespace kest::network

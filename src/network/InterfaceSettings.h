@@ -9,6 +9,8 @@
 #include "uxsys/PropertyBag.h"
 #include "uxsys/Types.h"
 
+namespace kest::network {
+
 // True for the tags whose change is checked and applied as one set of interface settings:
 // adapter mode, request mode, the four addresses and the EtherCAT settings.
 constexpr bool IsInterfaceSettingTag(uint32_t tag) {
@@ -32,3 +34,5 @@ HRESULT HaveInterfaceSettingsChanged(uint32_t deviceIndex, IuxSysPropertyBag* ba
 // failures are thrown (a non-empty address text that is no address raises the runtime's
 // exception).
 HRESULT ApplyInterfaceSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, bool wasPrimary);
+
+}  // namespace kest::network

@@ -12,6 +12,10 @@
 #include "uxsys/StatusCodes.h"
 #include "vq/targetcfg/Network.h"
 
+using namespace kest::items;
+using namespace kest::network;
+using namespace kest::property;
+
 namespace {
 
 // True for the media modes an adapter may be asked for.

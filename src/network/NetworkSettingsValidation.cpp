@@ -13,6 +13,11 @@
 #include "uxsys/StatusCodes.h"
 #include "vq/targetcfg/Network.h"
 
+using namespace kest::items;
+using namespace kest::property;
+
+namespace kest::network {
+
 namespace {
 
 constexpr wchar_t kRequestModeNotSupported[] = L"IP address request mode is not supported";
@@ -134,3 +139,5 @@ HRESULT ValidateNetworkSettings(uint32_t deviceIndex, IuxSysPropertyBag* bag, Cv
     ValidateGatewayDNSHelper(bag, address, mask, message);
     return S_OK;
 }
+
+}  // namespace kest::network

@@ -5,6 +5,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::property {
+
 HRESULT BagGetBool(IuxSysPropertyBag* bag, uint32_t tag, bool& value) {
     int32_t stored = 0;
     const HRESULT status = bag->GetBool(tag, &stored);
@@ -78,3 +80,5 @@ bool EnumeratorHasTag(IuxSysEnumPropertyTag* tags, uint32_t tag) {
     }
     return false;
 }
+
+}  // namespace kest::property

@@ -10,6 +10,8 @@
 #include "uxsys/Enumerators.h"
 #include "uxsys/PropertyBag.h"
 
+namespace kest::property {
+
 // The unsigned value of `tag`, preset to `preset`; a failed read is thrown as a status (long).
 uint32_t ReadULong(IuxSysPropertyBag* bag, uint32_t tag, uint32_t preset = 0);
 // An enumerator over the modified tags of `bag` in ascending order, or null when none is
@@ -35,3 +37,5 @@ HRESULT BagSetNarrowString(IuxSysPropertyBag* bag, uint32_t tag, const std::stri
 // True when the enumerator yields `tag` after a Reset; false for a null enumerator or when Next
 // stops before the tag appears. Leaves the enumerator's position after the tag or at the end.
 bool EnumeratorHasTag(IuxSysEnumPropertyTag* tags, uint32_t tag);
+
+}  // namespace kest::property

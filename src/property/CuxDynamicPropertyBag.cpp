@@ -9,6 +9,8 @@
 #include "support/EntryGuard.h"
 #include "uxsys/StatusCodes.h"
 
+using namespace kest::property;
+
 namespace {
 
 // Seconds from 1904-01-01 00:00:00 UTC to the POSIX epoch.

@@ -4,6 +4,8 @@
 #include "uxsys/HostString.h"
 #include "uxsys/StatusCodes.h"
 
+namespace kest::property {
+
 // Stores a new host string holding `text` in *result (the caller frees it). E_POINTER for a null
 // result; E_OUTOFMEMORY, with null stored, when the string cannot be allocated.
 inline HRESULT StoreNewHostString(const wchar_t* text, CvqBStr* result) noexcept {
@@ -23,3 +25,5 @@ inline void StoreValidationMessage(CvqBStr* slot, const wchar_t* text) {
     CvqBStrFree(*slot);
     StoreNewHostString(text, slot);
 }
+
+}  // namespace kest::property

@@ -7,6 +7,9 @@ CuxSysEnumItemNamesSTL::CuxSysEnumItemNamesSTL(ItemNameList names)
     Reset();
 }
 
+namespace kest::property {
 CountedPtr<IuxSysEnumStringList> CreateItemNameEnumerator(ItemNameList names) {
     return CreateCountedComObject<CuxSysEnumItemNamesSTL>(std::move(names));
 }
+
+}  // namespace kest::property

@@ -25,6 +25,8 @@ class CuxSysEnumItemNamesSTL : public ItemNameEnumeratorBase {
     ItemNameList names_;
 };
 
+namespace kest::property {
 // A new name enumerator with one reference, owning `names`. A failed allocation is thrown as the
 // status E_OUTOFMEMORY (a long).
 CountedPtr<IuxSysEnumStringList> CreateItemNameEnumerator(ItemNameList names);
+}  // namespace kest::property

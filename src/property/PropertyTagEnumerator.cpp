@@ -12,6 +12,7 @@ CuxSysEnumPropertyTagsSTL::CuxSysEnumPropertyTagsSTL(const std::set<uint32_t>& t
     Reset();
 }
 
+namespace kest::property {
 CountedPtr<IuxSysEnumPropertyTag> CreatePropertyTagEnumerator(PropertyTagList ascendingTags) {
     return CreateCountedComObject<CuxSysEnumPropertyTagsSTL>(std::move(ascendingTags));
 }
@@ -19,3 +20,5 @@ CountedPtr<IuxSysEnumPropertyTag> CreatePropertyTagEnumerator(PropertyTagList as
 CountedPtr<IuxSysEnumPropertyTag> CreatePropertyTagEnumerator(const std::set<uint32_t>& tags) {
     return CreateCountedComObject<CuxSysEnumPropertyTagsSTL>(tags);
 }
+
+}  // namespace kest::property

@@ -28,8 +28,10 @@ class CuxSysEnumPropertyTagsSTL : public PropertyTagEnumeratorBase {
     PropertyTagList tags_;
 };
 
+namespace kest::property {
 // A new tag enumerator with one reference, owning `ascendingTags` (ascending, no repeats).
 // A failed allocation is thrown as the status E_OUTOFMEMORY (a long).
 CountedPtr<IuxSysEnumPropertyTag> CreatePropertyTagEnumerator(PropertyTagList ascendingTags);
 // A new tag enumerator with one reference over a copy of `tags`; failures as above.
 CountedPtr<IuxSysEnumPropertyTag> CreatePropertyTagEnumerator(const std::set<uint32_t>& tags);
+}  // namespace kest::property

@@ -14,6 +14,9 @@
 #include "vq/targetcfg/Network.h"
 #include "vq/targetcfg/System.h"
 
+using namespace kest::items;
+using namespace kest::property;
+
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 

@@ -11,6 +11,9 @@
 #include "system/SystemItemValidation.h"
 #include "vq/targetcfg/System.h"
 
+using namespace kest::items;
+using namespace kest::property;
+
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 

@@ -5,6 +5,8 @@
 #include "property/BagAccess.h"
 #include "property/CuxDynamicPropertyBag.h"
 
+using namespace kest::property;
+
 namespace kest::test::items {
 namespace {
 

@@ -7,6 +7,8 @@
 #include "NetworkTestSupport.h"
 #include "items/DeferredPersistTask.h"
 
+using namespace kest::items;
+
 namespace kest::test::network {
 namespace {
 

@@ -9,6 +9,8 @@
 #include "NetworkTestSupport.h"
 #include "network/InterfaceSettings.h"
 
+using namespace kest::network;
+
 namespace kest::test::network {
 namespace {
 

@@ -6,6 +6,8 @@
 #include "property/CuxDynamicPropertyBag.h"
 #include "property/PropertyTagEnumerator.h"
 
+using namespace kest::property;
+
 namespace kest::test::property {
 
 namespace {

@@ -8,6 +8,8 @@
 #include "property/ItemNameEnumerator.h"
 #include "property/PropertyTagEnumerator.h"
 
+using namespace kest::property;
+
 namespace kest::test::property {
 
 namespace {
