@@ -32,11 +32,7 @@ constexpr char kSettingsPath[] = "/etc/korvane/share/vqkest.ini";
 
 // The time-zone table the plug-in ships, from the source tree.
 std::string ShippedTimeZoneTable() {
-    std::string source = __FILE__;
-    for (int level = 0; level < 3; ++level) {
-        source.erase(source.rfind('/'));
-    }
-    std::ifstream table(source + "/data/timezone.ini", std::ios::binary);
+    std::ifstream table(KEST_SOURCE_DATA_DIR "/timezone.ini", std::ios::binary);
     std::ostringstream content;
     content << table.rdbuf();
     return content.str();
