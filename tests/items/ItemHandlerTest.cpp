@@ -15,19 +15,20 @@ TEST(ItemHandlerTest, BaseRowsCarryTheIdentityWithTheirTypes) {
     CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
     ASSERT_EQ(S_OK, handler->GetItemProperties(bag.Get()));
 
-    int32_t signedValue = 0;
-    EXPECT_EQ(S_OK, bag->GetLong(0x0101C000, &signedValue));
-    EXPECT_EQ(1, signedValue);
-    EXPECT_EQ(S_OK, bag->GetLong(0x0102A000, &signedValue));
-    EXPECT_EQ(1000, signedValue);
+    int32_t number = 0;
+    for (const auto& [tag, value] : {std::pair{0x0101C000u, 1}, std::pair{0x0102A000u, 1000}}) {
+        EXPECT_EQ(S_OK, bag->GetLong(tag, &number)) << std::hex << tag;
+        EXPECT_EQ(value, number) << std::hex << tag;
+    }
     uint32_t unsignedValue = 0;
     EXPECT_EQ(S_OK, bag->GetULong(0x01037000, &unsignedValue));
     EXPECT_EQ(0x150000u, unsignedValue);
-    std::wstring text;
-    EXPECT_EQ(S_OK, BagGetWideString(bag.Get(), 0x0101D000, text));
-    EXPECT_EQ(L"eth0", text);
-    EXPECT_EQ(S_OK, BagGetWideString(bag.Get(), 0x0101F000, text));
-    EXPECT_EQ(L"Second eth0", text);
+    for (const auto& [tag, value] :
+         {std::pair{0x0101D000u, L"eth0"}, {0x0101F000u, L"Second eth0"}}) {
+        std::wstring text;
+        EXPECT_EQ(S_OK, BagGetWideString(bag.Get(), tag, text)) << std::hex << tag;
+        EXPECT_EQ(value, text) << std::hex << tag;
+    }
 }
 
 TEST(ItemHandlerTest, FirstFailingSetterIsThrownAndStopsTheRows) {

@@ -3,6 +3,7 @@
 #include <net/if.h>
 
 #include <cstring>
+#include <string>
 
 #include <gtest/gtest.h>
 
@@ -107,6 +108,16 @@ TEST(IPAddressTest, EqualityComparesFamilyZoneAndBytes) {
     EXPECT_NE(IPAddress(), zeroV4);
     b.Parse(std::string("fe80::1%1"));
     EXPECT_EQ(a, b);
+}
+
+TEST(IPAddressTest, TextWithAZeroCharacterIsNoAddress) {
+    using namespace std::string_literals;
+    for (const std::string& text : {"::1\0junk"s, "fe80::1%lo\0x"s, "1.2.3.4\0"s, "\0"s}) {
+        IPAddress address;
+        EXPECT_FALSE(address.TryParse(text)) << text.size();
+        EXPECT_TRUE(address.IsUnset());
+        EXPECT_FALSE(address.TryParse(std::wstring(text.begin(), text.end()))) << text.size();
+    }
 }
 
 }  // namespace

@@ -133,12 +133,9 @@ TEST(KestConfigIniTest, AFailedSaveKeepsTheFileAndForgetsTheChange) {
                   return refused && settings.IsWebServiceEnabled() ? 0 : 1;
               }));
     EXPECT_EQ(kEnabledFile, sysroot.ReadFile(kWebServicePath));
-}
-
-TEST(KestConfigIniTest, AFailedFirstSaveLeavesTheSwitchDisabled) {
-    kest::test::TempSysroot sysroot;
-    // The settings directory is a regular file, so nothing can be written below it.
-    sysroot.WriteFile("/etc/korvane/share", "");
+    // A first save that fails (the settings directory is a regular file) leaves it disabled.
+    kest::test::TempSysroot blocked;
+    blocked.WriteFile("/etc/korvane/share", "");
     KestConfigIni settings;
     EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(true); }));
     EXPECT_FALSE(settings.IsWebServiceEnabled());
