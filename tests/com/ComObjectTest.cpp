@@ -65,7 +65,18 @@ TEST_F(ComObjectTest, UnansweredIdentifierGivesNoInterfaceAndNull) {
     EXPECT_EQ(0u, primary->Release());
 }
 
-TEST_F(ComObjectTest, FailedConstructionGivesOutOfMemoryAndNoObject) {
+TEST_F(ComObjectTest, CountedCreationHoldsTheOnlyReferenceAndFailsWithOutOfMemory) {
+    {
+        CountedPtr<ITestDerived> primary = CreateCountedComObject<TestComponent>(&destructions);
+        CountedPtr<ITestSecondary> second =
+            QueryCounted<ITestSecondary>(primary, IID_ITestSecondary);
+        ASSERT_TRUE(second);
+        EXPECT_EQ(3, second->Secondary());
+        EXPECT_FALSE(QueryCounted<ITestSecondary>(primary, IID_ITestUnanswered));
+        EXPECT_EQ(3u, primary->AddRef());
+        EXPECT_EQ(2u, primary->Release());
+    }
+    EXPECT_EQ(1, destructions.load());
     TestObject* object = reinterpret_cast<TestObject*>(&destructions);
     EXPECT_EQ(E_OUTOFMEMORY, CreateComObjectInstance<TestComponent>(&object, &destructions, true));
     EXPECT_EQ(nullptr, object);
@@ -74,14 +85,6 @@ TEST_F(ComObjectTest, FailedConstructionGivesOutOfMemoryAndNoObject) {
         FAIL() << "no status thrown";
     } catch (long status) {
         EXPECT_EQ(E_OUTOFMEMORY, status);
-    }
-}
-
-TEST_F(ComObjectTest, CountedCreationHoldsTheOnlyReference) {
-    {
-        CountedPtr<TestObject> object = CreateCountedComObject<TestComponent>(&destructions);
-        EXPECT_EQ(2u, object->AddRef());
-        EXPECT_EQ(1u, object->Release());
     }
     EXPECT_EQ(1, destructions.load());
 }

@@ -3,7 +3,6 @@
 #include <atomic>
 #include <utility>
 
-#include "TestComponents.h"
 #include "com/CountedPtr.h"
 
 namespace kest::test::com {
@@ -67,21 +66,6 @@ TEST(CountedPtrTest, DetachHandsTheReferenceOnAndReceiveDropsTheOldOne) {
     EXPECT_TRUE(holder);
     holder = nullptr;
     EXPECT_EQ(2, destroyed);
-}
-
-TEST(CountedPtrTest, QueryCountedConvertsBetweenInterfacesOfOneObject) {
-    std::atomic<int> destructions{0};
-    {
-        CountedPtr<ITestDerived> primary = CreateCountedComObject<TestComponent>(&destructions);
-        CountedPtr<ITestSecondary> second =
-            QueryCounted<ITestSecondary>(primary, IID_ITestSecondary);
-        ASSERT_TRUE(second);
-        EXPECT_EQ(3, second->Secondary());
-        EXPECT_FALSE(QueryCounted<ITestSecondary>(primary, IID_ITestUnanswered));
-        EXPECT_EQ(3u, primary->AddRef());
-        primary->Release();
-    }
-    EXPECT_EQ(1, destructions.load());
 }
 
 }  // namespace

@@ -89,15 +89,6 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
         sysroot_.WriteFile(kTimeZoneTablePath, content.str());
     }
 
-    // The names of the library calls logged so far, in order.
-    std::vector<std::string> CallNames() const {
-        std::vector<std::string> names;
-        for (const std::string& line : CallLog()) {
-            names.push_back(line.substr(0, line.find('\t')));
-        }
-        return names;
-    }
-
     // The logged calls whose name starts with "Set" (name, status and arguments).
     std::vector<std::string> SetterCalls() const {
         std::vector<std::string> setters;
