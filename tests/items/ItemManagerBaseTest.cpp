@@ -37,13 +37,10 @@ TEST_F(ItemManagerBaseTest, InstanceIsSharedAndForgottenWithItsLastReference) {
     EXPECT_FALSE(ItemManagerBase::GetInstance<TestManager>(false));
     manager = ItemManagerBase::GetInstance<TestManager>(true);
     EXPECT_EQ(constructed + 1, TestManager::constructedManagers);
-}
-
-TEST_F(ItemManagerBaseTest, DestroyingTheManagerReleasesItsHandlers) {
     manager->GetItemHandlers(true);
     const int destroyed = TestManager::destroyedHandlers;
     manager.Reset();
-    EXPECT_EQ(destroyed + 2, TestManager::destroyedHandlers);
+    EXPECT_EQ(destroyed + 2, TestManager::destroyedHandlers) << "its handlers go with it";
 }
 
 TEST_F(ItemManagerBaseTest, FindDoesNotDiscoverButGetDoesOnAMiss) {

@@ -108,7 +108,7 @@ class ProbeThread : public Thread {
     }
 };
 
-TEST(ThreadTest, RunBodyGetsNameAndStackSize) {
+TEST(ThreadTest, RunBodyGetsNameAndStackSizeAndMayThrow) {
     ProbeThread named;
     named.Start("ToggleNIC");
     EXPECT_THROW(named.Start("again"), InvalidOperation);
@@ -122,9 +122,8 @@ TEST(ThreadTest, RunBodyGetsNameAndStackSize) {
     large.Join();
     EXPECT_EQ(large.name, "a-very-long-thr");
     EXPECT_GE(large.stackSize, 0x100000u);
-}
 
-TEST(ThreadTest, ExceptionInABodyDoesNotEndTheProcess) {
+    // An exception in a body does not end the process.
     std::atomic<bool> ran{false};
     {
         Thread thread;

@@ -3,12 +3,13 @@
 #include <gtest/gtest.h>
 
 #include <map>
+#include <sstream>
 #include <string>
-#include <variant>
 #include <vector>
 
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/AbsTime.h"
+#include "support/TextConversion.h"
 #include "system/SystemItemSysroot.h"
 #include "uxsys/HostString.h"
 
@@ -16,54 +17,42 @@ namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
 using kest::test::system::ThrownStatus;
-using Value = std::variant<bool, int32_t, uint32_t, std::wstring>;
 
-struct Row {
-    uint32_t tag;
-    Value value;
-};
-
-// The value of `tag` in `bag` as the type the bag holds.
-Value ReadValue(IuxSysPropertyBag4* bag, uint32_t tag) {
-    uint32_t type = 0;
-    EXPECT_EQ(S_OK, bag->GetTagType(tag, &type)) << std::hex << tag;
-    switch (type) {
-        case UX_PROPERTY_TYPE_BOOL: {
-            int32_t value = 0;
-            bag->GetBool(tag, &value);
-            return value != 0;
+// Every row of `bag` in tag order as "tag=<type><value>;", the tag in hexadecimal; types: b
+// boolean, l signed, u unsigned (hexadecimal), s text, t timestamp (seconds).
+std::string Listing(IuxSysPropertyBag4* bag) {
+    std::ostringstream rows;
+    CountedPtr<IuxSysEnumPropertyTag> tags;
+    bag->GetTagEnumerator(tags.Receive());
+    for (uint32_t tag = 0; tags && tags->Next(1, &tag, nullptr) == S_OK;) {
+        int32_t number = 0;
+        uint32_t unsignedNumber = 0;
+        CvqBStrHolder text;
+        uxSysAttrTimestampUTC time{};
+        rows << std::hex << tag << '=' << std::dec;
+        if (bag->GetBool(tag, &number) == S_OK) {
+            rows << 'b' << number;
+        } else if (bag->GetLong(tag, &number) == S_OK) {
+            rows << 'l' << number;
+        } else if (bag->GetULong(tag, &unsignedNumber) == S_OK) {
+            rows << 'u' << std::hex << unsignedNumber;
+        } else if (bag->GetString(tag, text.Receive()) == S_OK) {
+            rows << 's' << vq::dsc::NarrowFromWide(text.Get());
+        } else if (bag->GetTimestamp(tag, &time) == S_OK) {
+            rows << 't' << time.seconds;
         }
-        case UX_PROPERTY_TYPE_LONG: {
-            int32_t value = 0;
-            bag->GetLong(tag, &value);
-            return value;
-        }
-        case UX_PROPERTY_TYPE_ULONG: {
-            uint32_t value = 0;
-            bag->GetULong(tag, &value);
-            return value;
-        }
-        case UX_PROPERTY_TYPE_STRING: {
-            CvqBStrHolder value;
-            bag->GetString(tag, value.Receive());
-            return std::wstring(value.Get() ? value.Get() : L"");
-        }
-        default:
-            ADD_FAILURE() << "unexpected type " << type << " of " << std::hex << tag;
-            return false;
+        rows << ';';
     }
+    return rows.str();
 }
 
-std::vector<uint32_t> Tags(IuxSysPropertyBag4* bag) {
-    std::vector<uint32_t> tags;
-    CountedPtr<IuxSysEnumPropertyTag> enumerator;
-    bag->GetTagEnumerator(enumerator.Receive());
-    uint32_t tag = 0;
-    while (enumerator && enumerator->Next(1, &tag, nullptr) == S_OK) {
-        tags.push_back(tag);
-    }
-    return tags;
-}
+constexpr char kCatalogue[] =
+    "1001000=b1;1002000=u0;1003000=u1092;1004000=sKorvane;1005000=u4d;1006000=sVQ KEST 9100;"
+    "1007000=s00001A2B;1008000=b1;101c000=l1;101d000=sVQ KEST Chassis;101f000=skest-01;"
+    "1024000=l1;102a000=l1000;102f000=s22.5.0;1037000=u150000;1038000=b1;1039000=l1;"
+    "103a000=u4;103c000=sKEST;103d000=srack 4;104a000=b1;104b000=s*.cfg;104c000=l0;"
+    "1055000=b0;1056000=b0;d11d000=sde;d11e000=sen,de,fr;d120000=sCST6CDT;d129000=b1;"
+    "d12b000=l-360;d14e000=sAmerica/Chicago;21004000=b0;";
 
 class KestDeviceItemHandlerTest : public ::testing::Test,
                                   public kest::test::system::SystemItemSysroot {
@@ -74,59 +63,23 @@ class KestDeviceItemHandlerTest : public ::testing::Test,
         bag_ = CreatePropertyBag();
         return handler_->GetItemProperties(bag_.Get());
     }
-    std::wstring Text(uint32_t tag) { return std::get<std::wstring>(ReadValue(bag_.Get(), tag)); }
+    std::wstring Text(uint32_t tag) {
+        CvqBStrHolder text;
+        EXPECT_EQ(S_OK, bag_->GetString(tag, text.Receive())) << std::hex << tag;
+        return text.Get() ? text.Get() : L"";
+    }
 
     CountedPtr<KestDeviceItemHandler> handler_;
     CountedPtr<IuxSysPropertyBag4> bag_;
 };
 
 TEST_F(KestDeviceItemHandlerTest, ReportsEveryCatalogueRowWithItsTypeAndValue) {
-    const std::vector<Row> expected = {
-        {0x0101C000, int32_t(1)},
-        {0x0101D000, std::wstring(L"VQ KEST Chassis")},
-        {0x0102A000, int32_t(1000)},
-        {0x0101F000, std::wstring(L"kest-01")},
-        {0x01037000, uint32_t(0x150000)},
-        {0x01001000, true},
-        {0x01038000, true},
-        {0x01039000, int32_t(1)},
-        {0x0103A000, uint32_t(4)},
-        {0x01024000, int32_t(1)},
-        {0x01002000, uint32_t(0)},
-        {0x01006000, std::wstring(L"VQ KEST 9100")},
-        {0x01005000, uint32_t(77)},
-        {0x0103C000, std::wstring(L"KEST")},
-        {0x01008000, true},
-        {0x01004000, std::wstring(L"Korvane")},
-        {0x01003000, uint32_t(0x1092)},
-        {0x01007000, std::wstring(L"00001A2B")},
-        {0x0103D000, std::wstring(L"rack 4")},
-        {0x0D11D000, std::wstring(L"de")},
-        {0x0D11E000, std::wstring(L"en,de,fr")},
-        {0x0D12B000, int32_t(-360)},
-        {0x0D120000, std::wstring(L"CST6CDT")},
-        {0x0D14E000, std::wstring(L"America/Chicago")},
-        {0x0D129000, true},
-        {0x0102F000, std::wstring(L"22.5.0")},
-        {0x0104C000, int32_t(0)},
-        {0x0104A000, true},
-        {0x0104B000, std::wstring(L"*.cfg")},
-        {0x01056000, false},
-        {0x01055000, false},
-        {0x21004000, false},
-    };
     ASSERT_EQ(S_OK, ReadCatalogue());
-    std::vector<uint32_t> expectedTags;
-    for (const Row& row : expected) {
-        EXPECT_EQ(row.value, ReadValue(bag_.Get(), row.tag)) << std::hex << row.tag;
-        expectedTags.push_back(row.tag);
-    }
-    std::sort(expectedTags.begin(), expectedTags.end());
-    EXPECT_EQ(expectedTags, Tags(bag_.Get()));
-
+    EXPECT_EQ(kCatalogue, Listing(bag_.Get()));
     sysroot_.WriteFile(kest::test::system::kWebServicePath, "[WebService]\nEnable = 1\n");
     ASSERT_EQ(S_OK, ReadCatalogue());
-    EXPECT_EQ(Value(true), ReadValue(bag_.Get(), 0x21004000));
+    std::string enabled = kCatalogue;
+    EXPECT_EQ(enabled.replace(enabled.find("21004000=b0"), 11, "21004000=b1"), Listing(bag_.Get()));
 }
 
 TEST_F(KestDeviceItemHandlerTest, FormatsDescriptionSerialNumberAndLocaleCodes) {
@@ -225,27 +178,27 @@ TEST_F(KestDeviceItemHandlerTest, ConstructionFailsWithoutAReadableVersionFile) 
 
 TEST_F(KestDeviceItemHandlerTest, RefreshWritesTheRequestedTimeAndDnsNameBeforeTheCatalogue) {
     ASSERT_EQ(S_OK, ReadCatalogue());
-    const uint32_t catalogueSize = static_cast<uint32_t>(Tags(bag_.Get()).size());
-
-    CountedPtr<IuxSysPropertyBag4> refreshed = CreatePropertyBag();
-    EXPECT_EQ(S_OK, handler_->RefreshProperties(0, nullptr, refreshed.Get()));
-    EXPECT_EQ(catalogueSize, Tags(refreshed.Get()).size());
+    bag_ = CreatePropertyBag();
+    EXPECT_EQ(S_OK, handler_->RefreshProperties(0, nullptr, bag_.Get()));
+    EXPECT_EQ(kCatalogue, Listing(bag_.Get()));
 
     const vq::dsc::AbsTime before = vq::dsc::AbsTime::Now();
     const uint32_t requested[] = {0x0D11F000, 0x0D114ABC, 0x01006000};
-    refreshed = CreatePropertyBag();
-    EXPECT_EQ(S_OK, handler_->RefreshProperties(3, requested, refreshed.Get()));
+    bag_ = CreatePropertyBag();
+    EXPECT_EQ(S_OK, handler_->RefreshProperties(3, requested, bag_.Get()));
     uxSysAttrTimestampUTC time{};
-    ASSERT_EQ(S_OK, refreshed->GetTimestamp(0x0D11F000, &time));
+    ASSERT_EQ(S_OK, bag_->GetTimestamp(0x0D11F000, &time));
     EXPECT_GE(time.seconds, before.seconds);
-    EXPECT_EQ(Value(std::wstring(L"kest-01.example.net")), ReadValue(refreshed.Get(), 0x0D114000));
-    EXPECT_EQ(catalogueSize + 2, Tags(refreshed.Get()).size());
+    std::string expected = kCatalogue;
+    expected.insert(expected.find("d11d000"), "d114000=skest-01.example.net;");
+    expected.insert(expected.find("d120000"), "d11f000=t" + std::to_string(time.seconds) + ";");
+    EXPECT_EQ(expected, Listing(bag_.Get()));
 
     const uint32_t masked[] = {0x0D11FFFF};
-    refreshed = CreatePropertyBag();
-    EXPECT_EQ(S_OK, handler_->RefreshProperties(1, masked, refreshed.Get()));
-    EXPECT_EQ(S_OK, refreshed->HasTag(0x0D11F000));
-    EXPECT_EQ(S_FALSE, refreshed->HasTag(0x0D114000));
+    bag_ = CreatePropertyBag();
+    EXPECT_EQ(S_OK, handler_->RefreshProperties(1, masked, bag_.Get()));
+    EXPECT_EQ(S_OK, bag_->HasTag(0x0D11F000));
+    EXPECT_EQ(S_FALSE, bag_->HasTag(0x0D114000));
 }
 
 TEST_F(KestDeviceItemHandlerTest, ARefreshWhoseDnsNameFailsWritesNoCatalogue) {
@@ -255,7 +208,7 @@ TEST_F(KestDeviceItemHandlerTest, ARefreshWhoseDnsNameFailsWritesNoCatalogue) {
     CountedPtr<IuxSysPropertyBag4> refreshed = CreatePropertyBag();
     const uint32_t requested[] = {0x0D114000};
     EXPECT_EQ(E_UNEXPECTED, handler_->RefreshProperties(1, requested, refreshed.Get()));
-    EXPECT_TRUE(Tags(refreshed.Get()).empty());
+    EXPECT_EQ("", Listing(refreshed.Get()));
     EXPECT_EQ(E_POINTER, handler_->RefreshProperties(1, requested, nullptr));
 }
 
