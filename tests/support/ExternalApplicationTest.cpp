@@ -90,21 +90,18 @@ TEST(ExternalApplicationTest, RefusedStartsLeaveNothingToWaitFor) {
     EXPECT_TRUE(ExternalApplication().Wait());
 }
 
-TEST(ExternalApplicationTest, TimeOutWithoutKillLeavesChildRunning) {
-    ExternalApplication application;
-    StartShell(application, L"exec sleep 30");
-    EXPECT_FALSE(application.Wait(0, false, true));
-    EXPECT_EQ(kill(application.ProcessId(), 0), 0);
+TEST(ExternalApplicationTest, TimeOutKillsAndReapsTheChildOnlyWhenAsked) {
+    ExternalApplication running;
+    StartShell(running, L"exec sleep 30");
+    EXPECT_FALSE(running.Wait(0, false, true));
+    EXPECT_EQ(kill(running.ProcessId(), 0), 0);
     const auto start = std::chrono::steady_clock::now();
-    EXPECT_THROW(application.Wait(250), exception::Timeout);
+    EXPECT_THROW(running.Wait(250), exception::Timeout);
     EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(250));
-    EXPECT_EQ(application.GetState(), State::Running);
-    kill(application.ProcessId(), SIGKILL);
-    EXPECT_TRUE(application.Wait());
-    EXPECT_EQ(application.ExitResult(), -9);
-}
-
-TEST(ExternalApplicationTest, TimeOutWithKillKillsAndReapsChild) {
+    EXPECT_EQ(running.GetState(), State::Running);
+    kill(running.ProcessId(), SIGKILL);
+    EXPECT_TRUE(running.Wait());
+    EXPECT_EQ(running.ExitResult(), -9);
     for (bool noThrow : {true, false}) {
         ExternalApplication application;
         StartShell(application, L"exec sleep 30");

@@ -8,7 +8,6 @@
 #include <unistd.h>
 
 #include <cstdio>
-#include <functional>
 #include <string>
 #include <vector>
 
@@ -30,17 +29,6 @@ void ReplaceSettings(const kest::test::TempSysroot& sysroot, const std::string& 
     sysroot.WriteFile("/etc/korvane/share/other.new", content);
     ASSERT_EQ(0, std::rename(sysroot.PathOf("/etc/korvane/share/other.new").c_str(),
                              sysroot.PathOf(kWebServicePath).c_str()));
-}
-
-// Runs `body` in a child process; its exit status (-1 when it did not exit).
-int InChild(const std::function<int()>& body) {
-    const pid_t child = fork();
-    if (child == 0) {
-        _exit(body());
-    }
-    int status = 0;
-    waitpid(child, &status, 0);
-    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
 TEST(KestConfigIniTest, ReadsTheSwitchAsTheFileHoldsIt) {
@@ -123,15 +111,18 @@ TEST(KestConfigIniTest, AFailedSaveKeepsTheFileAndForgetsTheChange) {
     kest::test::TempSysroot sysroot;
     sysroot.WriteFile(kWebServicePath, kEnabledFile);
     // No file may grow in the child, so the temporary cannot be written.
-    EXPECT_EQ(0, InChild([] {
-                  signal(SIGXFSZ, SIG_IGN);
-                  rlimit limit{0, 0};
-                  setrlimit(RLIMIT_FSIZE, &limit);
-                  KestConfigIni settings;
-                  bool refused =
-                      ThrownStatus([&] { settings.SetWebServiceEnabled(false); }) == E_FAIL;
-                  return refused && settings.IsWebServiceEnabled() ? 0 : 1;
-              }));
+    const pid_t child = fork();
+    if (child == 0) {
+        signal(SIGXFSZ, SIG_IGN);
+        rlimit limit{0, 0};
+        setrlimit(RLIMIT_FSIZE, &limit);
+        KestConfigIni settings;
+        const bool refused = ThrownStatus([&] { settings.SetWebServiceEnabled(false); }) == E_FAIL;
+        _exit(refused && settings.IsWebServiceEnabled() ? 0 : 1);
+    }
+    int status = 0;
+    ASSERT_EQ(child, waitpid(child, &status, 0));
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
     EXPECT_EQ(kEnabledFile, sysroot.ReadFile(kWebServicePath));
     // A first save that fails (the settings directory is a regular file) leaves it disabled.
     kest::test::TempSysroot blocked;

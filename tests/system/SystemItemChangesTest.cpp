@@ -38,7 +38,6 @@ class SystemItemChangesTest : public ::testing::Test, public kest::test::system:
                                                 adapterDisabled);
     }
     std::wstring Message() const { return message_.Get() ? message_.Get() : L"(none)"; }
-    std::string Clock() const { return sysroot_.ReadFile(kest::test::system::kClockFile); }
 
     CountedPtr<KestDeviceItemHandler> handler_ = MakeCounted<KestDeviceItemHandler>();
     CountedPtr<IuxSysPropertyBag4> changes_ = CreatePropertyBag();

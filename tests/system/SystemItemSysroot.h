@@ -89,6 +89,9 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
         sysroot_.WriteFile(kTimeZoneTablePath, content.str());
     }
 
+    // What the system clock was last set to ("seconds microseconds\n"; empty: never).
+    std::string Clock() const { return sysroot_.ReadFile(kClockFile); }
+
     // The logged calls whose name starts with "Set" (name, status and arguments).
     std::vector<std::string> SetterCalls() const {
         std::vector<std::string> setters;
