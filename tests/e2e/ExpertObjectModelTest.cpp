@@ -1,10 +1,7 @@
 // The expert as a host sees it: raw interface pointers from the loaded plug-in.
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <string>
-#include <thread>
-#include <vector>
 
 #include "ExpertHost.h"
 
@@ -137,35 +134,6 @@ TEST_F(ExpertObjectModelTest, UnsupportedSlotsAnswerTheirConstants) {
         EXPECT_EQ(E_NOTIMPL, notifications->HandleFrameworkNotification(code, expert));
     }
     notifications->Release();
-}
-
-TEST_F(ExpertObjectModelTest, ConcurrentHostThreadsKeepTheCountConsistent) {
-    constexpr int kThreads = 6;
-    std::vector<std::thread> threads;
-    std::atomic<int> failures{0};
-    for (int t = 0; t < kThreads; ++t) {
-        threads.emplace_back([this, &failures] {
-            for (int round = 0; round < 5000; ++round) {
-                void* firmware = nullptr;
-                if (expert->QueryInterface(IID_IuxSysExpertFirmware, &firmware) != S_OK) {
-                    ++failures;
-                    continue;
-                }
-                void* primary = nullptr;
-                static_cast<IUnknown*>(firmware)->QueryInterface(IID_IuxSysExpert, &primary);
-                static_cast<IUnknown*>(firmware)->AddRef();
-                static_cast<IUnknown*>(firmware)->Release();
-                static_cast<IUnknown*>(firmware)->Release();
-                static_cast<IUnknown*>(primary)->Release();
-            }
-        });
-    }
-    for (std::thread& thread : threads) {
-        thread.join();
-    }
-    EXPECT_EQ(0, failures.load());
-    EXPECT_EQ(2u, expert->AddRef());
-    EXPECT_EQ(1u, expert->Release());
 }
 
 }  // namespace
