@@ -38,6 +38,14 @@ inline std::string StateWithDevice(int type, const std::string& interfaceName) {
                            "\nInterfaceName = " + interfaceName + "\nIndex = 3\n");
 }
 
+// The operation at `slot` of the virtual table of `object`, called with `arguments`: how a host
+// reaches operations that no interface it knows declares.
+template <class Result, class... Arguments>
+Result CallSlot(void* object, int slot, Arguments... arguments) {
+    using Operation = Result (*)(void*, Arguments...);
+    return (*static_cast<Operation**>(object))[slot](object, arguments...);
+}
+
 // Every name an enumerator yields, which is released.
 inline std::vector<std::wstring> TakeNames(IuxSysEnumStringList* names) {
     const InterfaceRef<IuxSysEnumStringList> held(names);

@@ -86,19 +86,6 @@ const std::regex kNotFoundRecord(
     "  Failure to get properties of item\\(-2147220619\\)\n"
     "  Thread = 0x[0-9A-F]+, Time = [0-9]{8} [0-9]{6}\\.[0-9]{3}\n");
 
-TEST_F(ExpertInitializeTest, ErrorBitTracesTheFailureWithItsStatusAndStamp) {
-    sysroot.WriteFile(kSettingsPath, "[vqsyscfg]\nSeverity = 2\n");
-    ASSERT_EQ(0, SessionWithFailedLookup());
-    const std::string log = TraceLogText(kFallbackLogDirectory);
-    EXPECT_TRUE(std::regex_search(log, kNotFoundRecord)) << log;
-}
-
-TEST_F(ExpertInitializeTest, WithoutSettingsOnlyIniCacheFailuresWouldBeTraced) {
-    ASSERT_EQ(0, SessionWithFailedLookup());
-    EXPECT_TRUE(sysroot.Exists(kFallbackLogDirectory));
-    EXPECT_EQ("", TraceLogText(kFallbackLogDirectory));
-}
-
 TEST_F(ExpertInitializeTest, ExistingSharedLogDirectoryIsPreferred) {
     sysroot.MakeDirectory(kPrimaryLogDirectory);
     sysroot.WriteFile(kSettingsPath, "[AllComponents]\nSeverity = 0x12\n[vqsyscfg]\nSeverity=18\n");

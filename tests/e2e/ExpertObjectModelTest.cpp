@@ -1,35 +1,13 @@
 // The expert as a host sees it: raw interface pointers from the loaded plug-in.
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <string>
-#include <thread>
-#include <vector>
 
-#include "hostkit/HostText.h"
-#include "hostkit/Plugin.h"
-#include "uxsys/Interfaces.h"
+#include "ExpertHost.h"
 
 namespace kest::test::e2e {
 
 namespace {
-
-// The operation at `slot` of an interface's virtual table, called without arguments.
-template <class Result>
-Result CallSlot(void* interfacePointer, int slot) {
-    using Operation = Result (*)(void*);
-    Operation* table = *static_cast<Operation**>(interfacePointer);
-    return table[slot](interfacePointer);
-}
-
-// A string-returning operation at `slot`, called with a result pointer.
-HRESULT CallStringSlot(void* interfacePointer, int slot, CvqBStr* result) {
-    using Operation = HRESULT (*)(void*, CvqBStr*);
-    Operation* table = *static_cast<Operation**>(interfacePointer);
-    return table[slot](interfacePointer, result);
-}
-
-using kest::hostkit::TakeWideHostString;
 
 constexpr GUID kKestExpertClassId = {
     0x999d9aa4, 0x5475, 0x4ca7, {0xa5, 0x60, 0x93, 0xc5, 0x1b, 0x5b, 0xfc, 0xeb}};
@@ -133,9 +111,9 @@ TEST_F(ExpertObjectModelTest, IdentityOperationsAnswerAtTheirSlots) {
     for (const auto& entry : strings) {
         SCOPED_TRACE(entry.slot);
         CvqBStr text = nullptr;
-        ASSERT_EQ(S_OK, CallStringSlot(expert, entry.slot, &text));
+        ASSERT_EQ(S_OK, CallSlot<HRESULT>(expert, entry.slot, &text));
         EXPECT_EQ(std::wstring(entry.text), TakeWideHostString(text));
-        EXPECT_EQ(E_POINTER, CallStringSlot(expert, entry.slot, nullptr));
+        EXPECT_EQ(E_POINTER, CallSlot<HRESULT>(expert, entry.slot, static_cast<CvqBStr*>(nullptr)));
     }
     EXPECT_EQ(E_POINTER, expert->GetExpertClassId(nullptr));
 }
@@ -156,35 +134,6 @@ TEST_F(ExpertObjectModelTest, UnsupportedSlotsAnswerTheirConstants) {
         EXPECT_EQ(E_NOTIMPL, notifications->HandleFrameworkNotification(code, expert));
     }
     notifications->Release();
-}
-
-TEST_F(ExpertObjectModelTest, ConcurrentHostThreadsKeepTheCountConsistent) {
-    constexpr int kThreads = 6;
-    std::vector<std::thread> threads;
-    std::atomic<int> failures{0};
-    for (int t = 0; t < kThreads; ++t) {
-        threads.emplace_back([this, &failures] {
-            for (int round = 0; round < 5000; ++round) {
-                void* firmware = nullptr;
-                if (expert->QueryInterface(IID_IuxSysExpertFirmware, &firmware) != S_OK) {
-                    ++failures;
-                    continue;
-                }
-                void* primary = nullptr;
-                static_cast<IUnknown*>(firmware)->QueryInterface(IID_IuxSysExpert, &primary);
-                static_cast<IUnknown*>(firmware)->AddRef();
-                static_cast<IUnknown*>(firmware)->Release();
-                static_cast<IUnknown*>(firmware)->Release();
-                static_cast<IUnknown*>(primary)->Release();
-            }
-        });
-    }
-    for (std::thread& thread : threads) {
-        thread.join();
-    }
-    EXPECT_EQ(0, failures.load());
-    EXPECT_EQ(2u, expert->AddRef());
-    EXPECT_EQ(1u, expert->Release());
 }
 
 }  // namespace

@@ -16,14 +16,6 @@ constexpr int kGetImportableTagsSlot = 21;
 constexpr int kGetMatchingItemsSlot = 22;
 constexpr int kUnsupportedImportSlot = 23;
 
-// The operation at `slot` of the expert's own table, called with `arguments`.
-template <class... Arguments>
-HRESULT CallExpertSlot(IuxSysExpert3* expert, int slot, Arguments... arguments) {
-    using Operation = HRESULT (*)(IuxSysExpert3*, Arguments...);
-    Operation* table = *reinterpret_cast<Operation**>(expert);
-    return table[slot](expert, arguments...);
-}
-
 // A host's plug-and-play callback that only counts its references.
 class CountingCallback : public IUnknown {
   public:
@@ -47,12 +39,12 @@ class ImportAndPlugPlayTest : public ExpertHostTest {
     }
 
     HRESULT GetImportableTags(const wchar_t* item, IuxSysEnumPropertyTag** tags) {
-        return CallExpertSlot(expert.Get(), kGetImportableTagsSlot, item, tags);
+        return CallSlot<HRESULT>(expert.Get(), kGetImportableTagsSlot, item, tags);
     }
     HRESULT GetMatchingItems(IuxSysPropertyBag* description, CvqBStr* exactName,
                              IuxSysEnumStringList** names, void** reserved) {
-        return CallExpertSlot(expert.Get(), kGetMatchingItemsSlot, description, exactName, names,
-                              reserved);
+        return CallSlot<HRESULT>(expert.Get(), kGetMatchingItemsSlot, description, exactName, names,
+                                 reserved);
     }
 
     // An item description: the adapter's own properties with the item name `name`.
@@ -81,7 +73,7 @@ TEST_F(ImportAndPlugPlayTest, NoItemHasImportableTags) {
     EXPECT_EQ(UX_E_ITEM_NOT_FOUND, GetImportableTags(L"eth7", &tags));
     EXPECT_EQ(nullptr, tags);
     EXPECT_EQ(E_POINTER, GetImportableTags(L"eth0", nullptr));
-    EXPECT_EQ(E_NOTIMPL, CallExpertSlot(expert.Get(), kUnsupportedImportSlot));
+    EXPECT_EQ(E_NOTIMPL, CallSlot<HRESULT>(expert.Get(), kUnsupportedImportSlot));
 }
 
 TEST_F(ImportAndPlugPlayTest, MatchingItemsFollowTheDescribedName) {

@@ -1,6 +1,6 @@
-// The system item as a host sees it: its full catalogue, and a get and a set of each setting it
-// accepts (host name, comment, locale, time zone in both notations, clock, web service),
-// including the rejections a host shows for bad values.
+// The system item as a host sees it: the time zone set in either notation, the clock following
+// the legacy zone, the web-service switch shared with other processes, and the rejections a host
+// shows for bad values.
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -9,7 +9,6 @@
 #include <cstdio>
 
 #include <fstream>
-#include <map>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -22,7 +21,6 @@ namespace {
 constexpr uint32_t kHostNameTag = 0x0101F000;
 constexpr uint32_t kCommentTag = 0x0103D000;
 constexpr uint32_t kLocaleTag = 0x0D11D000;
-constexpr uint32_t kLocaleCodesTag = 0x0D11E000;
 constexpr uint32_t kCurrentTimeTag = 0x0D11F000;
 constexpr uint32_t kLegacyTimeZoneTag = 0x0D120000;
 constexpr uint32_t kOlsonTimeZoneTag = 0x0D14E000;
@@ -111,54 +109,6 @@ class SystemItemTest : public ExpertHostTest {
     std::string ControllerState() const { return sysroot.ReadFile(kControllerStatePath); }
 };
 
-TEST_F(SystemItemTest, GetShowsTheWholeCatalogue) {
-    const std::map<uint32_t, uint32_t> types = {
-        {0x0101C000, 2}, {0x0101D000, 6}, {0x0102A000, 2}, {0x0101F000, 6}, {0x01037000, 3},
-        {0x01001000, 1}, {0x01038000, 1}, {0x01039000, 2}, {0x0103A000, 3}, {0x01024000, 2},
-        {0x01002000, 3}, {0x01006000, 6}, {0x01005000, 3}, {0x0103C000, 6}, {0x01008000, 1},
-        {0x01004000, 6}, {0x01003000, 3}, {0x01007000, 6}, {0x0103D000, 6}, {0x0D11D000, 6},
-        {0x0D11E000, 6}, {0x0D12B000, 2}, {0x0D120000, 6}, {0x0D14E000, 6}, {0x0D129000, 1},
-        {0x0102F000, 6}, {0x0104C000, 2}, {0x0104A000, 1}, {0x0104B000, 6}, {0x01056000, 1},
-        {0x01055000, 1}, {0x21004000, 1},
-    };
-    const InterfaceRef<IuxSysPropertyBag> bag = Properties();
-    ASSERT_TRUE(bag);
-    InterfaceRef<IuxSysEnumPropertyTag> tags;
-    ASSERT_EQ(S_OK, bag->GetTagEnumerator(tags.Receive()));
-    std::map<uint32_t, uint32_t> reported;
-    uint32_t tag = 0;
-    while (tags->Next(1, &tag, nullptr) == S_OK) {
-        uint32_t type = 0;
-        EXPECT_EQ(S_OK, bag->GetTagType(tag, &type));
-        reported[tag] = type;
-    }
-    EXPECT_EQ(types, reported);
-
-    EXPECT_EQ(L"kest-1", Text(kHostNameTag));
-    EXPECT_EQ(L"VQ KEST 9100", Text(0x01006000));
-    EXPECT_EQ(L"en", Text(kLocaleTag));
-    EXPECT_EQ(L"en,de", Text(kLocaleCodesTag));
-    EXPECT_EQ(L"Europe/Berlin", Text(kOlsonTimeZoneTag));
-    EXPECT_EQ(L"NFT-1DFT", Text(kLegacyTimeZoneTag));
-    EXPECT_FALSE(Bool(kWebServiceTag));
-}
-
-TEST_F(SystemItemTest, SetsHostNameCommentAndLocale) {
-    const Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
-        changes->SetString(kHostNameTag, L"kest-2");
-        changes->SetString(kCommentTag, L"spare chassis");
-        changes->SetString(kLocaleTag, L"de");
-    }));
-    EXPECT_EQ(S_OK, outcome.validation);
-    EXPECT_EQ((std::vector<uint32_t>{kHostNameTag, kCommentTag, kLocaleTag}), outcome.validated);
-    EXPECT_EQ(S_OK, outcome.persistence);
-    EXPECT_EQ(1, outcome.restartRequired);
-    EXPECT_EQ(L"kest-2", Text(kHostNameTag));
-    EXPECT_EQ(L"spare chassis", Text(kCommentTag));
-    EXPECT_EQ(L"de", Text(kLocaleTag));
-    EXPECT_NE(std::string::npos, ControllerState().find("LanguageName=German"));
-}
-
 TEST_F(SystemItemTest, SetsTheTimeZoneInEitherNotation) {
     Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
         changes->SetString(kOlsonTimeZoneTag, L"America/Chicago");
@@ -177,19 +127,6 @@ TEST_F(SystemItemTest, SetsTheTimeZoneInEitherNotation) {
     EXPECT_EQ(L"PST8PDT", Text(kLegacyTimeZoneTag));
 }
 
-TEST_F(SystemItemTest, SetsTheClockAndTheHardwareClock) {
-    sysroot.WriteFile("/dev/rtc0", "");
-    sysroot.WriteScript("/sbin/hwclock",
-                        "echo \"$@\" >> '" + sysroot.PathOf("/hwclock.log") + "'\n");
-    const Outcome outcome = Apply(Changes([](IuxSysPropertyBag2* changes) {
-        changes->SetTimestamp(kCurrentTimeTag, {0, kUnixEpochIn1904Seconds + 1700000000});
-    }));
-    EXPECT_EQ(S_OK, outcome.validation);
-    EXPECT_EQ(S_OK, outcome.persistence);
-    EXPECT_EQ("1700000000 0\n", sysroot.ReadFile("/run/kest/system-clock"));
-    EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot.ReadFile("/hwclock.log"));
-}
-
 TEST_F(SystemItemTest, ClockFollowsTheLegacyZoneHoweverItIsSpelled) {
     // From Europe/Berlin (an Olson name: no built-in offset) to eight hours west of UTC.
     for (const wchar_t* spelling : {L"PST8PDT", L"pst8pdt", L" PST8PDT "}) {
@@ -202,20 +139,6 @@ TEST_F(SystemItemTest, ClockFollowsTheLegacyZoneHoweverItIsSpelled) {
         EXPECT_EQ("1700028800 0\n", sysroot.ReadFile("/run/kest/system-clock"));
         EXPECT_EQ(L"America/Los_Angeles", Text(kOlsonTimeZoneTag));
     }
-}
-
-TEST_F(SystemItemTest, SwitchesTheWebService) {
-    Outcome outcome =
-        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 1); }));
-    EXPECT_EQ(S_OK, outcome.persistence);
-    EXPECT_EQ(1, outcome.restartRequired);
-    EXPECT_TRUE(Bool(kWebServiceTag));
-    EXPECT_EQ("[WebService]\nEnable = 1\n\n", sysroot.ReadFile("/etc/korvane/share/vqkest.ini"));
-
-    outcome =
-        Apply(Changes([](IuxSysPropertyBag2* changes) { changes->SetBool(kWebServiceTag, 0); }));
-    EXPECT_EQ(S_OK, outcome.persistence);
-    EXPECT_FALSE(Bool(kWebServiceTag));
 }
 
 // Another process switches the web service on and adds its own section: the host that read the

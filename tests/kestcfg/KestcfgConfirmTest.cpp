@@ -222,28 +222,6 @@ TEST_F(KestcfgConfirmTest, ACallerReadingThroughAPipeIsNotKeptWaiting) {
     EXPECT_EQ(0, RunKestcfg({"confirm"}).exitCode);
 }
 
-TEST_F(KestcfgConfirmTest, UsageErrors) {
-    const std::vector<std::vector<std::string>> commands = {
-        {"set", "eth0", "polling-interval=250", "--confirm-within"},
-        {"set", "eth0", "polling-interval=250", "--confirm-within", "0"},
-        {"set", "eth0", "polling-interval=250", "--confirm-within", "-5"},
-        {"set", "eth0", "polling-interval=250", "--confirm-within", "3601"},
-        {"set", "eth0", "polling-interval=250", "--confirm-within", "soon"},
-        {"set", "chassis", "current-time=now", "--confirm-within", "60"},
-        {"set", "eth0", "primary-adapter=true", "--confirm-within", "60"},
-    };
-    const std::string before = State();
-    for (const std::vector<std::string>& command : commands) {
-        const RunResult result = RunKestcfg(command);
-        EXPECT_EQ(2, result.exitCode) << command.back() << result.err;
-    }
-    EXPECT_EQ(before, State());
-    EXPECT_FALSE(sysroot_.Exists(kPending));
-    const RunResult clock = RunKestcfg(commands[5]);
-    EXPECT_NE(std::string::npos, clock.err.find("current-time cannot be rolled back"));
-    EXPECT_NE(std::string::npos, RunKestcfg(commands[6]).err.find("primary-adapter"));
-}
-
 }  // namespace
 
 }  // namespace kest::test::cfg

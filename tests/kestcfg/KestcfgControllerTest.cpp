@@ -18,6 +18,19 @@ namespace {
 const char kChassis[] = "VQ KEST Chassis";
 class KestcfgControllerTest : public kest::test::cfg::DemoControllerTest {};
 
+// The controller library's logged calls in `log` that change the controller, without times.
+std::vector<std::string> ControllerChanges(const std::string& log) {
+    std::vector<std::string> calls;
+    std::istringstream lines(log);
+    for (std::string line; std::getline(lines, line);) {
+        const std::string call = line.substr(line.find('\t') + 1);
+        if (call.compare(0, 3, "Set") == 0) {
+            calls.push_back(call);
+        }
+    }
+    return calls;
+}
+
 // True when `text` has a table row: the tag, the name, the type and the value, blank-separated.
 bool HasRow(const std::string& text, const std::string& tag, const std::string& name,
             const std::string& type, const std::string& value) {
@@ -73,27 +86,6 @@ TEST_F(KestcfgControllerTest, GetShowsTheControllersValuesFormattedByType) {
     EXPECT_EQ(std::string::npos, adapter.out.find("host-name  text  kest-demo"));
 }
 
-TEST_F(KestcfgControllerTest, GetAsJsonHasOneDocumentWithAnEntryPerItemWithTypedValues) {
-    const RunResult result = RunKestcfg({"--json", "get"});
-    ASSERT_EQ(0, result.exitCode) << result.err;
-    const std::string flat = FlattenJson(result.out);
-    for (const char* expected : {
-             "items/0/item=\"VQ KEST Chassis\"\n",
-             "items/0/properties/host-name/tag=\"0x0101F000\"\n",
-             "items/0/properties/host-name/type=\"text\"\n",
-             "items/0/properties/host-name/value=\"kest-demo\"\n",
-             "items/0/properties/web-service/value=false\n",
-             "items/0/properties/time-zone-offset/value=60\n",
-             "items/1/item=\"eth0\"\n",
-             "items/1/properties/polling-interval/value=100\n",
-             "items/1/properties/supported-adapter-modes/value=11\n",
-             "items/1/properties/primary-adapter/value=true\n",
-         }) {
-        EXPECT_NE(std::string::npos, flat.find(expected)) << expected;
-    }
-    EXPECT_EQ(std::string::npos, flat.find("\nitems/2/"));
-}
-
 TEST_F(KestcfgControllerTest, FailuresNameTheStatus) {
     const RunResult unknownItem = RunKestcfg({"get", "eth7"});
     EXPECT_EQ(3, unknownItem.exitCode);
@@ -141,6 +133,35 @@ TEST_F(KestcfgControllerTest, RefreshReadsTheRequestedPropertiesByNameOrNumber) 
 
     EXPECT_EQ(3, RunKestcfg({"refresh", "eth0", "0x0ABCD000"}).exitCode);
     EXPECT_EQ(2, RunKestcfg({"refresh", "eth0", "no-such-property"}).exitCode);
+}
+
+// The accepted pair is stored, shown by the next read and followed by the interface restart
+// before kestcfg ends.
+TEST_F(KestcfgControllerTest, AddressAndMaskAreStoredAndTheInterfaceRestartsBeforeKestcfgEnds) {
+    const RunResult result =
+        RunKestcfg({"set", "eth0", "ip-address=192.168.10.30", "subnet-mask=255.255.0.0"});
+    ASSERT_EQ(0, result.exitCode) << result.err;
+    EXPECT_EQ("eth0: ip-address set to 192.168.10.30\neth0: subnet-mask set to 255.255.0.0\n",
+              result.out);
+    const std::string state = State();
+    EXPECT_NE(std::string::npos, state.find("IPAddress=192.168.10.30\nSubnetMask=255.255.0.0\n"))
+        << state;
+    const std::vector<std::string> expected = {
+        "SetDeviceIPConfigByIndex\t0\t0\t0\t1\t2\t192.168.10.30\t255.255.0.0\t192.168.10.1\t"
+        "192.168.10.1",
+        "SetNetworkInterfaceState\t0\teth0\t0",
+        "SetNetworkInterfaceState\t0\teth0\t1",
+    };
+    const std::vector<std::string> calls = ControllerChanges(sysroot_.ReadFile(kCallLog));
+    ASSERT_LE(expected.size(), calls.size());
+    EXPECT_EQ(expected, std::vector<std::string>(calls.begin(), calls.begin() + 3));
+
+    const RunResult shown = RunKestcfg({"get", "eth0"});
+    ASSERT_EQ(0, shown.exitCode) << shown.err;
+    for (const char* row : {"ip-address                  text      192.168.10.30\n",
+                            "subnet-mask                 text      255.255.0.0\n"}) {
+        EXPECT_NE(std::string::npos, shown.out.find(row)) << shown.out;
+    }
 }
 
 TEST_F(KestcfgControllerTest, SetPersistsAValidatedChangeThatTheNextReadShows) {
@@ -225,23 +246,6 @@ TEST_F(KestcfgControllerTest, AChangeTheControllerDoesNotStoreIsReportedWithStat
         << result.err;
 }
 
-TEST_F(KestcfgControllerTest, SetChangesTheTimeZoneInEitherNotation) {
-    for (const char* zone : {"America/Chicago", "America/Los_Angeles"}) {
-        sysroot_.WriteFile(std::string("/usr/share/zoneinfo/") + zone, "TZif");
-    }
-    const RunResult olson = RunKestcfg({"set", kChassis, "time-zone=America/Chicago"});
-    EXPECT_EQ(0, olson.exitCode) << olson.err;
-    EXPECT_NE(std::string::npos, State().find("TimeZone=America/Chicago"));
-    EXPECT_TRUE(HasRow(RunKestcfg({"get", kChassis}).out, "0x0D120000", "legacy-time-zone", "text",
-                       "CST6CDT"));
-
-    const RunResult legacy = RunKestcfg({"set", kChassis, "legacy-time-zone=PST8PDT"});
-    EXPECT_EQ(0, legacy.exitCode) << legacy.err;
-    EXPECT_NE(std::string::npos, State().find("TimeZone=America/Los_Angeles"));
-    EXPECT_TRUE(HasRow(RunKestcfg({"get", kChassis}).out, "0x0D14E000", "time-zone", "text",
-                       "America/Los_Angeles"));
-}
-
 TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndChangeNothing) {
     struct Case {
         std::vector<std::string> arguments;
@@ -255,6 +259,13 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
          "VQ KEST Chassis rejected the change with UX_E_HOSTNAME_INVALID (0x8004037A): The first "
          "and last characters of the hostname must be alphanumeric."},
         {{"set", "eth0", "gateway=10.0.0.1"},
+         "eth0 rejected the change with UX_E_ADDRESS_COMBINATION_INVALID (0x80040380): The IP "
+         "address and gateway must be on the same subnet."},
+        {{"set", "eth0", "ip-address=192.168.10.0", "subnet-mask=255.255.255.0"},
+         "eth0 rejected the change with UX_E_ADDRESS_COMBINATION_INVALID (0x80040380): The "
+         "specified IP address and subnet mask combination is invalid. The right-most bits of the "
+         "IP address must not be all 0 or all 1."},
+        {{"set", "eth0", "ip-address=10.0.0.5", "subnet-mask=255.255.255.0"},
          "eth0 rejected the change with UX_E_ADDRESS_COMBINATION_INVALID (0x80040380): The IP "
          "address and gateway must be on the same subnet."},
         {{"set", "eth0", "subnet-mask=255.0.255.0"},
@@ -283,6 +294,7 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
         EXPECT_NE(std::string::npos, result.err.find("kestcfg: " + c.message)) << result.err;
     }
     EXPECT_EQ(before, State());
+    EXPECT_EQ(std::vector<std::string>{}, ControllerChanges(sysroot_.ReadFile(kCallLog)));
 
     const RunResult json = RunKestcfg({"--json", "set", "eth0", "polling-interval=0"});
     EXPECT_EQ(1, json.exitCode);
@@ -364,32 +376,50 @@ TEST_F(KestcfgControllerTest, ModesAreShownAndTakenByNameOrNumber) {
     EXPECT_NE(std::string::npos,
               FlattenJson(RunKestcfg({"--json", "get", "eth0", "adapter-mode"}).out)
                   .find("adapter-mode/value=2\n"));
-    const RunResult unknown = RunKestcfg({"set", "eth0", "polling-mode=sometimes"});
-    EXPECT_EQ(2, unknown.exitCode);
-    EXPECT_NE(std::string::npos, unknown.err.find("a mode name (off, polling) or number"));
 }
 
+// Every command's JSON is one document with typed values, also when tracing writes to standard
+// output.
 TEST_F(KestcfgControllerTest, JsonIsOneDocumentPerRunEvenWhenTracingWritesToStandardOutput) {
     sysroot_.WriteFile("/etc/korvane/share/vqsysdiag.ini",
                        "[AllComponents]\nSeverity = 255\nTarget = 2\nLowDiskThreshold = 0\n");
-    const std::vector<std::pair<std::vector<std::string>, std::string>> runs = {
-        {{"items"}, "items/1=\"eth0\"\n"},
-        {{"describe", "eth0"}, "items/0/properties/0/name=\"fixed-0101c\"\n"},
-        {{"export"}, "items/eth0/polling-interval=100\n"},
-        {{"get"}, "items/1/properties/polling-interval/value=100\n"},
-        {{"get", "chassis", "comment"}, "/value=\"Demo controller on a desk\"\n"},
-        {{"refresh", "eth0", "gateway"}, "properties/gateway/value=\"192.168.10.1\"\n"},
-        {{"set", "eth0", "polling-interval=200"}, "polling-interval/result=\"stored\"\n"},
-        {{"set", "eth0", "polling-interval=0"}, "error/exitStatus=1\n"},
-        {{"get", "eth7"}, "error/exitStatus=3\n"},
-        {{"get", "eth0", "no-such-name"}, "error/exitStatus=2\n"},
+    struct Run {
+        std::vector<std::string> arguments;
+        int exitCode;
+        std::vector<std::string> parts;  // each is in the flattened document
     };
-    for (const auto& [arguments, expected] : runs) {
-        SCOPED_TRACE(testing::PrintToString(arguments));
-        std::vector<std::string> withJson = arguments;
+    const std::vector<Run> runs = {
+        {{"items"}, 0, {"items/1=\"eth0\"\n"}},
+        {{"describe", "eth0"}, 0, {"items/0/properties/0/name=\"fixed-0101c\"\n"}},
+        {{"export"}, 0, {"items/eth0/polling-interval=100\n"}},
+        {{"get"},
+         0,
+         {"items/0/item=\"VQ KEST Chassis\"\n", "items/0/properties/host-name/tag=\"0x0101F000\"\n",
+          "items/0/properties/host-name/type=\"text\"\n",
+          "items/0/properties/host-name/value=\"kest-demo\"\n",
+          "items/0/properties/web-service/value=false\n",
+          "items/0/properties/time-zone-offset/value=60\n", "items/1/item=\"eth0\"\n",
+          "items/1/properties/polling-interval/value=100\n",
+          "items/1/properties/supported-adapter-modes/value=11\n",
+          "items/1/properties/primary-adapter/value=true\n"}},
+        {{"get", "chassis", "comment"}, 0, {"/value=\"Demo controller on a desk\"\n"}},
+        {{"refresh", "eth0", "gateway"}, 0, {"properties/gateway/value=\"192.168.10.1\"\n"}},
+        {{"set", "eth0", "polling-interval=200"}, 0, {"polling-interval/result=\"stored\"\n"}},
+        {{"set", "eth0", "polling-interval=0"}, 1, {"error/exitStatus=1\n"}},
+        {{"get", "eth7"}, 3, {"error/exitStatus=3\n"}},
+        {{"get", "eth0", "no-such-name"}, 2, {"error/exitStatus=2\n"}},
+    };
+    for (const Run& run : runs) {
+        SCOPED_TRACE(testing::PrintToString(run.arguments));
+        std::vector<std::string> withJson = run.arguments;
         withJson.insert(withJson.begin() + 1, "--json");
         const RunResult result = RunKestcfg(withJson);
-        EXPECT_NE(std::string::npos, FlattenJson(result.out).find(expected)) << result.out;
+        EXPECT_EQ(run.exitCode, result.exitCode);
+        const std::string flat = FlattenJson(result.out);
+        for (const std::string& part : run.parts) {
+            EXPECT_NE(std::string::npos, flat.find(part)) << part << result.out;
+        }
+        EXPECT_EQ(std::string::npos, flat.find("\nitems/2/")) << "two items only";
         EXPECT_NE(std::string::npos, result.err.find("CuxNetConfigExpert::Initialize()"))
             << "traced";
     }
@@ -410,27 +440,72 @@ TEST_F(KestcfgControllerTest, ControlCharactersAreEscapedInTablesAndKeptInJson) 
                   .find("value=\"VQ red\\u001b[31m\\u0007 \xc2\x9b!\""));
 }
 
-TEST_F(KestcfgControllerTest, SetCommandLineMistakesAreUsageErrorsThatChangeNothing) {
-    const std::vector<std::vector<std::string>> mistakes = {
-        {"set", "eth0", "polling-interval"},
-        {"set", "eth0", "=5"},
-        {"set", "eth0", "no-such-property=5"},
-        {"set", "eth0", "polling-interval=abc"},
-        {"set", "eth0", "polling-interval=-1"},
-        {"set", "eth0", "polling-interval=4294967296"},
-        {"set", kChassis, "web-service=maybe"},
-        {"set", kChassis, "current-time=2030-02-30T00:00:00Z"},
-        {"set", "eth0", "0x0ABCD000=1"},
-        {"set", "eth0", "polling-interval=5", "0x0D11B000=6"},
+// Command-line mistakes end with status 2 before anything is changed; a mistake in the words
+// before the command's own arguments also names the help to read, in JSON as well.
+TEST_F(KestcfgControllerTest, CommandLineMistakesAreUsageErrorsThatChangeNothing) {
+    struct Mistake {
+        std::vector<std::string> arguments;
+        std::string topic;    // the help the hint names; empty: no hint checked
+        std::string message;  // a part of the error message; empty: not checked
+    };
+    const std::string confirmed = "--confirm-within";
+    const std::vector<Mistake> mistakes = {
+        {{}, "kestcfg", ""},
+        {{"frobnicate"}, "kestcfg", ""},
+        {{"--frobnicate", "info"}, "kestcfg info", ""},
+        {{"--plugin"}, "kestcfg", ""},
+        {{"--plugin="}, "kestcfg", ""},
+        {{"info", "extra"}, "kestcfg info", ""},
+        {{"--sysroot", "/nonexistent/sysroot", "info"}, "kestcfg info", ""},
+        {{"--sysroot", KESTCFG_PATH, "info"}, "kestcfg info", ""},
+        {{"get", "--frobnicate"}, "kestcfg get", ""},
+        {{"refresh", "eth0"}, "kestcfg refresh", ""},
+        {{"set", "eth0"}, "kestcfg set", ""},
+        {{"sim"}, "kestcfg sim", ""},
+        {{"sim", "init"}, "kestcfg sim init", ""},
+        {{"sim", "start", "/tmp/x"}, "kestcfg sim", ""},
+        {{"sim", "init", ""}, "kestcfg sim init", ""},
+        {{"set", "eth0", "polling-interval"}, "", ""},
+        {{"set", "eth0", "=5"}, "", ""},
+        {{"set", "eth0", "no-such-property=5"}, "", ""},
+        {{"set", "eth0", "polling-interval=abc"}, "", ""},
+        {{"set", "eth0", "polling-interval=-1"}, "", ""},
+        {{"set", "eth0", "polling-interval=4294967296"}, "", ""},
+        {{"set", kChassis, "web-service=maybe"}, "", ""},
+        {{"set", kChassis, "current-time=2030-02-30T00:00:00Z"}, "", ""},
+        {{"set", "eth0", "0x0ABCD000=1"}, "", ""},
+        {{"set", "eth0", "polling-interval=5", "0x0D11B000=6"}, "", ""},
+        {{"set", "eth0", "polling-mode=sometimes"}, "", "a mode name (off, polling) or number"},
+        {{"set", "eth0", "polling-interval=250", confirmed}, "", ""},
+        {{"set", "eth0", "polling-interval=250", confirmed, "0"}, "", ""},
+        {{"set", "eth0", "polling-interval=250", confirmed, "-5"}, "", ""},
+        {{"set", "eth0", "polling-interval=250", confirmed, "3601"}, "", ""},
+        {{"set", "eth0", "polling-interval=250", confirmed, "soon"}, "", ""},
+        {{"set", "chassis", "current-time=now", confirmed, "60"},
+         "",
+         "current-time cannot be rolled back"},
+        {{"set", "eth0", "primary-adapter=true", confirmed, "60"}, "", "primary-adapter"},
     };
     const std::string before = State();
-    for (const std::vector<std::string>& arguments : mistakes) {
-        SCOPED_TRACE(testing::PrintToString(arguments));
-        const RunResult result = RunKestcfg(arguments);
+    for (const Mistake& mistake : mistakes) {
+        SCOPED_TRACE(testing::PrintToString(mistake.arguments));
+        const RunResult result = RunKestcfg(mistake.arguments);
         EXPECT_EQ(2, result.exitCode) << result.err;
         EXPECT_EQ("", result.out);
+        EXPECT_EQ(0u, result.err.rfind("kestcfg: ", 0)) << result.err;
+        EXPECT_NE(std::string::npos, result.err.find(mistake.message)) << result.err;
+        if (!mistake.topic.empty()) {
+            EXPECT_NE(std::string::npos, result.err.find("\nTry '" + mistake.topic +
+                                                         " --help' for more information.\n"))
+                << result.err;
+            std::vector<std::string> withJson = mistake.arguments;
+            withJson.push_back("--json");
+            const std::string flat = FlattenJson(RunKestcfg(withJson).out);
+            EXPECT_EQ(0u, flat.find("error/exitStatus=2\nerror/message=\"")) << flat;
+        }
     }
     EXPECT_EQ(before, State());
+    EXPECT_FALSE(sysroot_.Exists("/run/kest/pending-rollback.json"));
 }
 
 }  // namespace

@@ -8,7 +8,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "common/TempSysroot.h"
+#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kest::test::cfg {
@@ -18,50 +18,50 @@ namespace {
 constexpr char kImage[] = "demo firmware\n";
 constexpr char kToolPath[] = "/usr/local/korvane/bin/fwupdate";
 
-class KestcfgFirmwareTest : public ::testing::Test {
+class KestcfgFirmwareTest : public DemoControllerTest {
   protected:
     void SetUp() override {
-        ASSERT_EQ(0, RunKestcfg({"sim", "init", sysroot.Root()}).exitCode);
-        sysroot.WriteFile("/images/firmware.bin", kImage);
+        DemoControllerTest::SetUp();
+        sysroot_.WriteFile("/images/firmware.bin", kImage);
     }
 
     RunResult Install(const std::vector<std::string>& options, const std::string& item) {
-        std::vector<std::string> arguments = {"--sysroot", sysroot.Root()};
+        std::vector<std::string> arguments = {"--sysroot", sysroot_.Root()};
         arguments.insert(arguments.end(), options.begin(), options.end());
         arguments.insert(arguments.end(),
-                         {"firmware", item, sysroot.PathOf("/images/firmware.bin")});
+                         {"firmware", item, sysroot_.PathOf("/images/firmware.bin")});
         return RunKestcfg(arguments);
     }
 
     // The arguments of kestcfg firmware for eth0 and the image file `image`.
     std::vector<std::string> FirmwareArguments(const std::string& image) const {
-        return {"--sysroot", sysroot.Root(), "firmware", "eth0", sysroot.PathOf(image)};
+        return {"--sysroot", sysroot_.Root(), "firmware", "eth0", sysroot_.PathOf(image)};
     }
 
     // A stand-in tool that records the staging file's checksum when it starts and again when
     // the test releases it, then exits 0. Unreleased, it gives up after two minutes or more, so
     // that a failing test cannot hang.
     void InstallWaitingTool() const {
-        sysroot.MakeDirectory("/tool");
-        sysroot.WriteScript(kToolPath, "root='" + sysroot.Root() +
-                                           "'\n"
-                                           "cksum < \"$1\" > \"$root/tool/sum.start\"\n"
-                                           ": > \"$root/tool/started\"\n"
-                                           "n=0\n"
-                                           "while [ ! -e \"$root/tool/release\" ]; do\n"
-                                           "    [ $((n += 1)) -gt 6000 ] && exit 1\n"
-                                           "    sleep 0.02\n"
-                                           "done\n"
-                                           "cksum < \"$1\" > \"$root/tool/sum.end\"\n"
-                                           ": > \"$root/tool/finished\"\n");
+        sysroot_.MakeDirectory("/tool");
+        sysroot_.WriteScript(kToolPath, "root='" + sysroot_.Root() +
+                                            "'\n"
+                                            "cksum < \"$1\" > \"$root/tool/sum.start\"\n"
+                                            ": > \"$root/tool/started\"\n"
+                                            "n=0\n"
+                                            "while [ ! -e \"$root/tool/release\" ]; do\n"
+                                            "    [ $((n += 1)) -gt 6000 ] && exit 1\n"
+                                            "    sleep 0.02\n"
+                                            "done\n"
+                                            "cksum < \"$1\" > \"$root/tool/sum.end\"\n"
+                                            ": > \"$root/tool/finished\"\n");
     }
 
-    bool ToolHas(const char* mark) const { return sysroot.Exists(std::string("/tool/") + mark); }
-    void ReleaseTool() const { sysroot.WriteFile("/tool/release", ""); }
+    bool ToolHas(const char* mark) const { return sysroot_.Exists(std::string("/tool/") + mark); }
+    void ReleaseTool() const { sysroot_.WriteFile("/tool/release", ""); }
 
     // Whether some process holds the controller's firmware update lock.
     bool UpdateLockHeld() const {
-        const int file = open(sysroot.PathOf("/var/run/firmware_update/update.lock").c_str(),
+        const int file = open(sysroot_.PathOf("/var/run/firmware_update/update.lock").c_str(),
                               O_RDONLY | O_CLOEXEC);
         const bool held = file >= 0 && flock(file, LOCK_SH | LOCK_NB) != 0;
         if (file >= 0) {
@@ -69,8 +69,6 @@ class KestcfgFirmwareTest : public ::testing::Test {
         }
         return held;
     }
-
-    kest::test::TempSysroot sysroot;
 };
 
 TEST_F(KestcfgFirmwareTest, InstallsTheImageWithTheDemoToolAndShowsProgress) {
@@ -82,55 +80,56 @@ TEST_F(KestcfgFirmwareTest, InstallsTheImageWithTheDemoToolAndShowsProgress) {
     // Not a terminal: plain progress lines, no bar and no carriage returns.
     EXPECT_NE(std::string::npos, result.err.find("kestcfg: 5% running\n")) << result.err;
     EXPECT_EQ(std::string::npos, result.err.find('\r'));
-    EXPECT_EQ(sysroot.PathOf("/var/volatile/tmp/kestsysxp.fwupdate.cfg") + " 3\n",
-              sysroot.ReadFile("/var/log/fwupdate.log"));
-    EXPECT_EQ(kImage, sysroot.ReadFile("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
+    EXPECT_EQ(sysroot_.PathOf("/var/volatile/tmp/kestsysxp.fwupdate.cfg") + " 3\n",
+              sysroot_.ReadFile("/var/log/fwupdate.log"));
+    EXPECT_EQ(kImage, sysroot_.ReadFile("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
 }
 
 TEST_F(KestcfgFirmwareTest, ReportsAFailingToolAsJsonAndExitsWithFailure) {
-    sysroot.WriteScript("/usr/local/korvane/bin/fwupdate", "exit 1\n");
+    sysroot_.WriteScript("/usr/local/korvane/bin/fwupdate", "exit 1\n");
     const RunResult result = Install({"--json"}, "VQ KEST Chassis");
     EXPECT_EQ(3, result.exitCode);
     const std::string flat = FlattenJson(result.out);
     EXPECT_NE(std::string::npos, flat.find("item=\"VQ KEST Chassis\"\n")) << flat;
     EXPECT_NE(std::string::npos, flat.find("state=\"failed\"\npercent=-1\n")) << flat;
-    EXPECT_FALSE(sysroot.Exists("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
+    EXPECT_FALSE(sysroot_.Exists("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
 }
 
 TEST_F(KestcfgFirmwareTest, UnusableImagesAreRefusedWithTheirPathBeforeAnythingStarts) {
     RunResult result = Install({}, "eth9");
     EXPECT_EQ(3, result.exitCode);
     EXPECT_NE(std::string::npos, result.err.find("there is no item eth9")) << result.err;
-    sysroot.WriteFile("/images/empty.bin", "");
-    ASSERT_EQ(0, mkfifo(sysroot.PathOf("/images/fifo").c_str(), 0600));
+    sysroot_.WriteFile("/images/empty.bin", "");
+    ASSERT_EQ(0, mkfifo(sysroot_.PathOf("/images/fifo").c_str(), 0600));
     const std::vector<std::pair<std::string, std::string>> images = {
-        {sysroot.PathOf("/images/missing.bin"), ": No such file or directory"},
-        {sysroot.PathOf("/images"), " is a directory, not a regular file"},
-        {sysroot.PathOf("/images/fifo"), " is a FIFO, not a regular file"},
-        {sysroot.PathOf("/images/empty.bin"), " is empty"},
+        {sysroot_.PathOf("/images/missing.bin"), ": No such file or directory"},
+        {sysroot_.PathOf("/images"), " is a directory, not a regular file"},
+        {sysroot_.PathOf("/images/fifo"), " is a FIFO, not a regular file"},
+        {sysroot_.PathOf("/images/empty.bin"), " is empty"},
         {"/dev/zero", " is a device, not a regular file"},
     };
     for (const auto& [image, problem] : images) {
         SCOPED_TRACE(image);
-        result = RunKestcfg({"--sysroot", sysroot.Root(), "firmware", "eth0", image, "--json"});
+        result = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware", "eth0", image, "--json"});
         EXPECT_EQ(2, result.exitCode);
         EXPECT_NE(std::string::npos, result.err.find(image + problem)) << result.err;
         EXPECT_NE(std::string::npos, FlattenJson(result.out).find("error/exitStatus=2\n"));
     }
-    EXPECT_FALSE(sysroot.Exists("/var/log/fwupdate.log"));
+    EXPECT_FALSE(sysroot_.Exists("/var/log/fwupdate.log"));
 }
 
 TEST_F(KestcfgFirmwareTest, FirmwareStatusShowsTheLockHolderAndTheStage) {
-    const RunResult idle = RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"});
+    const RunResult idle = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"});
     EXPECT_EQ(0, idle.exitCode) << idle.err;
     EXPECT_EQ("No firmware update is running.\nStatus file: none\n", idle.out);
 
     // An update whose kestcfg is gone: the lock is held by the tool, which keeps the stage.
-    sysroot.WriteFile("/var/run/firmware_update/status", "3\n");
-    sysroot.WriteFile("/var/run/firmware_update/update.lock", "4242\n");
-    const int lock = open(sysroot.PathOf("/var/run/firmware_update/update.lock").c_str(), O_RDONLY);
+    sysroot_.WriteFile("/var/run/firmware_update/status", "3\n");
+    sysroot_.WriteFile("/var/run/firmware_update/update.lock", "4242\n");
+    const int lock =
+        open(sysroot_.PathOf("/var/run/firmware_update/update.lock").c_str(), O_RDONLY);
     ASSERT_EQ(0, flock(lock, LOCK_EX | LOCK_NB));
-    const RunResult running = RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"});
+    const RunResult running = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"});
     EXPECT_EQ(
         "A firmware update is running (started by process 4242).\n"
         "Status file: 3, stage 3 of 5\n",
@@ -147,7 +146,7 @@ namespace {
 
 TEST_F(KestcfgFirmwareTest, ASecondUpdateIsRefusedAsBusyWhileTheFirstToolReadsItsImage) {
     InstallWaitingTool();
-    sysroot.WriteFile("/images/second.bin", "another image\n");
+    sysroot_.WriteFile("/images/second.bin", "another image\n");
     RunningProgram first = StartKestcfg(FirmwareArguments("/images/firmware.bin"));
     ASSERT_TRUE(PollUntil([&] { return ToolHas("started"); }));
     const RunResult second = RunKestcfg(FirmwareArguments("/images/second.bin"));
@@ -156,8 +155,8 @@ TEST_F(KestcfgFirmwareTest, ASecondUpdateIsRefusedAsBusyWhileTheFirstToolReadsIt
     ReleaseTool();
     const RunResult result = FinishProgram(first);
     EXPECT_EQ(0, result.exitCode) << result.err;
-    EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
-    EXPECT_EQ(kImage, sysroot.ReadFile("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
+    EXPECT_EQ(sysroot_.ReadFile("/tool/sum.start"), sysroot_.ReadFile("/tool/sum.end"));
+    EXPECT_EQ(kImage, sysroot_.ReadFile("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
 }
 
 TEST_F(KestcfgFirmwareTest, AfterKestcfgIsKilledTheOrphanedToolKeepsOtherUpdatesOut) {
@@ -168,11 +167,11 @@ TEST_F(KestcfgFirmwareTest, AfterKestcfgIsKilledTheOrphanedToolKeepsOtherUpdates
     FinishProgram(killed);
     const RunResult refused = RunKestcfg(FirmwareArguments("/images/firmware.bin"));
     EXPECT_EQ(4, refused.exitCode) << refused.err;
-    const RunResult followed = RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"});
+    const RunResult followed = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"});
     EXPECT_EQ(0u, followed.out.find("A firmware update is running")) << followed.out;
     ReleaseTool();
     ASSERT_TRUE(PollUntil([&] { return ToolHas("finished") && !UpdateLockHeld(); }));
-    EXPECT_EQ(0u, RunKestcfg({"--sysroot", sysroot.Root(), "firmware-status"})
+    EXPECT_EQ(0u, RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"})
                       .out.find("No firmware update is running."));
     const RunResult accepted = RunKestcfg(FirmwareArguments("/images/firmware.bin"));
     EXPECT_EQ(0, accepted.exitCode) << accepted.err;
@@ -197,7 +196,7 @@ TEST_P(KestcfgFirmwareInterruptTest, TheToolFinishesItsStages) {
     EXPECT_EQ(128 + GetParam(), result.exitCode) << result.err;
     ReleaseTool();
     EXPECT_TRUE(PollUntil([&] { return ToolHas("finished"); }));
-    EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
+    EXPECT_EQ(sysroot_.ReadFile("/tool/sum.start"), sysroot_.ReadFile("/tool/sum.end"));
 }
 
 INSTANTIATE_TEST_SUITE_P(SecondSignal, KestcfgFirmwareInterruptTest,

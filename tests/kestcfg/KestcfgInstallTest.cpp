@@ -53,14 +53,14 @@ TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorK
 
     const std::string kestcfg = prefix.PathOf("/bin/kestcfg");
     const std::string controller = prefix.Root() + "/controller";
-    ASSERT_EQ(0, RunKestcfgAt(kestcfg, {"sim", "init", controller}).exitCode);
-    const RunResult set =
-        RunKestcfgAt(kestcfg, {"--sysroot", controller, "set", "chassis", "comment=installed"});
+    ASSERT_EQ(0, RunKestcfg({"sim", "init", controller}, environ, kestcfg).exitCode);
+    const RunResult set = RunKestcfg(
+        {"--sysroot", controller, "set", "chassis", "comment=installed"}, environ, kestcfg);
     EXPECT_EQ(0, set.exitCode) << set.err;
     EXPECT_NE(
         std::string::npos,
         ReadWhole(controller + "/var/lib/vqtargetcfg/state.ini").find("UserComment=installed"));
-    const RunResult version = RunKestcfgAt(kestcfg, {"--simulator", "--version"});
+    const RunResult version = RunKestcfg({"--simulator", "--version"}, environ, kestcfg);
     EXPECT_EQ(
         "kestcfg 22.5\nplug-in 22.5 (" + prefix.Root() + "/bin/../" + plugin.substr(1) + ")\n",
         version.out)

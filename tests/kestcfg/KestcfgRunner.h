@@ -109,33 +109,24 @@ inline RunResult RunProgram(const std::string& program, const std::vector<std::s
     return FinishProgram(running);
 }
 
-// Starts the kestcfg at `program` in the background; when the tests run under an emulator (a
-// cross build), through the same emulator command.
-inline RunningProgram StartKestcfgAt(const std::string& program,
-                                     const std::vector<std::string>& arguments,
-                                     char* const* environment = environ,
-                                     bool ownProcessGroup = false) {
+// Starts the kestcfg at `program` (the built one by default) in the background; when the tests
+// run under an emulator (a cross build), through the same emulator command.
+inline RunningProgram StartKestcfg(const std::vector<std::string>& arguments,
+                                   bool ownProcessGroup = false, char* const* environment = environ,
+                                   const std::string& program = KESTCFG_PATH) {
     std::vector<std::string> command = {KEST_TEST_EMULATOR};
-    if (command.empty()) {
-        return StartProgram(program, arguments, environment, ownProcessGroup);
-    }
-    const std::string launcher = command.front();
-    command.erase(command.begin());
     command.push_back(program);
     command.insert(command.end(), arguments.begin(), arguments.end());
+    const std::string launcher = command.front();
+    command.erase(command.begin());
     return StartProgram(launcher, command, environment, ownProcessGroup);
 }
 
-// Starts the built kestcfg in the background.
-inline RunningProgram StartKestcfg(const std::vector<std::string>& arguments,
-                                   bool ownProcessGroup = false) {
-    return StartKestcfgAt(KESTCFG_PATH, arguments, environ, ownProcessGroup);
-}
-
-// Runs the kestcfg at `program` with `environment` (the test's own by default) and waits for it.
-inline RunResult RunKestcfgAt(const std::string& program, const std::vector<std::string>& arguments,
-                              char* const* environment = environ) {
-    RunningProgram running = StartKestcfgAt(program, arguments, environment);
+// Runs the kestcfg at `program` (the built one by default) with `environment` and waits for it.
+inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
+                            char* const* environment = environ,
+                            const std::string& program = KESTCFG_PATH) {
+    RunningProgram running = StartKestcfg(arguments, false, environment, program);
     return FinishProgram(running);
 }
 
@@ -165,12 +156,6 @@ bool PollUntil(Condition condition, int limitMs = 60000) {
         usleep(10000);
     }
     return condition();
-}
-
-// Runs the built kestcfg.
-inline RunResult RunKestcfg(const std::vector<std::string>& arguments,
-                            char* const* environment = environ) {
-    return RunKestcfgAt(KESTCFG_PATH, arguments, environment);
 }
 
 // Parses `json` with python3 as exactly one JSON document and returns every scalar as a line

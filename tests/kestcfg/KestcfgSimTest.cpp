@@ -8,7 +8,7 @@
 
 #include <gtest/gtest.h>
 
-#include "common/TempSysroot.h"
+#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kest::test::cfg {
@@ -118,18 +118,18 @@ TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {
     EXPECT_NE(std::string::npos, ReadWhole(root + "/var/log/fwupdate.log").find(" 3\n"));
 }
 
-TEST(KestcfgSimTest, FirmwareToolStandInLogsItsArgumentsAndEndsAtTheLastStage) {
-    kest::test::TempSysroot sysroot;
-    ASSERT_EQ(0, RunKestcfg({"sim", "init", sysroot.Root()}).exitCode);
+class KestcfgSimToolTest : public DemoControllerTest {};
+
+TEST_F(KestcfgSimToolTest, FirmwareToolStandInLogsItsArgumentsAndEndsAtTheLastStage) {
     // The plug-in starts the tool with an empty environment.
     char* const emptyEnvironment[] = {nullptr};
     const RunResult tool =
-        RunProgram(sysroot.PathOf("/usr/local/korvane/bin/fwupdate"),
+        RunProgram(sysroot_.PathOf("/usr/local/korvane/bin/fwupdate"),
                    {"/var/volatile/tmp/kestsysxp.fwupdate.cfg", "3"}, emptyEnvironment);
     EXPECT_EQ(0, tool.exitCode) << tool.err;
     EXPECT_EQ("/var/volatile/tmp/kestsysxp.fwupdate.cfg 3\n",
-              sysroot.ReadFile("/var/log/fwupdate.log"));
-    EXPECT_EQ("5\n", sysroot.ReadFile("/var/run/firmware_update/status"));
+              sysroot_.ReadFile("/var/log/fwupdate.log"));
+    EXPECT_EQ("5\n", sysroot_.ReadFile("/var/run/firmware_update/status"));
 }
 
 }  // namespace

@@ -11,6 +11,7 @@
 #include <functional>
 
 #include "SimFixture.h"
+#include "trace/TraceTestSupport.h"
 
 namespace kest::test::sim {
 namespace {
@@ -89,35 +90,6 @@ struct AllCalls {
     }
 };
 
-// Standard error redirected to a temporary file while the object lives.
-class StderrCapture {
-  public:
-    StderrCapture() : saved_(dup(2)) {
-        char path[] = "/tmp/kest-stderr-XXXXXX";
-        file_ = mkstemp(path);
-        unlink(path);
-        dup2(file_, 2);
-    }
-    ~StderrCapture() {
-        dup2(saved_, 2);
-        close(saved_);
-        close(file_);
-    }
-    std::string Text() const {
-        std::string text;
-        char buffer[512];
-        ssize_t count;
-        for (off_t at = 0; (count = pread(file_, buffer, sizeof buffer, at)) > 0; at += count) {
-            text.append(buffer, static_cast<size_t>(count));
-        }
-        return text;
-    }
-
-  private:
-    int saved_;
-    int file_;
-};
-
 const char kDeviceState[] =
     "[System]\nHostName = kept\n[Device0]\nType = 1\nInterfaceName = eth0\n"
     "MACAddress = 00:11\nMode = 2\nIPAddress = 10.0.0.2\n";
@@ -166,7 +138,7 @@ TEST_F(SimTest, WithoutSysrootEveryCallFailsWithOneLineOnStandardError) {
             setenv("KEST_SYSROOT", value, 1);
         }
         for (const NamedCall& entry : calls.List()) {
-            StderrCapture capture;
+            const kest::test::trace::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
             EXPECT_EQ(entry.call(), -375501) << entry.name;
             const std::string text = capture.Text();
             EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 1) << entry.name << text;

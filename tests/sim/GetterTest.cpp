@@ -57,19 +57,19 @@ const char kState[] =
 
 TEST_F(SimTest, SystemGettersReadTheSystemSection) {
     WriteState(kState);
+    const std::pair<int32_t (*)(NarrowString&), const char*> texts[] = {
+        {tc::system::GetDeviceDescription, "KEST 9100"},
+        {tc::system::GetTargetClass, "kest-class"},
+        {tc::system::GetHostName, "kest-1"},
+        {tc::system::GetLanguageName, "German"},
+        {tc::system::GetTimeZone, "Europe/Berlin"},
+        {tc::network::GetFullyQualifiedDNSName, "kest-1.example.test"},
+    };
     NarrowString text("preset");
-    ASSERT_EQ(tc::system::GetDeviceDescription(text), 0);
-    EXPECT_EQ(text.str(), "KEST 9100");
-    ASSERT_EQ(tc::system::GetTargetClass(text), 0);
-    EXPECT_EQ(text.str(), "kest-class");
-    ASSERT_EQ(tc::system::GetHostName(text), 0);
-    EXPECT_EQ(text.str(), "kest-1");
-    ASSERT_EQ(tc::system::GetLanguageName(text), 0);
-    EXPECT_EQ(text.str(), "German");
-    ASSERT_EQ(tc::system::GetTimeZone(text), 0);
-    EXPECT_EQ(text.str(), "Europe/Berlin");
-    ASSERT_EQ(tc::network::GetFullyQualifiedDNSName(text), 0);
-    EXPECT_EQ(text.str(), "kest-1.example.test");
+    for (const auto& [getter, expected] : texts) {
+        ASSERT_EQ(getter(text), 0) << expected;
+        EXPECT_EQ(text.str(), expected);
+    }
     tc::WideString comment;
     ASSERT_EQ(tc::system::GetUserComment(comment), 0);
     EXPECT_EQ(comment.str(), L"hello");

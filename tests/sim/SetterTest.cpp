@@ -1,10 +1,9 @@
 // Every setter's effect on the state file and its call-log line.
-#include <dirent.h>
-
 #include <functional>
 #include <set>
 
 #include "SimFixture.h"
+#include "trace/TraceTestSupport.h"
 
 namespace kest::test::sim {
 namespace {
@@ -124,15 +123,10 @@ TEST(SimSetters, StateFileAndCallLog) {
         EXPECT_EQ(sim.CallLog(), std::vector<std::string>{row.logLine});
 
         // The file is replaced by rename: no temporary file stays behind.
-        std::set<std::string> entries;
-        DIR* directory = opendir(sim.sysroot_.PathOf("/var/lib/vqtargetcfg").c_str());
-        ASSERT_NE(directory, nullptr);
-        while (const dirent* entry = readdir(directory)) {
-            entries.insert(entry->d_name);
-        }
-        closedir(directory);
-        EXPECT_EQ(entries,
-                  (std::set<std::string>{".", "..", "state.ini", "state.lock", "calls.log"}));
+        const std::vector<std::string> entries =
+            kest::test::trace::EntriesOf(sim.sysroot_.PathOf("/var/lib/vqtargetcfg"));
+        EXPECT_EQ(std::set<std::string>(entries.begin(), entries.end()),
+                  (std::set<std::string>{"state.ini", "state.lock", "calls.log"}));
     }
 }
 

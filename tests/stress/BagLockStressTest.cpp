@@ -1,7 +1,8 @@
 // One property bag locked and written from several threads at once: each locker writes a group of
-// tags under the caller lock (taken twice, as nested callers do), other threads copy the bag and
-// enumerate its tags without the lock. Every copy and every look inside a locked section sees a
-// whole group, enumerations are ascending snapshots, and no write is lost.
+// tags under the caller lock (taken twice, as nested callers do), writers add tags without the
+// lock, other threads copy the bag and enumerate its tags. Every copy and every look inside a
+// locked section sees a whole group, no unlocked write lands inside a locked section,
+// enumerations are ascending snapshots, and no write is lost.
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -20,6 +21,8 @@ constexpr uint32_t kCounterTag = 0x10;
 constexpr int kLockers = 4;
 constexpr int kRoundsPerLocker = 400;
 constexpr int kObservers = 2;
+constexpr uint32_t kWriters = 2;
+constexpr uint32_t kWritesPerWriter = 500;
 
 // True when every group tag holds the same value.
 bool GroupIsWhole(IuxSysPropertyBag* bag) {
@@ -36,8 +39,9 @@ bool GroupIsWhole(IuxSysPropertyBag* bag) {
     return true;
 }
 
-// True when the enumerator yields strictly ascending tags.
-bool Ascending(IuxSysEnumPropertyTag* tags) {
+// The number of tags the enumerator yields, or -1 when they are not strictly ascending.
+int CountAscending(IuxSysEnumPropertyTag* tags) {
+    int count = 0;
     uint32_t previous = 0;
     bool first = true;
     uint32_t batch[3];
@@ -47,13 +51,19 @@ bool Ascending(IuxSysEnumPropertyTag* tags) {
         status = tags->Next(3, batch, &fetched);
         for (uint32_t i = 0; i < fetched; ++i) {
             if (!first && batch[i] <= previous) {
-                return false;
+                return -1;
             }
+            ++count;
             previous = batch[i];
             first = false;
         }
     } while (status == S_OK);
-    return status == S_FALSE;
+    return status == S_FALSE ? count : -1;
+}
+
+int CountTags(IuxSysPropertyBag4* bag) {
+    CountedPtr<IuxSysEnumPropertyTag> tags;
+    return bag->GetTagEnumerator(tags.Receive()) == S_OK ? CountAscending(tags.Get()) : -1;
 }
 
 TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
@@ -66,6 +76,7 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
     std::atomic<int> brokenGroups{0};
     std::atomic<int> failedCalls{0};
     std::atomic<int> unorderedEnumerations{0};
+    std::atomic<int> interleavedWrites{0};
 
     std::vector<std::thread> threads;
     for (int locker = 0; locker < kLockers; ++locker) {
@@ -75,6 +86,7 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
                 const uint32_t value = static_cast<uint32_t>(locker * 100000 + round);
                 failedCalls += bag->LockBag() != S_OK;
                 failedCalls += bag->LockBag() != S_OK;
+                const int tagsBefore = CountTags(bag.Get());
                 for (uint32_t tag : kGroupTags) {
                     failedCalls += bag->SetULong(tag, value) != S_OK;
                     std::this_thread::yield();
@@ -83,6 +95,7 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
                 uint32_t counter = 0;
                 failedCalls += bag->GetULong(kCounterTag, &counter) != S_OK;
                 failedCalls += bag->SetULong(kCounterTag, counter + 1) != S_OK;
+                interleavedWrites += CountTags(bag.Get()) != tagsBefore;
                 // One level of the lock given back, the other still held: a tag of this locker
                 // appears, and outside the lock every other round it goes again.
                 failedCalls += bag->UnlockBag() != S_OK;
@@ -95,6 +108,13 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
             --lockersRunning;
         });
     }
+    for (uint32_t writer = 0; writer < kWriters; ++writer) {
+        threads.emplace_back([&, writer] {
+            for (uint32_t i = 0; i < kWritesPerWriter; ++i) {
+                failedCalls += bag->SetULong(0x10000 * (writer + 1) + i, i) != S_OK;
+            }
+        });
+    }
     for (int observer = 0; observer < kObservers; ++observer) {
         threads.emplace_back([&] {
             while (lockersRunning > 0) {
@@ -103,10 +123,10 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
                 brokenGroups += !GroupIsWhole(copy.Get());
                 CountedPtr<IuxSysEnumPropertyTag> tags;
                 failedCalls += bag->GetTagEnumerator(tags.Receive()) != S_OK;
-                unorderedEnumerations += !Ascending(tags.Get());
+                unorderedEnumerations += CountAscending(tags.Get()) < 0;
                 CountedPtr<IuxSysEnumPropertyTag> modified;
                 failedCalls += bag->GetModifiedTagEnumerator(modified.Receive()) != S_OK;
-                unorderedEnumerations += !Ascending(modified.Get());
+                unorderedEnumerations += CountAscending(modified.Get()) < 0;
             }
         });
     }
@@ -117,6 +137,11 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
     EXPECT_EQ(0, failedCalls.load());
     EXPECT_EQ(0, brokenGroups.load());
     EXPECT_EQ(0, unorderedEnumerations.load());
+    EXPECT_EQ(0, interleavedWrites.load()) << "an unlocked write landed inside a locked section";
+    EXPECT_TRUE(GroupIsWhole(bag.Get()));
+    uint32_t group = 0;
+    EXPECT_EQ(S_OK, bag->GetULong(kGroupTags[0], &group));
+    EXPECT_EQ(static_cast<uint32_t>(kRoundsPerLocker), group % 100000) << "a last round was lost";
     uint32_t counter = 0;
     EXPECT_EQ(S_OK, bag->GetULong(kCounterTag, &counter));
     EXPECT_EQ(static_cast<uint32_t>(kLockers * kRoundsPerLocker), counter);
@@ -124,6 +149,7 @@ TEST(StressBagLockTest, LockedGroupsStayWholeAndNoWriteIsLost) {
     for (int locker = 0; locker < kLockers; ++locker) {
         EXPECT_EQ(S_FALSE, bag->HasTag(0x1000 + static_cast<uint32_t>(locker)));
     }
+    EXPECT_EQ(static_cast<int>(1 + 4 + kWriters * kWritesPerWriter), CountTags(bag.Get()));
 }
 
 }  // namespace
