@@ -49,26 +49,6 @@ INSTANTIATE_TEST_SUITE_P(
 
 }  // namespace
 
-// A document whose text starts like a byte-order mark: the first key of the unnamed section.
-TEST(IniReadBackMarkTest, NamesThatLookLikeAByteOrderMarkReadBack) {
-    TempSysroot dir;
-    for (const char* name : {"\xFF\xFEkey", "\xFE\xFFkey", "\xEF\xBB\xBFkey"}) {
-        for (uint32_t flags : {0u, kIniWriteByteOrderMark}) {
-            IniTextPtr ini(IniText_Create());
-            ASSERT_EQ(IniText_SetRaw(ini.get(), nullptr, name, "v", 0), kIniFound);
-            int loaded = 0;
-            IniTextPtr again = LoadFromBytes(dir, SavedText(dir, ini.get(), flags),
-                                             kIniReadColonsAndUnnamedSection, &loaded);
-            ASSERT_EQ(loaded, 0) << name;
-            const char* key = nullptr;
-            const char* value = nullptr;
-            ASSERT_EQ(IniText_GetKeyByIndex(again.get(), nullptr, 1, &key, &value), kIniFound);
-            EXPECT_STREQ(key, name);
-            EXPECT_STREQ(value, "v");
-        }
-    }
-}
-
 // Keys whose own names read as pieces of a split value (" Line" and a number) come back under
 // their own names, whether they follow a split value or fit on one line, with or without a
 // maximum line length.
