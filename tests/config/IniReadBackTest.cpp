@@ -79,33 +79,6 @@ TEST(IniReadBackPiecesTest, KeysNamedLikePiecesStayKeys) {
     }
 }
 
-// With unique names a joined run that takes the name of another key merges with it, the later
-// value winning as for a repeated key line; without unique names both keys stay.
-TEST(IniReadBackPiecesTest, JoinedRunsKeepNamesUnique) {
-    TempSysroot dir;
-    struct Case {
-        const char* lines;
-        const char* value;  // of the one key "x" under unique names
-    };
-    for (const Case& c : {Case{"x=first\nx Line1=second\ny=1\n", "second"},
-                          Case{"x Line1=a\nx Line2=b\ny=1\nx=c\n", "c"}}) {
-        IniTextPtr unique = LoadFromBytes(dir, std::string("[S]\n") + c.lines);
-        EXPECT_EQ(IniText_GetKeyCount(unique.get(), "S"), 2) << c.lines;
-        EXPECT_EQ(ValueOf(unique.get(), "S", "x"), c.value) << c.lines;
-        const char* key = nullptr;
-        const char* value = nullptr;
-        ASSERT_EQ(IniText_GetKeyByIndex(unique.get(), "S", 1, &key, &value), kIniFound);
-        EXPECT_STREQ(key, "x");
-
-        IniTextPtr repeated(IniText_Create());
-        IniText_SetNameOptions(repeated.get(), false, false);
-        const std::string path = dir.PathOf("/repeated.ini");
-        WriteBytes(path, std::string("[S]\n") + c.lines);
-        ASSERT_EQ(IniText_Load(repeated.get(), path.c_str()), 0);
-        EXPECT_EQ(IniText_GetKeyCount(repeated.get(), "S"), 3) << c.lines;
-    }
-}
-
 // The setters' promise under the cache's read flags: every value and quote mark they accept
 // reads back as given, whatever the line length; what they refuse (-22) would not have.
 TEST(IniReadBackPromiseTest, AcceptedValuesReadBackAndRefusedOnesWouldNot) {
