@@ -251,6 +251,9 @@ Normalised Normalise(const std::string& raw) {
         result.skip = true;
         return result;
     }
+    // Both readers skip a UTF-8 mark; it stays, so that text after it that looks like a wide
+    // mark is not taken for one.
+    result.text = text.substr(0, static_cast<size_t>(start));
     text.erase(0, static_cast<size_t>(start));
     bool afterKey = false;
     for (std::string& line : SplitLines(text, result.rules)) {
