@@ -122,13 +122,20 @@ INSTANTIATE_TEST_SUITE_P(Quotes, IniQuoteTest,
 struct JoinCase {
     std::string lines;
     KeyList keys;
+    bool uniqueNames = true;
 };
 
 class IniLineJoinTest : public ::testing::TestWithParam<JoinCase> {};
 
+// With unique names a joined run that takes the name of another key merges with it, the later
+// value winning as for a repeated key line; without unique names both keys stay.
 TEST_P(IniLineJoinTest, RunsOfNumberedLineKeysBecomeOneKey) {
     TempSysroot dir;
-    IniTextPtr ini = LoadFromBytes(dir, "[s]\n" + GetParam().lines);
+    const std::string path = dir.PathOf("/joined.ini");
+    WriteBytes(path, "[s]\n" + GetParam().lines);
+    IniTextPtr ini(IniText_Create());
+    IniText_SetNameOptions(ini.get(), GetParam().uniqueNames, false);
+    ASSERT_EQ(IniText_Load(ini.get(), path.c_str()), 0);
     EXPECT_EQ(KeysOf(ini.get(), "s"), GetParam().keys);
 }
 
@@ -140,7 +147,13 @@ INSTANTIATE_TEST_SUITE_P(
         JoinCase{"x Line0001=a\ny Line0001=b\nx Line0002=c\n", {{"x", "a"}, {"y", "bc"}}},
         JoinCase{"x Line0002=a\nx Line0003=b\n", {{"x Line0002", "a"}, {"x Line0003", "b"}}},
         JoinCase{"x Line=a\nxLine1=b\n", {{"x Line", "a"}, {"xLine1", "b"}}},
-        JoinCase{"x Line1=a\nx Line99999999999=b\n", {{"x", "a"}, {"x Line99999999999", "b"}}}));
+        JoinCase{"x Line1=a\nx Line99999999999=b\n", {{"x", "a"}, {"x Line99999999999", "b"}}},
+        JoinCase{"x=first\nx Line1=second\ny=1\n", {{"x", "second"}, {"y", "1"}}},
+        JoinCase{"x Line1=a\nx Line2=b\ny=1\nx=c\n", {{"x", "c"}, {"y", "1"}}},
+        JoinCase{
+            "x=first\nx Line1=second\ny=1\n", {{"x", "first"}, {"x", "second"}, {"y", "1"}}, false},
+        JoinCase{
+            "x Line1=a\nx Line2=b\ny=1\nx=c\n", {{"x", "ab"}, {"y", "1"}, {"x", "c"}}, false}));
 
 TEST(IniReadTest, CommentsAreKeptAndWrittenOnlyWhenAskedFor) {
     const std::string text = "; head\n[s]\n\n; about k\nk=1\nbad line\n; tail\n";

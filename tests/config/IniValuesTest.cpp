@@ -14,42 +14,6 @@ IniTextPtr WithValue(const std::string& value) {
     return ini;
 }
 
-struct IntegerCase {
-    std::string text;
-    int unsignedResult;  // for the value, compare with the text itself
-    int signedResult;
-};
-
-class IniIntegerTest : public ::testing::TestWithParam<IntegerCase> {};
-
-TEST_P(IniIntegerTest, AcceptsExactlyThirtyTwoBitDecimalNumbers) {
-    IniTextPtr ini = WithValue(GetParam().text);
-    uint32_t unsignedValue = 0;
-    int32_t signedValue = 0;
-    EXPECT_EQ(IniText_GetUInt32(ini.get(), "s", "k", &unsignedValue), GetParam().unsignedResult);
-    EXPECT_EQ(IniText_GetInt32(ini.get(), "s", "k", &signedValue), GetParam().signedResult);
-    if (GetParam().unsignedResult == kIniFound) {
-        EXPECT_EQ(unsignedValue, std::stoul(GetParam().text));
-    }
-    if (GetParam().signedResult == kIniFound) {
-        EXPECT_EQ(signedValue, std::stol(GetParam().text));
-    }
-}
-
-INSTANTIATE_TEST_SUITE_P(
-    Bounds, IniIntegerTest,
-    ::testing::Values(IntegerCase{"+7", 1, 1}, IntegerCase{"4294967295", 1, kIniNotInt32},
-                      IntegerCase{"4294967296", kIniNotUInt32, kIniNotInt32},
-                      IntegerCase{"99999999999999999999", kIniNotUInt32, kIniNotInt32},
-                      IntegerCase{"2147483647", 1, 1}, IntegerCase{"2147483648", 1, kIniNotInt32},
-                      IntegerCase{"-2147483648", kIniNotUInt32, 1},
-                      IntegerCase{"-2147483649", kIniNotUInt32, kIniNotInt32},
-                      IntegerCase{"-0", kIniNotUInt32, 1},
-                      IntegerCase{"+ 7", kIniNotUInt32, kIniNotInt32},
-                      IntegerCase{"12a", kIniNotUInt32, kIniNotInt32},
-                      IntegerCase{"0x10", kIniNotUInt32, kIniNotInt32},
-                      IntegerCase{"+", kIniNotUInt32, kIniNotInt32}));
-
 TEST(IniValueTest, BooleansDoublesAndBlankValues) {
     bool flag = false;
     EXPECT_EQ(IniText_GetBoolean(WithValue("TRUE").get(), "s", "k", &flag), kIniFound);
