@@ -49,6 +49,21 @@ inline std::optional<std::string> ValueOf(const IniText* ini, const char* sectio
     return std::string(value);
 }
 
+// Sections and keys in order, as "[s] k=v k2=v2 [t] ..."; a section found by name.
+inline std::string Dump(const IniText* ini) {
+    std::string text;
+    const char* section = nullptr;
+    for (int s = 1; IniText_GetSectionName(ini, s, &section) == kIniFound; ++s) {
+        text += (s > 1 ? " [" : "[") + std::string(section) + "]";
+        const char* key = nullptr;
+        const char* value = nullptr;
+        for (int k = 1; IniText_GetKeyByIndex(ini, section, k, &key, &value) == kIniFound; ++k) {
+            text += " " + std::string(key) + "=" + value;
+        }
+    }
+    return text;
+}
+
 // What IniText_Save writes for `ini` under the given write options.
 inline std::string SavedText(const kest::test::TempSysroot& dir, IniText* ini, uint32_t flags = 0,
                              int maxLineLength = kIniNoMaxLineLength, int split = 0) {
