@@ -22,45 +22,72 @@ using kest::test::TempSysroot;
 
 namespace {
 
-IniTextPtr SampleDocument() {
-    IniTextPtr ini(IniText_Create());
-    IniText_SetRaw(ini.get(), "s", "k", "v", 0);
-    IniText_SetString(ini.get(), "s", "q", "a b", false);
-    IniText_SetRaw(ini.get(), nullptr, "top", "1", 0);
-    IniText_SetRaw(ini.get(), "e", "gone", "x", 0);
-    IniText_DeleteKey(ini.get(), "e", "gone");
-    return ini;
-}
+const std::string kSample = "top=1\n[s]\nk=v\nq=\"a b\"\n[e]\n";
 
-TEST(IniWriteTest, LayoutFollowsTheWriteFlags) {
-    TempSysroot dir;
-    IniTextPtr ini = SampleDocument();
-    EXPECT_EQ(SavedText(dir, ini.get()), "top=1\n\n[s]\nk=v\nq=\"a b\"\n\n[e]\n\n");
-    EXPECT_EQ(SavedText(dir, ini.get(), kIniWriteSpacedSeparator | kIniWriteByteOrderMark),
-              "\xEF\xBB\xBFtop = 1\n\n[s]\nk = v\nq = \"a b\"\n\n[e]\n\n");
-}
+struct WriteCase {
+    std::string document;  // loaded with keys before the first header allowed
+    uint32_t flags;
+    int maxLineLength;
+    char splitCharacter;
+    std::string saved;
+};
 
-TEST(IniWriteTest, LongValuesAreSplitIntoNumberedLinesWithinTheMaximum) {
+// Layout by the write flags; long values split into numbered Line keys within the maximum, at
+// the split character when given; a value without a clean cut on one longer line; a key named
+// like a piece written as a run of one.
+const WriteCase kWriteCases[] = {
+    {kSample, 0, kIniNoMaxLineLength, 0, "top=1\n\n[s]\nk=v\nq=\"a b\"\n\n[e]\n\n"},
+    {kSample, kIniWriteSpacedSeparator | kIniWriteByteOrderMark, kIniNoMaxLineLength, 0,
+     "\xEF\xBB\xBFtop = 1\n\n[s]\nk = v\nq = \"a b\"\n\n[e]\n\n"},
+    {"[s]\nk=" + std::string(40, 'x') + "\nlist=aaaa,bbbb,cccc,dddd,eeee,ffff\n", 0, 30, ',',
+     "[s]\nk Line0001=xxxxxxxxxxxxxxxxx\nk Line0002=xxxxxxxxxxxxxxxxx\nk Line0003=xxxxxx\n"
+     "list Line0001=aaaa,bbbb,\nlist Line0002=cccc,dddd,\nlist Line0003=eeee,ffff\n\n"},
+    {"[s]\nk=a" + std::string(60, ' ') + "b\n", 0, 40, 0,
+     "[s]\nk Line0001=a" + std::string(60, ' ') + "b\n\n"},
+    {"[S]\nd Line0009 Line0001=literal\n", 0, 40, 0, "[S]\nd Line0009 Line0001=literal\n\n"},
+};
+
+TEST(IniWriteTest, DocumentsSaveAsTexts) {
     TempSysroot dir;
-    IniTextPtr ini(IniText_Create());
-    IniText_SetRaw(ini.get(), "s", "k", std::string(40, 'x').c_str(), 0);
-    IniText_SetRaw(ini.get(), "s", "list", "aaaa,bbbb,cccc,dddd,eeee,ffff", 0);
-    EXPECT_EQ(SavedText(dir, ini.get(), 0, 30, ','),
-              "[s]\nk Line0001=xxxxxxxxxxxxxxxxx\nk Line0002=xxxxxxxxxxxxxxxxx\n"
-              "k Line0003=xxxxxx\nlist Line0001=aaaa,bbbb,\nlist Line0002=cccc,dddd,\n"
-              "list Line0003=eeee,ffff\n\n");
-    IniText_SetRaw(ini.get(), "s", "tenletters", std::string(30, 'x').c_str(), 0);
+    for (const WriteCase& c : kWriteCases) {
+        IniTextPtr ini =
+            LoadFromBytes(dir, c.document, kIniDefaultReadFlags | kIniReadColonsAndUnnamedSection);
+        EXPECT_EQ(SavedText(dir, ini.get(), c.flags, c.maxLineLength, c.splitCharacter), c.saved);
+    }
+    IniTextPtr ini = LoadFromBytes(dir, "[s]\ntenletters=" + std::string(30, 'x'));
     IniText_SetWriteOptions(ini.get(), 22, 0, 0);
     EXPECT_EQ(IniText_Save(ini.get(), dir.PathOf("/x.ini").c_str()), kIniNoRoomToSplit);
     EXPECT_EQ(IniText_SetWriteOptions(ini.get(), 80, 200, 0), kIniNotInt32);
 }
 
-TEST(IniWriteTest, ValueWithoutACleanCutStaysOnOneLongerLine) {
+// The setters' promise under the cache's read flags: every value and quote mark they accept
+// reads back as given, whatever the line length; what they refuse (-22) would not have.
+TEST(IniWriteTest, AcceptedValuesReadBackAndRefusedOnesWouldNot) {
     TempSysroot dir;
-    const std::string value = "a" + std::string(60, ' ') + "b";
-    IniTextPtr ini(IniText_Create());
-    IniText_SetRaw(ini.get(), "s", "k", value.c_str(), 0);
-    EXPECT_EQ(SavedText(dir, ini.get(), 0, 40), "[s]\nk Line0001=" + value + "\n\n");
+    constexpr uint32_t kCacheReadFlags = kIniReadKeepEmptyValues | kIniReadStripDoubleQuotes;
+    const std::string values[] = {
+        "",     "plain", "\"enclosed\"", "'apostrophes'", "\"",
+        "\"\"", "''",    "a\"b",         "\"a",           "a\"",
+        "'a",   "x=y;z", "\"a\" \"b\"",  "\" padded \"",  "\"" + std::string(50, 'l') + "\""};
+    for (char quote : {'\0', '"', '\'', '`'}) {
+        for (const std::string& value : values) {
+            for (int maxLineLength : {kIniNoMaxLineLength, 30}) {
+                IniTextPtr ini(IniText_Create());
+                const int set = IniText_SetRaw(ini.get(), "S", "k", value.c_str(), quote);
+                std::string saved;
+                if (set == kIniFound) {
+                    saved = SavedText(dir, ini.get(), kIniWriteSpacedSeparator, maxLineLength);
+                } else {
+                    EXPECT_EQ(set, kIniInvalidArgument);
+                    // What the line would have been.
+                    saved = "[S]\nk = " + (quote != 0 ? quote + value + quote : value) + "\n";
+                }
+                IniTextPtr loaded = LoadFromBytes(dir, saved, kCacheReadFlags);
+                EXPECT_EQ(ValueOf(loaded.get(), "S", "k") == value, set == kIniFound)
+                    << "quote " << int(quote) << ": " << saved;
+            }
+        }
+    }
 }
 
 TEST(IniWriteTest, TemporaryNameReplacesOrAppendsTheExtension) {
@@ -94,7 +121,7 @@ std::vector<std::string> NamesCreatedBy(const std::string& directory,
 
 TEST(IniWriteTest, SafeReplacementUsesTheTemporaryNameAndKeepsModeAndOwner) {
     TempSysroot dir;
-    IniTextPtr ini = SampleDocument();
+    IniTextPtr ini = LoadFromBytes(dir, kSample, kIniReadColonsAndUnnamedSection);
     std::string target = dir.PathOf("/name.ini");
     WriteBytes(target, "old");
     ASSERT_EQ(chmod(target.c_str(), 0640), 0);
@@ -169,7 +196,7 @@ TEST(IniWriteTest, UnwritableTargetsAndUnreadableNamesOrValuesAreRefused) {
     TempSysroot dir;
     dir.WriteFile("/plain", "x");
     std::string throughFile = dir.PathOf("/plain/sub.ini");
-    IniTextPtr ini = SampleDocument();
+    IniTextPtr ini = LoadFromBytes(dir, "[s]\nk=v\n");
     IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0, kIniWriteSafeReplacement);
     EXPECT_EQ(IniText_Save(ini.get(), throughFile.c_str()), kIniCannotWriteTarget);
     EXPECT_EQ(IniText_Save(ini.get(), dir.Root().c_str()), kIniCannotWriteTarget);
