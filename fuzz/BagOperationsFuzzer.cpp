@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
+#include <cwchar>
 #include <map>
 #include <string>
 #include <vector>
@@ -21,11 +22,10 @@ namespace {
 constexpr uint32_t kTags[] = {0,          1,          2,          kest::tag::kHostName,
                               0x7FFFFFFF, 0x80000000, 0xFFFFFFFE, 0xFFFFFFFF};
 
-// One value of the model: its type code and its bytes (text for strings).
+// One value of the model: its type code and its bytes (the wide characters of a string).
 struct ModelValue {
     uint32_t type = 0;
     std::string bytes;
-    std::wstring text;
     bool modified = false;
 };
 
@@ -34,6 +34,10 @@ using Model = std::map<uint32_t, ModelValue>;
 template <class T>
 std::string BytesOf(const T& value) {
     return std::string(reinterpret_cast<const char*>(&value), sizeof value);
+}
+
+std::string BytesOf(const std::wstring& text) {
+    return std::string(reinterpret_cast<const char*>(text.data()), text.size() * sizeof(wchar_t));
 }
 
 class BagSession {
@@ -55,53 +59,44 @@ class BagSession {
         const uint32_t tag = input_.PickValueInArray(kTags);
         switch (input_.ConsumeIntegralInRange<int>(0, 20)) {
             case 0: {
-                // Any nonzero value is true.
-                const int32_t value = input_.ConsumeIntegral<int32_t>();
-                Set(tag, UX_PROPERTY_TYPE_BOOL, BytesOf<bool>(value != 0),
-                    [&] { return bag_->SetBool(tag, value); });
-                break;
+                const int32_t value = input_.ConsumeIntegral<int32_t>();  // nonzero is true
+                return Set(tag, UX_PROPERTY_TYPE_BOOL, BytesOf<bool>(value != 0),
+                           bag_->SetBool(tag, value));
             }
             case 1: {
                 const int32_t value = input_.ConsumeIntegral<int32_t>();
-                Set(tag, UX_PROPERTY_TYPE_LONG, BytesOf(value),
-                    [&] { return bag_->SetLong(tag, value); });
-                break;
+                return Set(tag, UX_PROPERTY_TYPE_LONG, BytesOf(value), bag_->SetLong(tag, value));
             }
             case 2: {
                 const uint32_t value = input_.ConsumeIntegral<uint32_t>();
-                Set(tag, UX_PROPERTY_TYPE_ULONG, BytesOf(value),
-                    [&] { return bag_->SetULong(tag, value); });
-                break;
+                return Set(tag, UX_PROPERTY_TYPE_ULONG, BytesOf(value), bag_->SetULong(tag, value));
             }
             case 3: {
                 const uint64_t pattern = input_.ConsumeIntegral<uint64_t>();
                 double value = 0;
                 std::memcpy(&value, &pattern, sizeof value);
-                Set(tag, UX_PROPERTY_TYPE_DOUBLE, BytesOf(pattern),
-                    [&] { return bag_->SetDouble(tag, value); });
-                break;
+                return Set(tag, UX_PROPERTY_TYPE_DOUBLE, BytesOf(value),
+                           bag_->SetDouble(tag, value));
             }
             case 4: {
                 GUID value{};
                 input_.ConsumeData(&value, sizeof value);
-                Set(tag, UX_PROPERTY_TYPE_GUID, BytesOf(value),
-                    [&] { return bag_->SetGuid(tag, value); });
-                break;
+                return Set(tag, UX_PROPERTY_TYPE_GUID, BytesOf(value), bag_->SetGuid(tag, value));
             }
-            case 5:
-                SetString(tag);
-                break;
+            case 5: {
+                const std::wstring text = ConsumeText();
+                return Set(tag, UX_PROPERTY_TYPE_STRING, BytesOf(text),
+                           bag_->SetString(tag, text.c_str()));
+            }
             case 6: {
                 uxSysAttrTimestampUTC value{};
                 value.fraction = input_.ConsumeIntegral<uint64_t>();
                 value.seconds = input_.ConsumeIntegral<int64_t>();
-                Set(tag, UX_PROPERTY_TYPE_TIMESTAMP, BytesOf(value),
-                    [&] { return bag_->SetTimestamp(tag, value); });
-                break;
+                return Set(tag, UX_PROPERTY_TYPE_TIMESTAMP, BytesOf(value),
+                           bag_->SetTimestamp(tag, value));
             }
             case 7:
-                Get(tag);
-                break;
+                return Get(tag);
             case 8:
                 FUZZ_CHECK(bag_->HasTag(tag) == (model_.count(tag) != 0 ? S_OK : S_FALSE));
                 break;
@@ -121,7 +116,7 @@ class BagSession {
                 model_.clear();
                 break;
             case 12: {
-                const bool any = !ModifiedTags().empty();
+                const bool any = !Tags(true).empty();
                 FUZZ_CHECK(bag_->ClearAllModified() == (any ? S_OK : S_FALSE));
                 for (auto& entry : model_) {
                     entry.second.modified = false;
@@ -129,8 +124,7 @@ class BagSession {
                 break;
             }
             case 13:
-                ClearModified(tag);
-                break;
+                return ClearModified(tag);
             case 14:
                 FUZZ_CHECK(bag_->MarkModified(tag) == Presence(tag));
                 if (model_.count(tag) != 0) {
@@ -140,18 +134,17 @@ class BagSession {
             case 15: {
                 CountedPtr<IuxSysEnumPropertyTag> tags;
                 const HRESULT status = bag_->GetTagEnumerator(tags.Receive());
-                CheckEnumerator(status, tags.Get(), AllTags());
+                CheckEnumerator(status, tags.Get(), Tags(false));
                 break;
             }
             case 16: {
                 CountedPtr<IuxSysEnumPropertyTag> tags;
                 const HRESULT status = bag_->GetModifiedTagEnumerator(tags.Receive());
-                CheckEnumerator(status, tags.Get(), ModifiedTags());
+                CheckEnumerator(status, tags.Get(), Tags(true));
                 break;
             }
             case 17:
-                Clone();
-                break;
+                return Clone();
             case 18:
                 FUZZ_CHECK(bag_->LockBag() == S_OK);
                 ++lockDepth_;
@@ -161,8 +154,7 @@ class BagSession {
                 lockDepth_ -= lockDepth_ > 0 ? 1 : 0;
                 break;
             default:
-                TimestampFields(tag);
-                break;
+                return TimestampFields(tag);
         }
     }
 
@@ -180,22 +172,19 @@ class BagSession {
         return found->second.type == type ? S_OK : UX_E_PROPERTY_TYPE_MISMATCH;
     }
 
-    template <class Call>
-    void Set(uint32_t tag, uint32_t type, const std::string& bytes, Call call) {
-        const HRESULT status = call();
+    // Checks the status of a setter call that stored `bytes` as `type`, and records the value.
+    void Set(uint32_t tag, uint32_t type, const std::string& bytes, HRESULT status) {
         const auto found = model_.find(tag);
         if (found != model_.end() && found->second.type != type) {
             FUZZ_CHECK(status == UX_E_PROPERTY_TYPE_MISMATCH);
             return;
         }
         FUZZ_CHECK(status == S_OK);
-        ModelValue& value = model_[tag];
-        value.type = type;
-        value.bytes = bytes;
-        value.modified = true;
+        model_[tag] = ModelValue{type, bytes, true};
     }
 
-    void SetString(uint32_t tag) {
+    // Up to 40 nonzero 32-bit units.
+    std::wstring ConsumeText() {
         std::wstring text;
         const size_t length = input_.ConsumeIntegralInRange<size_t>(0, 40);
         for (size_t i = 0; i < length; ++i) {
@@ -205,27 +194,15 @@ class BagSession {
             }
             text += unit;
         }
-        const HRESULT status = bag_->SetString(tag, text.c_str());
-        const auto found = model_.find(tag);
-        if (found != model_.end() && found->second.type != UX_PROPERTY_TYPE_STRING) {
-            FUZZ_CHECK(status == UX_E_PROPERTY_TYPE_MISMATCH);
-            return;
-        }
-        FUZZ_CHECK(status == S_OK);
-        ModelValue& value = model_[tag];
-        value.type = UX_PROPERTY_TYPE_STRING;
-        value.text = text;
-        value.modified = true;
+        return text;
     }
 
-    template <class T, class Getter>
-    void GetTyped(uint32_t tag, uint32_t type, Getter getter) {
+    template <class Bag, class T>
+    void GetTyped(uint32_t tag, uint32_t type, HRESULT (Bag::*getter)(uint32_t, T*)) {
         T value{};
-        const HRESULT status = getter(&value);
+        const HRESULT status = (bag_.Get()->*getter)(tag, &value);
         FUZZ_CHECK(status == Expected(tag, type));
-        if (status == S_OK) {
-            FUZZ_CHECK(BytesOf(value) == model_[tag].bytes);
-        }
+        FUZZ_CHECK(status != S_OK || BytesOf(value) == model_[tag].bytes);
     }
 
     void Get(uint32_t tag) {
@@ -236,46 +213,27 @@ class BagSession {
                 FUZZ_CHECK(status == Expected(tag, UX_PROPERTY_TYPE_BOOL));
                 const bool stored = status == S_OK && model_[tag].bytes == BytesOf<bool>(true);
                 FUZZ_CHECK(value == (stored ? 1 : 0));
-                break;
+                return;
             }
             case 1:
-                GetTyped<int32_t>(tag, UX_PROPERTY_TYPE_LONG,
-                                  [&](int32_t* value) { return bag_->GetLong(tag, value); });
-                break;
+                return GetTyped(tag, UX_PROPERTY_TYPE_LONG, &IuxSysPropertyBag4::GetLong);
             case 2:
-                GetTyped<uint32_t>(tag, UX_PROPERTY_TYPE_ULONG,
-                                   [&](uint32_t* value) { return bag_->GetULong(tag, value); });
-                break;
+                return GetTyped(tag, UX_PROPERTY_TYPE_ULONG, &IuxSysPropertyBag4::GetULong);
             case 3:
-                GetTyped<uint64_t>(tag, UX_PROPERTY_TYPE_DOUBLE, [&](uint64_t* pattern) {
-                    double value = 0;
-                    const HRESULT status = bag_->GetDouble(tag, &value);
-                    std::memcpy(pattern, &value, sizeof value);
-                    return status;
-                });
-                break;
+                return GetTyped(tag, UX_PROPERTY_TYPE_DOUBLE, &IuxSysPropertyBag4::GetDouble);
             case 4:
-                GetTyped<GUID>(tag, UX_PROPERTY_TYPE_GUID,
-                               [&](GUID* value) { return bag_->GetGuid(tag, value); });
-                break;
+                return GetTyped(tag, UX_PROPERTY_TYPE_GUID, &IuxSysPropertyBag4::GetGuid);
             case 5:
-                GetTyped<uxSysAttrTimestampUTC>(
-                    tag, UX_PROPERTY_TYPE_TIMESTAMP,
-                    [&](uxSysAttrTimestampUTC* value) { return bag_->GetTimestamp(tag, value); });
-                break;
+                return GetTyped(tag, UX_PROPERTY_TYPE_TIMESTAMP, &IuxSysPropertyBag4::GetTimestamp);
             default: {
                 CvqBStr text = reinterpret_cast<CvqBStr>(this);
                 const HRESULT status = bag_->GetString(tag, &text);
                 CvqBStrHolder holder(text);
                 FUZZ_CHECK(status == Expected(tag, UX_PROPERTY_TYPE_STRING));
-                if (status == S_OK) {
-                    const std::wstring& expected = model_[tag].text;
-                    FUZZ_CHECK(CvqBStrLength(text) == expected.size());
-                    FUZZ_CHECK(std::wstring(text) == expected);
-                } else {
-                    FUZZ_CHECK(text == nullptr);
-                }
-                break;
+                FUZZ_CHECK(status == S_OK ? CvqBStrLength(text) == std::wcslen(text) &&
+                                                BytesOf(std::wstring(text)) == model_[tag].bytes
+                                          : text == nullptr);
+                return;
             }
         }
     }
@@ -291,22 +249,14 @@ class BagSession {
         const bool askStill = input_.ConsumeBool();
         FUZZ_CHECK(bag_->ClearModified(tag, askStill ? &stillModified : nullptr) == expected);
         if (askStill) {
-            FUZZ_CHECK(stillModified == (ModifiedTags().empty() ? 0 : 1));
+            FUZZ_CHECK(stillModified == (Tags(true).empty() ? 0 : 1));
         }
     }
 
-    std::vector<uint32_t> AllTags() const {
+    std::vector<uint32_t> Tags(bool modifiedOnly) const {
         std::vector<uint32_t> tags;
         for (const auto& entry : model_) {
-            tags.push_back(entry.first);
-        }
-        return tags;
-    }
-
-    std::vector<uint32_t> ModifiedTags() const {
-        std::vector<uint32_t> tags;
-        for (const auto& entry : model_) {
-            if (entry.second.modified) {
+            if (entry.second.modified || !modifiedOnly) {
                 tags.push_back(entry.first);
             }
         }

@@ -12,8 +12,8 @@
 #include <string>
 
 #include "FuzzCheck.h"
-#include "FuzzSysroot.h"
 #include "com/CountedPtr.h"
+#include "common/TempSysroot.h"
 #include "kest/ChassisTags.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/TextConversion.h"
@@ -44,14 +44,10 @@ std::wstring ConsumeText(FuzzedDataProvider& input) {
     const size_t length = input.ConsumeIntegralInRange<size_t>(0, 80);
     std::wstring text;
     for (size_t i = 0; i < length; ++i) {
-        wchar_t unit = L'\0';
-        if (mode == 0) {
-            unit = static_cast<wchar_t>(input.ConsumeIntegralInRange<int>(0x20, 0x7E));
-        } else if (mode == 1) {
-            unit = static_cast<wchar_t>(input.PickValueInArray(kHostNameCharacters));
-        } else {
-            unit = static_cast<wchar_t>(input.ConsumeIntegral<uint32_t>());
-        }
+        const wchar_t unit =
+            mode == 0   ? static_cast<wchar_t>(input.ConsumeIntegralInRange<int>(0x20, 0x7E))
+            : mode == 1 ? static_cast<wchar_t>(input.PickValueInArray(kHostNameCharacters))
+                        : static_cast<wchar_t>(input.ConsumeIntegral<uint32_t>());
         if (unit != L'\0') {
             text += unit;
         }
@@ -81,10 +77,6 @@ void SetChange(FuzzedDataProvider& input, IuxSysPropertyBag4* bag, uint32_t tag)
     }
 }
 
-bool IsAsciiAlphanumeric(char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9');
-}
-
 HRESULT ExpectedHostName(const std::string& name) {
     if (name.empty() || name.size() > 63) {
         return UX_E_VALUE_INVALID;
@@ -92,7 +84,10 @@ HRESULT ExpectedHostName(const std::string& name) {
     bool allDigits = true;
     for (size_t i = 0; i < name.size(); ++i) {
         const bool end = i == 0 || i == name.size() - 1;
-        if (!IsAsciiAlphanumeric(name[i]) && (end || name[i] != '-')) {
+        const char c = name[i];
+        const bool alphanumeric =
+            (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9');
+        if (!alphanumeric && (end || c != '-')) {
             return UX_E_HOSTNAME_INVALID;
         }
         allDigits = allDigits && name[i] >= '0' && name[i] <= '9';
@@ -175,20 +170,21 @@ void CheckAgainstPrediction(IuxSysPropertyBag4* bag, HRESULT status,
     FUZZ_CHECK(status == S_OK && validated == accepted && message == nullptr);
 }
 
+// The simulated controller's files, in a sysroot that lives as long as the process.
+const kest::test::TempSysroot sysroot;
+
 }  // namespace
 
 extern "C" int LLVMFuzzerInitialize(int* /*argc*/, char*** /*argv*/) {
-    kest::fuzz::Create();
-    kest::fuzz::WriteFile("/etc/korvane/version", "22.5.0\n");
-    kest::fuzz::WriteFile("/var/lib/vqtargetcfg/state.ini",
-                          "[System]\nHostName = kest-01\nLanguageName = English\n"
-                          "SupportedLanguages = English,German,French\n"
-                          "TimeZone = Europe/Berlin\n");
-    kest::fuzz::WriteFile("/usr/share/vqsysapi/timezone.ini",
-                          "[LegacyToOlson]\nCST6CDT = America/Chicago\n"
-                          "[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n");
-    kest::fuzz::WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
-    kest::fuzz::WriteFile("/usr/share/zoneinfo/America/Chicago", "TZif");
+    sysroot.WriteFile("/etc/korvane/version", "22.5.0\n");
+    sysroot.WriteFile("/var/lib/vqtargetcfg/state.ini",
+                      "[System]\nHostName = kest-01\nLanguageName = English\n"
+                      "SupportedLanguages = English,German,French\nTimeZone = Europe/Berlin\n");
+    sysroot.WriteFile("/usr/share/vqsysapi/timezone.ini",
+                      "[LegacyToOlson]\nCST6CDT = America/Chicago\n"
+                      "[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n");
+    sysroot.WriteFile("/usr/share/zoneinfo/Europe/Berlin", "TZif");
+    sysroot.WriteFile("/usr/share/zoneinfo/America/Chicago", "TZif");
     Handler();
     return 0;
 }
@@ -196,7 +192,7 @@ extern "C" int LLVMFuzzerInitialize(int* /*argc*/, char*** /*argv*/) {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     static int iterations = 0;
     if (++iterations % kIterationsPerLogTruncation == 0) {
-        truncate((kest::fuzz::Root() + kCallLog).c_str(), 0);
+        truncate(sysroot.PathOf(kCallLog).c_str(), 0);
     }
     FuzzedDataProvider input(data, size);
     const CountedPtr<IuxSysPropertyBag4> changes = CreatePropertyBag();
