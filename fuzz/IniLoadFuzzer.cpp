@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <set>
 #include <string>
 #include <utility>
 #include <vector>
@@ -34,20 +35,16 @@ struct Options {
 Options DecodeOptions(uint8_t first, uint8_t second) {
     static const int kMaxLineLengths[] = {kIniNoMaxLineLength, 0, 1, 13, 20, 40, 80, 300};
     static const char kSplitCharacters[] = {0, ',', ' ', '"'};
-    Options options{};
-    options.readFlags = first & 0x1F;
-    options.uniqueNames = (second & 0x01) != 0;
-    options.caseSensitive = (second & 0x02) != 0;
-    options.maxLineLength = kMaxLineLengths[(second >> 2) & 0x07];
-    options.splitCharacter = kSplitCharacters[(second >> 5) & 0x03];
-    options.writeFlags = (second & 0x80) != 0 ? kIniWriteSpacedSeparator : 0;
-    if ((first & 0x20) != 0) {
-        options.writeFlags |= kIniWriteByteOrderMark;
-    }
-    if ((options.readFlags & kIniReadKeepComments) != 0) {
-        options.writeFlags |= kIniWriteComments;
-    }
-    return options;
+    const uint32_t readFlags = first & 0x1F;
+    const uint32_t writeFlags = ((second & 0x80) != 0 ? kIniWriteSpacedSeparator : 0) |
+                                ((first & 0x20) != 0 ? kIniWriteByteOrderMark : 0) |
+                                ((readFlags & kIniReadKeepComments) != 0 ? kIniWriteComments : 0);
+    return {readFlags,
+            (second & 0x01) != 0,
+            (second & 0x02) != 0,
+            kMaxLineLengths[(second >> 2) & 0x07],
+            kSplitCharacters[(second >> 5) & 0x03],
+            writeFlags};
 }
 
 using Keys = std::vector<std::pair<std::string, std::string>>;
@@ -74,27 +71,16 @@ Snapshot Take(const IniText* ini) {
     return snapshot;
 }
 
-bool SameName(const std::string& left, const std::string& right, bool caseSensitive) {
-    if (left.size() != right.size()) {
-        return false;
+// The name as look-ups compare it.
+std::string Folded(std::string name, bool caseSensitive) {
+    for (char& c : name) {
+        c = caseSensitive ? c : static_cast<char>(std::toupper(static_cast<unsigned char>(c)));
     }
-    for (size_t i = 0; i < left.size(); ++i) {
-        unsigned char a = static_cast<unsigned char>(left[i]);
-        unsigned char b = static_cast<unsigned char>(right[i]);
-        if (caseSensitive ? a != b : std::toupper(a) != std::toupper(b)) {
-            return false;
-        }
-    }
-    return true;
+    return name;
 }
 
 bool IsBlank(const std::string& text) {
-    for (char c : text) {
-        if (!std::isspace(static_cast<unsigned char>(c))) {
-            return false;
-        }
-    }
-    return true;
+    return text.find_first_not_of(" \t\n\v\f\r") == std::string::npos;
 }
 
 // The value of `text` when it is an optional sign and decimal digits around blanks.
@@ -139,11 +125,8 @@ void CheckIntegers(IniText* ini, const char* section, const char* key, const std
 
 void CheckOtherGetters(IniText* ini, const char* section, const char* key,
                        const std::string& value) {
-    const size_t sizes[] = {1, 2, 7, value.size(), value.size() + 1};
-    for (size_t size : sizes) {
-        if (size == 0) {
-            continue;
-        }
+    for (size_t size :
+         {size_t{1}, size_t{2}, size_t{7}, std::max<size_t>(value.size(), 1), value.size() + 1}) {
         std::string buffer(size + 1, '\x7f');
         FUZZ_CHECK(IniText_GetStringIntoBuffer(ini, section, key, &buffer[0], size) == kIniFound);
         const size_t copied = std::min(value.size(), size - 1);
@@ -165,43 +148,31 @@ void CheckOtherGetters(IniText* ini, const char* section, const char* key,
 
     bool flag = false;
     const int booleanResult = IniText_GetBoolean(ini, section, key, &flag);
-    FUZZ_CHECK(booleanResult == kIniFound || booleanResult == kIniNotFound ||
-               booleanResult == kIniNotBoolean);
     double number = 0;
     const int doubleResult = IniText_GetDouble(ini, section, key, &number);
-    FUZZ_CHECK(doubleResult == kIniFound || doubleResult == kIniNotFound ||
-               doubleResult == kIniNotDouble);
-    FUZZ_CHECK((booleanResult == kIniNotFound) == IsBlank(value));
-    FUZZ_CHECK((doubleResult == kIniNotFound) == IsBlank(value));
+    if (IsBlank(value)) {
+        FUZZ_CHECK(booleanResult == kIniNotFound && doubleResult == kIniNotFound);
+    } else {
+        FUZZ_CHECK(booleanResult == kIniFound || booleanResult == kIniNotBoolean);
+        FUZZ_CHECK(doubleResult == kIniFound || doubleResult == kIniNotDouble);
+    }
 }
 
-// Every getter, by name, for every key; a name lookup finds the first key of that name.
-void CheckGetters(IniText* ini, const Snapshot& snapshot, const Options& options) {
-    for (size_t s = 0; s < snapshot.size(); ++s) {
-        const char* section = snapshot[s].first.c_str();
-        const Keys& keys = snapshot[s].second;
-        for (size_t k = 0; k < keys.size(); ++k) {
-            bool first = true;
-            for (size_t earlier = 0; earlier < k && first; ++earlier) {
-                first = !SameName(keys[earlier].first, keys[k].first, options.caseSensitive);
+// Every getter, by name, for every key; a look-up finds the first key of a name in the first
+// section of its name.
+void CheckGetters(IniText* ini, const Snapshot& snapshot, bool caseSensitive) {
+    std::set<std::string> sections;
+    for (const auto& [section, keys] : snapshot) {
+        const bool firstSection = sections.insert(Folded(section, caseSensitive)).second;
+        std::set<std::string> names;
+        for (const auto& [key, value] : keys) {
+            const char* found = nullptr;
+            FUZZ_CHECK(IniText_GetString(ini, section.c_str(), key.c_str(), &found) == kIniFound);
+            if (names.insert(Folded(key, caseSensitive)).second && firstSection) {
+                FUZZ_CHECK(value == found);
+                CheckOtherGetters(ini, section.c_str(), key.c_str(), value);
+                CheckIntegers(ini, section.c_str(), key.c_str(), value);
             }
-            const char* key = keys[k].first.c_str();
-            const char* value = nullptr;
-            FUZZ_CHECK(IniText_GetString(ini, section, key, &value) == kIniFound);
-            if (!first) {
-                continue;
-            }
-            bool firstSection = true;
-            for (size_t earlier = 0; earlier < s && firstSection; ++earlier) {
-                firstSection =
-                    !SameName(snapshot[earlier].first, snapshot[s].first, options.caseSensitive);
-            }
-            if (!firstSection) {
-                continue;
-            }
-            FUZZ_CHECK(keys[k].second == value);
-            CheckOtherGetters(ini, section, key, keys[k].second);
-            CheckIntegers(ini, section, key, keys[k].second);
         }
     }
 }
@@ -231,7 +202,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     FUZZ_CHECK(loaded == 0 || loaded == kIniUnsupportedEncoding);
     const Snapshot snapshot = Take(ini.get());
     FUZZ_CHECK(loaded == 0 || snapshot.empty());
-    CheckGetters(ini.get(), snapshot, options);
+    CheckGetters(ini.get(), snapshot, options.caseSensitive);
 
     FUZZ_CHECK(IniText_SetWriteOptions(ini.get(), options.maxLineLength, options.splitCharacter,
                                        options.writeFlags) == kIniFound);

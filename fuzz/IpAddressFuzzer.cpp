@@ -5,6 +5,8 @@
 //
 // Input: byte 0 selects the permissions of the IPv4 check (bits 0-2) and whether the rest is
 // read as 32-bit wide characters (bit 3) instead of one character per byte.
+#include <arpa/inet.h>
+
 #include <cstdint>
 #include <cstring>
 #include <string>
@@ -21,39 +23,20 @@ using vq::dsc::osdep::IPAddress;
 using vq::dsc::osdep::IPFamily;
 
 // The address of `text` when it is four dot-separated decimal numbers 0-255 without signs or
-// leading zeros, the form every IPv4 parser reads the same way.
+// leading zeros, the form every IPv4 parser reads the same way (and the only one inet_pton reads).
 bool PlainDottedDecimal(const std::wstring& text, uint32_t* address) {
-    uint32_t value = 0;
-    int parts = 0;
-    size_t position = 0;
-    while (parts < 4) {
-        size_t end = position;
-        while (end < text.size() && text[end] >= L'0' && text[end] <= L'9') {
-            ++end;
-        }
-        const size_t length = end - position;
-        if (length == 0 || length > 3 || (length > 1 && text[position] == L'0')) {
+    std::string narrow;
+    for (wchar_t c : text) {
+        if (c <= 0 || c >= 0x80) {
             return false;
         }
-        uint32_t part = 0;
-        for (size_t i = position; i < end; ++i) {
-            part = part * 10 + static_cast<uint32_t>(text[i] - L'0');
-        }
-        if (part > 255) {
-            return false;
-        }
-        value = value << 8 | part;
-        ++parts;
-        if (parts < 4) {
-            if (end >= text.size() || text[end] != L'.') {
-                return false;
-            }
-            position = end + 1;
-        } else if (end != text.size()) {
-            return false;
-        }
+        narrow += static_cast<char>(c);
     }
-    *address = value;
+    in_addr parsed{};
+    if (inet_pton(AF_INET, narrow.c_str(), &parsed) != 1) {
+        return false;
+    }
+    *address = ntohl(parsed.s_addr);
     return true;
 }
 

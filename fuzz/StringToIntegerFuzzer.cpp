@@ -19,21 +19,15 @@ namespace {
 __extension__ typedef __int128 Wide;
 
 int DigitOf(unsigned char c) {
-    if (std::isdigit(c)) {
-        return c - '0';
-    }
-    if (std::isalpha(c)) {
-        return std::tolower(c) - 'a' + 10;
-    }
-    return 99;
+    return std::isdigit(c) ? c - '0' : std::isalpha(c) ? std::tolower(c) - 'a' + 10 : 99;
 }
 
-// What StringToInteger<T> promises for `text`: nothing when it must raise.
 // Leading blanks are judged per character width: isspace for bytes, iswspace for wide text.
 bool IsBlank(unsigned char c, bool wide) {
     return wide ? std::iswspace(c) != 0 : std::isspace(c) != 0;
 }
 
+// What StringToInteger<T> promises for `text`: nothing when it must raise.
 template <class T>
 std::optional<T> Reference(const std::string& text, uint32_t base, bool strict, bool wide) {
     if (base < 2 || base > 36) {
@@ -131,26 +125,11 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const bool strict = (data[1] & 0x08) != 0;
     const bool wide = (data[1] & 0x10) != 0;
     const std::string text(reinterpret_cast<const char*>(data) + 2, size - 2);
-    switch (type) {
-        case 0:
-            Check<int8_t>(text, base, strict, wide);
-            break;
-        case 1:
-            Check<uint8_t>(text, base, strict, wide);
-            break;
-        case 2:
-            Check<int16_t>(text, base, strict, wide);
-            break;
-        case 3:
-            Check<uint16_t>(text, base, strict, wide);
-            break;
-        case 4:
-            Check<int32_t>(text, base, strict, wide);
-            break;
-        default:
-            Check<uint32_t>(text, base, strict, wide);
-            break;
-    }
+    using Checker = void (*)(const std::string&, uint32_t, bool, bool);
+    static const Checker kCheckers[] = {Check<int8_t>,   Check<uint8_t>, Check<int16_t>,
+                                        Check<uint16_t>, Check<int32_t>, Check<uint32_t>,
+                                        Check<uint32_t>, Check<uint32_t>};
+    kCheckers[type](text, base, strict, wide);
     if (base >= 2 && base <= 36) {
         if (const std::optional<int32_t> value = Reference<int32_t>(text, base, strict, false)) {
             CheckWritingBack<int32_t>(*value, base);
