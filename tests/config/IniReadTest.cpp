@@ -1,8 +1,12 @@
+#include <sys/mman.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
+#include <cstring>
 #include <string>
 
 #include "IniTestSupport.h"
+#include "config/IniReader.h"
 
 namespace kest::test::config {
 
@@ -95,6 +99,24 @@ TEST(IniReadTest, TextsReadAsDocuments) {
             EXPECT_EQ(SavedText(dir, ini.get()), c.saved);
         }
     }
+}
+
+// The parser reads nothing past the end of its text, which need not end in a zero: here the text
+// ends where an unreadable page begins.
+TEST(IniReadTest, ParsingReadsNothingPastTheText) {
+    const size_t page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
+    void* pages =
+        mmap(nullptr, 2 * page, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    ASSERT_NE(pages, MAP_FAILED);
+    char* guard = static_cast<char*>(pages) + page;
+    ASSERT_EQ(mprotect(guard, page, PROT_NONE), 0);
+    const std::string text = "[s]\nk=v";
+    std::memcpy(guard - text.size(), text.data(), text.size());
+    kest::ini::IniDocument document(true, false);
+    kest::ini::ParseIni(std::string_view(guard - text.size(), text.size()), 0, document);
+    ASSERT_NE(document.FindKey("s", "k"), nullptr);
+    EXPECT_EQ(document.FindKey("s", "k")->value, "v");
+    munmap(pages, 2 * page);
 }
 
 // A failed load leaves the document as it was; only a regular file loads (a FIFO would block).
