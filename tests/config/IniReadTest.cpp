@@ -2,7 +2,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include <cstring>
+#include <algorithm>
 #include <string>
 
 #include "IniTestSupport.h"
@@ -111,7 +111,7 @@ TEST(IniReadTest, ParsingReadsNothingPastTheText) {
     char* guard = static_cast<char*>(pages) + page;
     ASSERT_EQ(mprotect(guard, page, PROT_NONE), 0);
     const std::string text = "[s]\nk=v";
-    std::memcpy(guard - text.size(), text.data(), text.size());
+    std::copy(text.begin(), text.end(), guard - text.size());
     kest::ini::IniDocument document(true, false);
     kest::ini::ParseIni(std::string_view(guard - text.size(), text.size()), 0, document);
     ASSERT_NE(document.FindKey("s", "k"), nullptr);
