@@ -255,6 +255,9 @@ inline const std::vector<CallRow>& CallRows() {
          "SetDeviceSettings\t0\t7\t32\t0\t250",
          "CurrentMediaMode = 4|CurrentMediaMode=32|PreferredMediaMode = 0x10|"
          "PreferredMediaMode=32|PollingInterval = 1000|PollingInterval=250"},
+        {[](O&) { return net::SetDeviceSettings(0, 4, 0, 0); }, 0, "",
+         "SetDeviceSettings\t0\t0\t4\t0\t0",
+         "00:00:01\n|00:00:01\nPreferredMediaMode=4\nCurrentMediaMode=4\n"},
         {[](O&) { return net::SetDeviceSettings(10, 0, 2, 0); }, 0, "",
          "SetDeviceSettings\t0\t10\t0\t2\t0", "Mode = 0\n|Mode = 0\nPollingMode=2\n"},
         {[](O& o) {
