@@ -5,7 +5,6 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
-#include <mutex>
 #include <set>
 #include <string>
 #include <thread>
@@ -28,22 +27,6 @@ constexpr int kLifecycleRounds = 20;
 constexpr int kReaderThreads = 4;
 constexpr int kPersists = 40;
 
-// Counts the calls that did not give the expected result, by name.
-class Failures {
-  public:
-    void Check(bool ok, const char* what) {
-        if (!ok) {
-            std::lock_guard<std::mutex> hold(lock_);
-            failed_.insert(what);
-        }
-    }
-    std::set<std::string> Failed() const { return failed_; }
-
-  private:
-    std::mutex lock_;
-    std::set<std::string> failed_;
-};
-
 class StressExpertTest : public kest::test::e2e::ExpertHostTest {
   protected:
     void SetUp() override {
@@ -54,30 +37,21 @@ class StressExpertTest : public kest::test::e2e::ExpertHostTest {
     }
 
     // The system item's string property `tag`, read through `from`; empty when a call fails.
-    static std::wstring ReadText(IuxSysExpert3* from, uint32_t tag, Failures& failures) {
+    static std::wstring ReadText(IuxSysExpert3* from, uint32_t tag) {
         InterfaceRef<IuxSysPropertyBag> bag;
-        const HRESULT got = from->GetPropertiesOfItem(kSystemItemName, bag.Receive());
-        failures.Check(got == S_OK && bag, "GetPropertiesOfItem");
-        if (!bag) {
-            return std::wstring();
-        }
+        EXPECT_EQ(from->GetPropertiesOfItem(kSystemItemName, bag.Receive()), S_OK);
         CvqBStr text = nullptr;
-        failures.Check(bag->GetString(tag, &text) == S_OK, "GetString");
+        EXPECT_TRUE(bag && bag->GetString(tag, &text) == S_OK);
         return kest::test::e2e::TakeWideHostString(text);
     }
 
     // A bag of changes made from the system item's properties with `write` applied.
     template <class Write>
-    static InterfaceRef<IuxSysPropertyBag> Changes(IuxSysExpert3* from, Failures& failures,
-                                                   Write&& write) {
+    static InterfaceRef<IuxSysPropertyBag> Changes(IuxSysExpert3* from, Write&& write) {
         InterfaceRef<IuxSysPropertyBag> current;
         InterfaceRef<IuxSysPropertyBag> changes;
-        failures.Check(from->GetPropertiesOfItem(kSystemItemName, current.Receive()) == S_OK,
-                       "GetPropertiesOfItem");
-        if (!current) {
-            return changes;
-        }
-        failures.Check(current->Clone(changes.Receive()) == S_OK, "Clone");
+        EXPECT_EQ(from->GetPropertiesOfItem(kSystemItemName, current.Receive()), S_OK);
+        EXPECT_TRUE(current && current->Clone(changes.Receive()) == S_OK);
         if (changes) {
             write(changes.Get());
         }
@@ -86,52 +60,39 @@ class StressExpertTest : public kest::test::e2e::ExpertHostTest {
 };
 
 TEST_F(StressExpertTest, ThreadsCreateQueryAndReleaseExperts) {
-    Failures failures;
     const std::vector<std::wstring> expectedNames = {kSystemItemName, L"eth0"};
     std::vector<std::thread> threads;
     for (int t = 0; t < kLifecycleThreads; ++t) {
         threads.emplace_back([&, t] {
             for (int round = 0; round < kLifecycleRounds; ++round) {
                 IuxSysExpert3* own = nullptr;
-                failures.Check(plugin.Factory()(&own) == S_OK && own != nullptr, "factory");
-                if (own == nullptr) {
-                    continue;
-                }
-                failures.Check(own->Initialize() == S_OK, "Initialize");
-                IuxSysEnumStringList* names = nullptr;
-                failures.Check(own->SearchForItemNames(&names) == S_OK, "SearchForItemNames");
-                if (names != nullptr) {
-                    failures.Check(kest::test::e2e::TakeNames(names) == expectedNames,
-                                   "item names");
-                }
-                failures.Check(ReadText(own, kHostNameTag, failures) == L"kest-1", "host name");
+                ASSERT_EQ(plugin.Factory()(&own), S_OK);
+                ASSERT_NE(own, nullptr);
+                EXPECT_EQ(own->Initialize(), S_OK);
+                EXPECT_EQ(ItemNames(own), expectedNames);
+                EXPECT_EQ(ReadText(own, kHostNameTag), L"kest-1");
                 const InterfaceRef<IuxSysPropertyBag> changes =
-                    Changes(own, failures, [&](IuxSysPropertyBag* bag) {
+                    Changes(own, [&](IuxSysPropertyBag* bag) {
                         bag->SetString(kHostNameTag, (L"kest-" + std::to_wstring(t + 2)).c_str());
                     });
-                if (changes) {
-                    InterfaceRef<IuxSysEnumPropertyTag> validated;
-                    CvqBStr message = nullptr;
-                    failures.Check(
-                        own->ValidatePropertyChanges(kSystemItemName, changes.Get(),
-                                                     validated.Receive(), &message) == S_OK,
-                        "ValidatePropertyChanges");
-                    CvqBStrFree(message);
-                }
+                InterfaceRef<IuxSysEnumPropertyTag> validated;
+                CvqBStr message = nullptr;
+                EXPECT_TRUE(changes &&
+                            own->ValidatePropertyChanges(kSystemItemName, changes.Get(),
+                                                         validated.Receive(), &message) == S_OK);
+                CvqBStrFree(message);
                 // Uninitialize drops the shared item handlers that other threads are using.
-                failures.Check(own->Uninitialize() == S_OK, "Uninitialize");
-                failures.Check(own->Release() == 0, "last reference");
+                EXPECT_EQ(own->Uninitialize(), S_OK);
+                EXPECT_EQ(own->Release(), 0u) << "the last reference";
             }
         });
     }
     for (std::thread& thread : threads) {
         thread.join();
     }
-    EXPECT_EQ(failures.Failed(), std::set<std::string>());
 }
 
 TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
-    Failures failures;
     std::set<std::wstring> written = {L"initial"};
     for (int i = 0; i < kPersists; ++i) {
         written.insert(L"comment " + std::to_wstring(i));
@@ -141,40 +102,33 @@ TEST_F(StressExpertTest, SearchesAndReadsRacePersists) {
     for (int r = 0; r < kReaderThreads; ++r) {
         readers.emplace_back([&, r] {
             const InterfaceRef<IuxSysExpert3> own = plugin.CreateExpert();
-            int rounds = 0;
             // At least a few rounds each, however quickly the persists end.
-            while (persisting || rounds < 5) {
-                ++rounds;
+            for (int rounds = 0; persisting || rounds < 5; ++rounds) {
                 if (r % 2 == 0) {
                     kest::test::e2e::RecordingSink sink(S_OK);
-                    failures.Check(own->SearchForItemsAndProperties(&sink) == S_OK, "search");
-                    failures.Check(sink.names.size() == 2, "items found");
+                    EXPECT_EQ(own->SearchForItemsAndProperties(&sink), S_OK);
+                    EXPECT_EQ(sink.names.size(), 2u);
                 }
-                failures.Check(written.count(ReadText(own.Get(), kCommentTag, failures)) == 1,
-                               "comment read is one that was written");
+                const std::wstring comment = ReadText(own.Get(), kCommentTag);
+                EXPECT_EQ(written.count(comment), 1u) << "a comment that was never written";
             }
         });
     }
     for (int i = 0; i < kPersists; ++i) {
         const InterfaceRef<IuxSysPropertyBag> changes =
-            Changes(expert.Get(), failures, [&](IuxSysPropertyBag* bag) {
+            Changes(expert.Get(), [&](IuxSysPropertyBag* bag) {
                 bag->SetString(kCommentTag, (L"comment " + std::to_wstring(i)).c_str());
                 bag->SetBool(kWebServiceTag, i % 2);
             });
-        if (changes) {
-            int32_t restart = -1;
-            failures.Check(
-                expert->PersistPropertyChanges(kSystemItemName, changes.Get(), &restart) == S_OK,
-                "PersistPropertyChanges");
-        }
+        int32_t restart = -1;
+        EXPECT_TRUE(changes && expert->PersistPropertyChanges(kSystemItemName, changes.Get(),
+                                                              &restart) == S_OK);
     }
     persisting = false;
     for (std::thread& thread : readers) {
         thread.join();
     }
-    EXPECT_EQ(failures.Failed(), std::set<std::string>());
-    EXPECT_EQ(ReadText(expert.Get(), kCommentTag, failures),
-              L"comment " + std::to_wstring(kPersists - 1));
+    EXPECT_EQ(ReadText(expert.Get(), kCommentTag), L"comment " + std::to_wstring(kPersists - 1));
 }
 
 }  // namespace

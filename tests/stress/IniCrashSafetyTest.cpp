@@ -4,17 +4,14 @@
 // documents, byte for byte, and the next save must succeed.
 #include <gtest/gtest.h>
 #include <signal.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <chrono>
-#include <fstream>
-#include <ostream>
 #include <random>
-#include <sstream>
 #include <string>
 #include <thread>
 
+#include "common/ChildProcesses.h"
 #include "common/TempSysroot.h"
 #include "config/IniText.h"
 #include "config/IniTextPtr.h"
@@ -28,13 +25,6 @@ constexpr int kKills = 60;
 constexpr int kKeys = 4000;
 constexpr int kMaxDelayMicroseconds = 3000;
 
-std::string ReadAll(const std::string& path) {
-    std::ifstream file(path, std::ios::binary);
-    std::ostringstream content;
-    content << file.rdbuf();
-    return content.str();
-}
-
 // A document of `kKeys` keys whose values all carry `mark`, with the write options under test.
 IniTextPtr Document(const std::string& mark, uint32_t writeFlags) {
     IniTextPtr ini(IniText_Create());
@@ -47,90 +37,66 @@ IniTextPtr Document(const std::string& mark, uint32_t writeFlags) {
     return ini;
 }
 
-// Forks a child that saves `first` and `second` to `path` in turn without end, writing one byte
-// to the returned pipe as each save starts.
-pid_t StartSaver(IniText* first, IniText* second, const std::string& path, int* startedSaves) {
-    int ends[2];
-    if (pipe(ends) != 0) {
-        return -1;
-    }
-    const pid_t child = fork();
-    if (child == 0) {
-        close(ends[0]);
-        for (int save = 0;; ++save) {
-            const char started = 's';
-            if (write(ends[1], &started, 1) != 1 ||
-                IniText_Save(save % 2 == 0 ? first : second, path.c_str()) != 0) {
-                _exit(1);
-            }
-        }
-    }
-    close(ends[1]);
-    *startedSaves = ends[0];
-    return child;
-}
-
-struct CrashCase {
-    const char* name;
-    uint32_t writeFlags;
-};
-
-// Test names show the case's name rather than its bytes.
-void PrintTo(const CrashCase& c, std::ostream* out) {
-    *out << c.name;
-}
-
-class IniCrashSafetyTest : public ::testing::TestWithParam<CrashCase> {};
+// The parameter is the write flags.
+class IniCrashSafetyTest : public ::testing::TestWithParam<uint32_t> {};
 
 TEST_P(IniCrashSafetyTest, KilledSavesLeaveTheOldOrTheNewDocument) {
     kest::test::TempSysroot dir;
     const std::string target = dir.PathOf("/settings.ini");
-    IniTextPtr oldDocument = Document("old", GetParam().writeFlags);
-    IniTextPtr newDocument = Document("new", GetParam().writeFlags);
+    IniTextPtr oldDocument = Document("old", GetParam());
+    IniTextPtr newDocument = Document("new", GetParam());
     ASSERT_EQ(0, IniText_Save(newDocument.get(), target.c_str()));
-    const std::string newBytes = ReadAll(target);
+    const std::string newBytes = dir.ReadFile("/settings.ini");
     ASSERT_EQ(0, IniText_Save(oldDocument.get(), target.c_str()));
-    const std::string oldBytes = ReadAll(target);
+    const std::string oldBytes = dir.ReadFile("/settings.ini");
     ASSERT_NE(oldBytes, newBytes);
 
     std::mt19937 random(20240611);
-    int oldSeen = 0;
-    int newSeen = 0;
     for (int kill = 0; kill < kKills; ++kill) {
-        int startedSaves = -1;
-        const pid_t child = StartSaver(newDocument.get(), oldDocument.get(), target, &startedSaves);
+        // The child saves the documents in turn without end, writing a byte as each save starts.
+        int started[2];
+        ASSERT_EQ(0, pipe(started));
+        const pid_t child = kest::test::StartChild([&] {
+            close(started[0]);
+            for (int save = 0;; ++save) {
+                const char mark = 's';
+                if (write(started[1], &mark, 1) != 1 ||
+                    IniText_Save(save % 2 == 0 ? newDocument.get() : oldDocument.get(),
+                                 target.c_str()) != 0) {
+                    return;
+                }
+            }
+        });
+        close(started[1]);
         ASSERT_GT(child, 0);
         // Let one to three saves begin, then kill the child some time into the last one.
-        char started[3];
-        const size_t saves = 1 + random() % 3;
-        size_t received = 0;
-        while (received < saves) {
-            const ssize_t count = read(startedSaves, started, saves - received);
+        char marks[3];
+        for (size_t wanted = 1 + random() % 3, received = 0; received < wanted;) {
+            const ssize_t count = read(started[0], marks, wanted - received);
             ASSERT_GT(count, 0) << "the saving child stopped by itself";
             received += static_cast<size_t>(count);
         }
         std::this_thread::sleep_for(std::chrono::microseconds(random() % kMaxDelayMicroseconds));
         ASSERT_EQ(0, ::kill(child, SIGKILL));
-        int status = 0;
-        ASSERT_EQ(child, waitpid(child, &status, 0));
-        close(startedSaves);
+        const int status = kest::test::WaitForChild(child);
+        close(started[0]);
         ASSERT_TRUE(WIFSIGNALED(status)) << "the saving child failed a save";
-
-        const std::string bytes = ReadAll(target);
+        const std::string bytes = dir.ReadFile("/settings.ini");
         ASSERT_TRUE(bytes == oldBytes || bytes == newBytes)
             << "after kill " << kill << " the target holds " << bytes.size() << " bytes";
-        (bytes == oldBytes ? oldSeen : newSeen) += 1;
     }
-    std::cout << "old document seen " << oldSeen << " times, new " << newSeen << " times\n";
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    SafeReplacement, IniCrashSafetyTest,
-    ::testing::Values(CrashCase{"FixedTemporary", kIniWriteSafeReplacement},
-                      CrashCase{"UniqueTemporary",
-                                kIniWriteSafeReplacement | kIniWriteUniqueTemporary},
-                      CrashCase{"Synchronised", kIniWriteSafeReplacement | kIniWriteSync}),
-    [](const ::testing::TestParamInfo<CrashCase>& param) { return std::string(param.param.name); });
+INSTANTIATE_TEST_SUITE_P(SafeReplacement, IniCrashSafetyTest,
+                         ::testing::Values(kIniWriteSafeReplacement,
+                                           kIniWriteSafeReplacement | kIniWriteUniqueTemporary,
+                                           kIniWriteSafeReplacement | kIniWriteSync),
+                         [](const ::testing::TestParamInfo<uint32_t>& param) {
+                             return (param.param & kIniWriteUniqueTemporary) != 0
+                                        ? "UniqueTemporary"
+                                    : (param.param & kIniWriteSync) != 0 ? "Synchronised"
+                                                                         : "FixedTemporary";
+                         });
 
 // The point at which the saving child kills itself.
 kest::ini::SaveStage killStage;
@@ -147,33 +113,31 @@ TEST(IniCrashSafetyStagesTest, SavesKilledAtFixedPointsLeaveOneWholeDocument) {
                 IniTextPtr oldDocument = Document("old", flags);
                 IniTextPtr newDocument = Document("new", flags);
                 ASSERT_EQ(0, IniText_Save(newDocument.get(), dir.PathOf("/new.ini").c_str()));
-                const std::string newBytes = ReadAll(dir.PathOf("/new.ini"));
+                const std::string newBytes = dir.ReadFile("/new.ini");
                 if (existed) {
                     ASSERT_EQ(0, IniText_Save(oldDocument.get(), target.c_str()));
                 }
-                const std::string oldBytes = ReadAll(target);
+                const std::string oldBytes = dir.ReadFile("/settings.ini");
                 killStage = stage;
-                const pid_t child = fork();
-                if (child == 0) {
+                const int status = kest::test::WaitForChild(kest::test::StartChild([&] {
                     kest::ini::SetSaveStageObserver([](SaveStage reached) {
                         if (reached == killStage) {
                             raise(SIGKILL);
                         }
                     });
-                    _exit(IniText_Save(newDocument.get(), target.c_str()) == 0 ? 0 : 1);
-                }
-                int status = 0;
-                ASSERT_EQ(child, waitpid(child, &status, 0));
+                    IniText_Save(newDocument.get(), target.c_str());
+                }));
                 ASSERT_TRUE(WIFSIGNALED(status)) << "the save did not reach the point";
                 const bool renamed = stage == SaveStage::kRenamed;
                 const std::string context = "stage " + std::to_string(static_cast<int>(stage)) +
                                             (existed ? ", over a file" : ", no file before");
-                EXPECT_EQ(existed || renamed, access(target.c_str(), F_OK) == 0) << context;
-                EXPECT_TRUE(ReadAll(target) == (renamed ? newBytes : oldBytes)) << context;
+                EXPECT_EQ(existed || renamed, dir.Exists("/settings.ini")) << context;
+                EXPECT_TRUE(dir.ReadFile("/settings.ini") == (renamed ? newBytes : oldBytes))
+                    << context;
                 // The temporary left behind does not block the next save.
                 ASSERT_EQ(0, IniText_Save(oldDocument.get(), target.c_str())) << context;
                 ASSERT_EQ(0, IniText_Save(newDocument.get(), target.c_str())) << context;
-                EXPECT_TRUE(ReadAll(target) == newBytes) << context;
+                EXPECT_TRUE(dir.ReadFile("/settings.ini") == newBytes) << context;
             }
         }
     }

@@ -1,16 +1,16 @@
-// INI files replaced while they are read: writers save whole documents by safe replacement while
-// readers load the same file, and the process-wide INI cache serves reads while another thread
-// sets and flushes values. Every load must succeed and give one whole document, every cached read
-// a value that was written.
+// INI files replaced while they are read: writer processes save whole documents by safe
+// replacement while reader threads load the same file, and the process-wide INI cache serves reads
+// while another thread sets and flushes values. Every load must succeed and give one whole
+// document, every cached read a value that was written.
 #include <gtest/gtest.h>
 
 #include <atomic>
-#include <ostream>
 #include <set>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "common/ChildProcesses.h"
 #include "common/TempSysroot.h"
 #include "config/IniFileManager.h"
 #include "config/IniText.h"
@@ -23,14 +23,16 @@ namespace {
 
 constexpr int kVersions = 3;
 constexpr int kSavesPerWriter = 150;
+constexpr int kWriters = 3;
 constexpr int kReaders = 3;
 constexpr int kKeysPerVersion = 400;
 constexpr int kFlushes = 100;
 
 // Version `version` of the document: its keys all hold the version number, and a last key tells
 // how many keys there are, so a torn or partial file is recognised.
-IniTextPtr Version(int version) {
+IniTextPtr Version(int version, uint32_t writeFlags) {
     IniTextPtr ini(IniText_Create());
+    IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0, writeFlags);
     const int keys = kKeysPerVersion + version * 37;
     for (int k = 0; k < keys; ++k) {
         IniText_SetInt32(ini.get(), "Data", ("Key" + std::to_string(k)).c_str(), version);
@@ -62,70 +64,61 @@ int WholeVersion(const std::string& path) {
     return keys == kKeysPerVersion + version * 37 ? version : -1;
 }
 
-struct ReplaceCase {
-    const char* name;
-    uint32_t writeFlags;
-    int writers;
-};
-
-// Test names show the case's name rather than its bytes.
-void PrintTo(const ReplaceCase& c, std::ostream* out) {
-    *out << c.name;
-}
-
-class StressIniReplaceTest : public ::testing::TestWithParam<ReplaceCase> {};
+// The parameter is the write flags.
+class StressIniReplaceTest : public ::testing::TestWithParam<uint32_t> {};
 
 TEST_P(StressIniReplaceTest, LoadsDuringReplacementSeeWholeDocuments) {
     kest::test::TempSysroot dir;
     const std::string path = dir.PathOf("/replaced.ini");
-    IniTextPtr first = Version(0);
-    IniText_SetWriteOptions(first.get(), kIniNoMaxLineLength, 0, GetParam().writeFlags);
-    ASSERT_EQ(0, IniText_Save(first.get(), path.c_str()));
+    std::vector<IniTextPtr> versions;
+    for (int v = 0; v < kVersions; ++v) {
+        versions.push_back(Version(v, GetParam()));
+    }
+    ASSERT_EQ(0, IniText_Save(versions[0].get(), path.c_str()));
 
-    std::atomic<int> writersRunning{GetParam().writers};
-    std::atomic<int> failedSaves{0};
+    // The writers are forked before any reader thread starts.
+    std::vector<pid_t> writers;
+    for (int writer = 0; writer < kWriters; ++writer) {
+        writers.push_back(kest::test::StartChild([&, writer] {
+            for (int save = 0; save < kSavesPerWriter; ++save) {
+                ASSERT_EQ(0, IniText_Save(
+                                 versions[static_cast<size_t>((save + writer) % kVersions)].get(),
+                                 path.c_str()));
+            }
+        }));
+    }
+    std::atomic<bool> writing{true};
     std::atomic<int> brokenLoads{0};
     std::atomic<int> loads{0};
-    std::vector<std::thread> threads;
-    for (int writer = 0; writer < GetParam().writers; ++writer) {
-        threads.emplace_back([&, writer] {
-            std::vector<IniTextPtr> versions;
-            for (int v = 0; v < kVersions; ++v) {
-                versions.push_back(Version(v));
-                IniText_SetWriteOptions(versions.back().get(), kIniNoMaxLineLength, 0,
-                                        GetParam().writeFlags);
-            }
-            for (int save = 0; save < kSavesPerWriter; ++save) {
-                IniText* next = versions[static_cast<size_t>((save + writer) % kVersions)].get();
-                failedSaves += IniText_Save(next, path.c_str()) != 0;
-            }
-            --writersRunning;
-        });
-    }
+    std::vector<std::thread> readers;
     for (int reader = 0; reader < kReaders; ++reader) {
-        threads.emplace_back([&] {
-            while (writersRunning > 0) {
+        readers.emplace_back([&] {
+            do {
                 brokenLoads += WholeVersion(path) < 0;
                 ++loads;
-            }
+            } while (writing);
         });
     }
-    for (std::thread& thread : threads) {
+    for (const pid_t writer : writers) {
+        EXPECT_TRUE(kest::test::ExitedCleanly(kest::test::WaitForChild(writer)))
+            << "a writer failed a save";
+    }
+    writing = false;
+    for (std::thread& thread : readers) {
         thread.join();
     }
-    EXPECT_EQ(0, failedSaves.load());
     EXPECT_EQ(0, brokenLoads.load()) << "of " << loads.load() << " loads";
     EXPECT_GE(WholeVersion(path), 0);
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    StressReplacement, StressIniReplaceTest,
-    ::testing::Values(ReplaceCase{"TemporaryNamedAfterTheTarget", kIniWriteSafeReplacement, 3},
-                      ReplaceCase{"UniqueTemporaries",
-                                  kIniWriteSafeReplacement | kIniWriteUniqueTemporary, 3}),
-    [](const ::testing::TestParamInfo<ReplaceCase>& param) {
-        return std::string(param.param.name);
-    });
+INSTANTIATE_TEST_SUITE_P(StressReplacement, StressIniReplaceTest,
+                         ::testing::Values(kIniWriteSafeReplacement,
+                                           kIniWriteSafeReplacement | kIniWriteUniqueTemporary),
+                         [](const ::testing::TestParamInfo<uint32_t>& param) {
+                             return (param.param & kIniWriteUniqueTemporary) != 0
+                                        ? "UniqueTemporaries"
+                                        : "TemporaryNamedAfterTheTarget";
+                         });
 
 TEST(StressIniCacheTest, CachedReadsRaceSetsAndFlushes) {
     kest::test::TempSysroot dir;
@@ -139,29 +132,24 @@ TEST(StressIniCacheTest, CachedReadsRaceSetsAndFlushes) {
     }
 
     std::atomic<bool> writing{true};
-    std::atomic<int> badReads{0};
     std::vector<std::thread> readers;
     for (int reader = 0; reader < kReaders; ++reader) {
         readers.emplace_back([&] {
-            while (writing) {
+            do {
                 std::string value;
-                badReads += cache->GetStringFromIni(path, "S", "Value", value) != S_OK ||
-                            written.count(value) == 0;
-            }
+                EXPECT_EQ(S_OK, cache->GetStringFromIni(path, "S", "Value", value));
+                EXPECT_EQ(1u, written.count(value)) << value;
+            } while (writing);
         });
     }
-    int failedWrites = 0;
     for (int i = 0; i < kFlushes; ++i) {
-        failedWrites +=
-            cache->SetStringInIni(path, "S", "Value", "value " + std::to_string(i)) != S_OK;
-        failedWrites += cache->FlushIniCache() != S_OK;
+        EXPECT_EQ(S_OK, cache->SetStringInIni(path, "S", "Value", "value " + std::to_string(i)));
+        EXPECT_EQ(S_OK, cache->FlushIniCache());
     }
     writing = false;
     for (std::thread& thread : readers) {
         thread.join();
     }
-    EXPECT_EQ(0, failedWrites);
-    EXPECT_EQ(0, badReads.load());
     IniTextPtr saved(IniText_Create());
     ASSERT_EQ(0, IniText_Load(saved.get(), path.c_str()));
     const char* value = nullptr;
