@@ -65,7 +65,8 @@ inline std::wstring ItemNameIn(IuxSysPropertyBag* bag) {
     return TakeWideHostString(name);
 }
 
-// A search sink that records the item name of every bag and answers with a fixed status.
+// A search sink that records the item name of every bag and answers with a fixed status; it
+// counts its references, so it also stands for a host's callback object.
 class RecordingSink : public IuxSysSearchSink {
   public:
     explicit RecordingSink(HRESULT answer) : answer_(answer) {}
@@ -82,6 +83,8 @@ class RecordingSink : public IuxSysSearchSink {
         names.push_back(ItemNameIn(item));
         return answer_;
     }
+
+    uint32_t References() const { return count_; }
 
     std::vector<std::wstring> names;
 

@@ -8,7 +8,6 @@
 #include <unistd.h>
 
 #include <cstdlib>
-#include <functional>
 #include <regex>
 #include <string>
 #include <vector>
@@ -29,32 +28,21 @@ class ExpertInitializeTest : public ExpertHostTest {
         ExpertHostTest::SetUp();
     }
 
-    // Runs `session` in a child process and returns its exit code (-1 when it did not exit).
-    static int RunInChild(const std::function<int()>& session) {
+    // In a child process: Initialize, ask for an item that does not exist (a failure traced under
+    // the error bit), Uninitialize. The child's exit code: 0 when every status was the expected
+    // one; -1 when it did not exit.
+    int SessionWithFailedLookup() {
         const pid_t child = fork();
         if (child == 0) {
-            _exit(session());
+            IuxSysPropertyBag* bag = nullptr;
+            _exit(expert->Initialize() != S_OK                                        ? 1
+                  : expert->GetPropertiesOfItem(L"eth7", &bag) != UX_E_ITEM_NOT_FOUND ? 2
+                  : expert->Uninitialize() != S_OK                                    ? 3
+                                                                                      : 0);
         }
         int status = 0;
-        if (child < 0 || waitpid(child, &status, 0) != child || !WIFEXITED(status)) {
-            return -1;
-        }
-        return WEXITSTATUS(status);
-    }
-
-    // In a child: Initialize, ask for an item that does not exist (a failure traced under the
-    // error bit), Uninitialize. 0 when every status was the expected one.
-    int SessionWithFailedLookup() {
-        return RunInChild([this] {
-            if (expert->Initialize() != S_OK) {
-                return 1;
-            }
-            IuxSysPropertyBag* bag = nullptr;
-            if (expert->GetPropertiesOfItem(L"eth7", &bag) != UX_E_ITEM_NOT_FOUND) {
-                return 2;
-            }
-            return expert->Uninitialize() == S_OK ? 0 : 3;
-        });
+        const bool exited = child > 0 && waitpid(child, &status, 0) == child && WIFEXITED(status);
+        return exited ? WEXITSTATUS(status) : -1;
     }
 
     // The names of the trace logs in the log directory `systemPath`.
@@ -124,6 +112,10 @@ INSTANTIATE_TEST_SUITE_P(
                      "[vqsyscfg]\nSeverity = -2\n[AllComponents]\nSeverity = 2\n", true},
         SettingsCase{"MalformedFallsBack",
                      "[vqsyscfg]\nSeverity = 2x\n[AllComponents]\nSeverity = 2\n", true},
+        SettingsCase{"NineIsADigit", "[vqsyscfg]\nSeverity = 9\n[AllComponents]\nSeverity = 2\n",
+                     false},
+        SettingsCase{"OnlyBlanksFallsBack",
+                     "[vqsyscfg]\nSeverity = \"  \"\n[AllComponents]\nSeverity = 2\n", true},
         SettingsCase{"PlusSignAndBlanks", "[vqsyscfg]\nSeverity = \" +2 \"\n", true},
         SettingsCase{"TooLargeIsAbsent", "[vqsyscfg]\nSeverity = 4294967298\n", false},
         SettingsCase{"NoOutputs", "[vqsyscfg]\nSeverity = 2\nTarget = 0\n", false}),

@@ -1,8 +1,7 @@
-// The item entry points as a host drives them: which items the controller yields, lookups by
-// name, refresh and search results, and the item manager that experts of one process share.
+// The item entry points as a host drives them: which items the controller yields, lookups and
+// refreshes by name, validation answers, search results, and the item manager that experts of one
+// process share.
 #include <gtest/gtest.h>
-
-#include <utility>
 
 #include "ExpertHost.h"
 
@@ -48,99 +47,101 @@ class ExpertItemsTest : public ExpertHostTest {
     }
 };
 
-TEST_F(ExpertItemsTest, PropertiesAreFoundByNameIgnoringCase) {
-    const std::pair<const wchar_t*, const wchar_t*> lookups[] = {
-        {L"ETH0", L"eth0"}, {L"eth0", L"eth0"}, {L"vq kest chassis", kSystemItemName}};
-    for (const auto& [asked, itemName] : lookups) {
-        InterfaceRef<IuxSysPropertyBag> bag;
-        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(asked, bag.Receive())) << asked;
-        ASSERT_TRUE(bag);
-        EXPECT_EQ(itemName, ItemNameIn(bag.Get()));
+TEST_F(ExpertItemsTest, LookupsAndRefreshesFindItemsByNameIgnoringCase) {
+    const uint32_t tags[] = {kItemNameTag, 0x7FFFF000};
+    const struct {
+        const wchar_t* asked;
+        int tagCount;  // -1: GetPropertiesOfItem; else PopulateOrRefreshProperties with `tags`
+        const uint32_t* tags;
+        HRESULT status;
+        const wchar_t* itemName;  // of the bag handed out; null: none
+    } cases[] = {
+        {L"ETH0", -1, nullptr, S_OK, L"eth0"},
+        {L"eth0", -1, nullptr, S_OK, L"eth0"},
+        {L"vq kest chassis", -1, nullptr, S_OK, kSystemItemName},
+        {L"vq kest chassis", 2, tags, S_FALSE, kSystemItemName},
+        {L"eth0", 0, tags, UX_E_PROPERTY_NOT_FOUND, nullptr},
+        {L"eth0", 1, nullptr, E_POINTER, nullptr},
+        {L"eth1", -1, nullptr, UX_E_ITEM_NOT_FOUND, nullptr},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(testing::Message() << c.asked << " " << c.tagCount);
+        IuxSysPropertyBag* bag = nullptr;
+        EXPECT_EQ(c.status, c.tagCount < 0 ? expert->GetPropertiesOfItem(c.asked, &bag)
+                                           : expert->PopulateOrRefreshProperties(
+                                                 c.asked, c.tagCount, c.tags, &bag));
+        const InterfaceRef<IuxSysPropertyBag> held(bag);
+        ASSERT_EQ(c.itemName != nullptr, bag != nullptr);
+        if (bag != nullptr) {
+            EXPECT_EQ(c.itemName, ItemNameIn(bag));
+        }
     }
     EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
 }
 
-TEST_F(ExpertItemsTest, UnknownItemIsNotFound) {
-    IuxSysPropertyBag* bag = reinterpret_cast<IuxSysPropertyBag*>(this);
-    EXPECT_EQ(UX_E_ITEM_NOT_FOUND, expert->GetPropertiesOfItem(L"eth1", &bag));
-    EXPECT_EQ(nullptr, bag);
+// The host gets the status, the message as a host string and no enumerator; persisting without
+// validating first refuses a bad value too, and nothing reaches the controller.
+TEST_F(ExpertItemsTest, ValidationAnswersWithStatusAndMessage) {
+    constexpr uint32_t kHostNameTag = 0x0101F000;
+    constexpr uint32_t kCommentTag = 0x0103D000;
+    const struct {
+        uint32_t tag;
+        const wchar_t* value;  // null: nothing modified
+        HRESULT status;
+        const wchar_t* message;
+        HRESULT persisted;
+    } cases[] = {
+        {kHostNameTag, nullptr, S_FALSE, L"", S_OK},
+        {kHostNameTag, L"kest_2", UX_E_HOSTNAME_INVALID,
+         L"Hostname must contain only alphanumeric characters and hyphens.", UX_E_HOSTNAME_INVALID},
+        {kCommentTag, L"rack\r4", UX_E_VALUE_INVALID, L"Comment cannot contain control characters.",
+         UX_E_VALUE_INVALID},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.message);
+        InterfaceRef<IuxSysPropertyBag> current;
+        ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, current.Receive()));
+        InterfaceRef<IuxSysPropertyBag> changes;
+        ASSERT_EQ(S_OK, current->Clone(changes.Receive()));
+        if (c.value != nullptr) {
+            ASSERT_EQ(S_OK, changes->SetString(c.tag, c.value));
+        }
+        IuxSysEnumPropertyTag* validated = reinterpret_cast<IuxSysEnumPropertyTag*>(this);
+        CvqBStr message = nullptr;
+        EXPECT_EQ(c.status, expert->ValidatePropertyChanges(kSystemItemName, changes.Get(),
+                                                            &validated, &message));
+        EXPECT_EQ(nullptr, validated);
+        EXPECT_EQ(c.message, TakeWideHostString(message));
+        int32_t restart = -1;
+        EXPECT_EQ(c.persisted,
+                  expert->PersistPropertyChanges(kSystemItemName, changes.Get(), &restart));
+    }
+    EXPECT_EQ(std::string::npos, sysroot.ReadFile(kControllerCallLogPath).find("\tSet"));
 }
 
-TEST_F(ExpertItemsTest, RefreshWithoutTagsFindsNothing) {
-    const uint32_t tag = kItemNameTag;
-    IuxSysPropertyBag* bag = reinterpret_cast<IuxSysPropertyBag*>(this);
-    EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND, expert->PopulateOrRefreshProperties(L"eth0", 0, &tag, &bag));
-    EXPECT_EQ(nullptr, bag);
-    EXPECT_EQ(E_POINTER, expert->PopulateOrRefreshProperties(L"eth0", 1, nullptr, &bag));
-}
-
-TEST_F(ExpertItemsTest, RefreshFindingSomeTagsReturnsTheBagWithFalse) {
-    const uint32_t tags[] = {kItemNameTag, 0x7FFFF000};
-    InterfaceRef<IuxSysPropertyBag> bag;
-    ASSERT_EQ(S_FALSE,
-              expert->PopulateOrRefreshProperties(L"vq kest chassis", 2, tags, bag.Receive()));
-    ASSERT_TRUE(bag);
-    EXPECT_EQ(kSystemItemName, ItemNameIn(bag.Get()));
-}
-
-TEST_F(ExpertItemsTest, ValidatingNoChangeReturnsFalseAndNoEnumerator) {
-    InterfaceRef<IuxSysPropertyBag> current;
-    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(kSystemItemName, current.Receive()));
-    InterfaceRef<IuxSysPropertyBag> unchanged;
-    ASSERT_EQ(S_OK, current->Clone(unchanged.Receive()));
-    IuxSysEnumPropertyTag* validated = reinterpret_cast<IuxSysEnumPropertyTag*>(this);
-    EXPECT_EQ(S_FALSE, expert->ValidatePropertyChanges(kSystemItemName, unchanged.Get(), &validated,
-                                                       nullptr));
-    EXPECT_EQ(nullptr, validated);
-}
-
-TEST_F(ExpertItemsTest, SearchDeliversEveryItemToTheSink) {
-    RecordingSink sink(S_OK);
-    EXPECT_EQ(S_OK, expert->SearchForItemsAndProperties(&sink));
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), sink.names);
-}
-
-TEST_F(ExpertItemsTest, SearchEndsWithTheStatusOfARefusingSink) {
+TEST_F(ExpertItemsTest, SearchDeliversItemsToTheSinkUntilItRefuses) {
+    RecordingSink all(S_OK);
+    EXPECT_EQ(S_OK, expert->SearchForItemsAndProperties(&all));
+    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), all.names);
     const HRESULT refusal = static_cast<HRESULT>(0x80041234u);
-    RecordingSink sink(refusal);
-    EXPECT_EQ(refusal, expert->SearchForItemsAndProperties(&sink));
-    EXPECT_EQ((Names{kSystemItemName}), sink.names);
+    RecordingSink refusing(refusal);
+    EXPECT_EQ(refusal, expert->SearchForItemsAndProperties(&refusing));
+    EXPECT_EQ((Names{kSystemItemName}), refusing.names);
     EXPECT_EQ(E_POINTER, expert->SearchForItemsAndProperties(nullptr));
-}
-
-TEST_F(ExpertItemsTest, PersistingANetworkChangeRestartsTheInterfaceAfterwards) {
-    WriteControllerState(StateWithDevice(1, "eth0") +
-                         "Mode = 2\nRequestMode = 2\n[Network]\nPrimaryDeviceIndex = 9\n");
-    InterfaceRef<IuxSysPropertyBag> current;
-    ASSERT_EQ(S_OK, expert->GetPropertiesOfItem(L"eth0", current.Receive()));
-    InterfaceRef<IuxSysPropertyBag> changes;
-    ASSERT_EQ(S_OK, current->Clone(changes.Receive()));
-    ASSERT_EQ(S_OK, changes->SetBool(0x0D126000, 1));
-
-    int32_t restartRequired = -1;
-    EXPECT_EQ(S_OK, expert->PersistPropertyChanges(L"eth0", changes.Get(), &restartRequired));
-    changes.Reset();
-    EXPECT_EQ(0, restartRequired);
-    EXPECT_EQ(1, ControllerCalls("SetPrimaryDeviceByIndex"));
-
-    // The last reference waits for the pending restart: down, then up again.
-    EXPECT_EQ(0u, expert.Detach()->Release());
-    EXPECT_EQ(2, ControllerCalls("SetNetworkInterfaceState"));
 }
 
 TEST_F(ExpertItemsTest, ExpertsShareOneItemManagerUntilTheLastIsReleased) {
     InterfaceRef<IuxSysExpert3> second = plugin.CreateExpert();
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert.Get()));
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second.Get()));
-    EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
-
+    const Names items = {kSystemItemName, L"eth0"};
+    EXPECT_EQ(items, ItemNames(expert.Get()));
+    EXPECT_EQ(items, ItemNames(second.Get()));
     EXPECT_EQ(0u, expert.Detach()->Release());
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(second.Get()));
+    EXPECT_EQ(items, ItemNames(second.Get()));
     EXPECT_EQ(1, ControllerCalls("GetDeviceHandlers"));
 
     EXPECT_EQ(0u, second.Detach()->Release());
     expert = plugin.CreateExpert();
-    EXPECT_EQ((Names{kSystemItemName, L"eth0"}), ItemNames(expert.Get()));
+    EXPECT_EQ(items, ItemNames(expert.Get()));
     EXPECT_EQ(2, ControllerCalls("GetDeviceHandlers"));
 }
 

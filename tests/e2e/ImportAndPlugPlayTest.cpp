@@ -3,7 +3,6 @@
 // the primary chain in the expert's own table.
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <string>
 #include <vector>
 
@@ -16,21 +15,6 @@ constexpr int kGetImportableTagsSlot = 21;
 constexpr int kGetMatchingItemsSlot = 22;
 constexpr int kUnsupportedImportSlot = 23;
 
-// A host's plug-and-play callback that only counts its references.
-class CountingCallback : public IUnknown {
-  public:
-    HRESULT QueryInterface(const IID& /*iid*/, void** object) override {
-        *object = nullptr;
-        return E_NOINTERFACE;
-    }
-    uint32_t AddRef() override { return ++references_; }
-    uint32_t Release() override { return --references_; }
-    uint32_t References() const { return references_; }
-
-  private:
-    std::atomic<uint32_t> references_{1};
-};
-
 class ImportAndPlugPlayTest : public ExpertHostTest {
   protected:
     void SetUp() override {
@@ -38,9 +22,6 @@ class ImportAndPlugPlayTest : public ExpertHostTest {
         ExpertHostTest::SetUp();
     }
 
-    HRESULT GetImportableTags(const wchar_t* item, IuxSysEnumPropertyTag** tags) {
-        return CallSlot<HRESULT>(expert.Get(), kGetImportableTagsSlot, item, tags);
-    }
     HRESULT GetMatchingItems(IuxSysPropertyBag* description, CvqBStr* exactName,
                              IuxSysEnumStringList** names, void** reserved) {
         return CallSlot<HRESULT>(expert.Get(), kGetMatchingItemsSlot, description, exactName, names,
@@ -54,25 +35,20 @@ class ImportAndPlugPlayTest : public ExpertHostTest {
         EXPECT_EQ(S_OK, bag->SetString(kItemNameTag, name));
         return bag;
     }
-
-    InterfaceRef<IuxSysExpertPlugPlay> PlugPlay() {
-        InterfaceRef<IuxSysExpertPlugPlay> plugPlay;
-        EXPECT_EQ(S_OK, expert->QueryInterface(IID_IuxSysExpertPlugPlay,
-                                               reinterpret_cast<void**>(plugPlay.Receive())));
-        return plugPlay;
-    }
 };
 
 TEST_F(ImportAndPlugPlayTest, NoItemHasImportableTags) {
-    for (const wchar_t* item : {kSystemItemName, L"eth0", L"ETH0"}) {
+    const std::pair<const wchar_t*, HRESULT> cases[] = {{kSystemItemName, S_FALSE},
+                                                        {L"eth0", S_FALSE},
+                                                        {L"ETH0", S_FALSE},
+                                                        {L"eth7", UX_E_ITEM_NOT_FOUND}};
+    for (const auto& [item, status] : cases) {
         IuxSysEnumPropertyTag* tags = reinterpret_cast<IuxSysEnumPropertyTag*>(&tags);
-        EXPECT_EQ(S_FALSE, GetImportableTags(item, &tags));
+        EXPECT_EQ(status, CallSlot<HRESULT>(expert.Get(), kGetImportableTagsSlot, item, &tags));
         EXPECT_EQ(nullptr, tags);
     }
-    IuxSysEnumPropertyTag* tags = reinterpret_cast<IuxSysEnumPropertyTag*>(&tags);
-    EXPECT_EQ(UX_E_ITEM_NOT_FOUND, GetImportableTags(L"eth7", &tags));
-    EXPECT_EQ(nullptr, tags);
-    EXPECT_EQ(E_POINTER, GetImportableTags(L"eth0", nullptr));
+    EXPECT_EQ(E_POINTER, CallSlot<HRESULT>(expert.Get(), kGetImportableTagsSlot, L"eth0",
+                                           static_cast<IuxSysEnumPropertyTag**>(nullptr)));
     EXPECT_EQ(E_NOTIMPL, CallSlot<HRESULT>(expert.Get(), kUnsupportedImportSlot));
 }
 
@@ -97,9 +73,7 @@ TEST_F(ImportAndPlugPlayTest, MatchingItemsFollowTheDescribedName) {
         ASSERT_NE(nullptr, names);
         EXPECT_EQ(entry.names, TakeNames(names));
         EXPECT_EQ(entry.exactName != nullptr, exactName != nullptr);
-        if (entry.exactName != nullptr) {
-            EXPECT_EQ(std::wstring(entry.exactName), TakeWideHostString(exactName));
-        }
+        EXPECT_EQ(entry.exactName ? entry.exactName : L"", TakeWideHostString(exactName));
     }
 }
 
@@ -119,8 +93,9 @@ TEST_F(ImportAndPlugPlayTest, MatchingItemsRejectsMissingArgumentsAndUnnamedDesc
 }
 
 TEST_F(ImportAndPlugPlayTest, PlugPlayCallbackIsHeldOnceUntilReplacedOrTheExpertGoes) {
-    CountingCallback callback;
-    InterfaceRef<IuxSysExpertPlugPlay> plugPlay = PlugPlay();
+    RecordingSink callback(S_OK);
+    auto plugPlay = kest::hostkit::QueryInterfaceAs<IuxSysExpertPlugPlay>(expert.Get(),
+                                                                          IID_IuxSysExpertPlugPlay);
     EXPECT_EQ(S_OK, plugPlay->SetPlugPlayCallback(&callback));
     EXPECT_EQ(S_OK, plugPlay->SetPlugPlayCallback(&callback));
     EXPECT_EQ(2u, callback.References());
