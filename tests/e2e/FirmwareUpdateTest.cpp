@@ -21,6 +21,7 @@
 #include <functional>
 #include <regex>
 #include <thread>
+#include <tuple>
 #include <utility>
 
 #include "ExpertHost.h"
@@ -87,11 +88,8 @@ class HostImage : public IuxSysFirmwareImageFile {
     std::atomic<uint32_t> references_{1};
 };
 
-struct FirmwareStatus {
-    HRESULT result;
-    int32_t state;
-    int32_t percent;
-};
+// What GetFirmwareUpdateStatus answers: its status, the state and the percentage.
+using FirmwareStatus = std::tuple<HRESULT, int32_t, int32_t>;
 
 // The file `path` names (links followed) by device and inode; zeros when there is none.
 std::pair<dev_t, ino_t> FileIdOf(const std::string& path) {
@@ -199,11 +197,12 @@ class FirmwareUpdateTest : public ExpertHostTest {
     }
 
     FirmwareStatus Poll() const {
-        FirmwareStatus status{S_OK, 0, kUntouchedPercent};
-        status.result =
-            firmware->GetFirmwareUpdateStatus(kSystemItemName, &status.state, &status.percent);
-        return status;
+        int32_t state = 0;
+        int32_t percent = kUntouchedPercent;
+        const HRESULT result = firmware->GetFirmwareUpdateStatus(kSystemItemName, &state, &percent);
+        return {result, state, percent};
     }
+    int32_t State() const { return std::get<1>(Poll()); }
 
     // Uninitialize returns once the tool has ended and its outcome is recorded.
     void WaitForTool() const { ASSERT_EQ(S_OK, expert->Uninitialize()); }
@@ -250,29 +249,24 @@ TEST_P(FirmwareStagingTest, InstallsExactlyTheHostsImage) {
     HostImage file(imagePath);
     HostImage& image = imageFile ? file : bytes;
     EXPECT_EQ(UX_E_FIRMWARE_BUSY, Start(L"{00000000-0000-0000-0000-000000000000}", image));
-    EXPECT_EQ(UX_FIRMWARE_STATE_IDLE, Poll().state);
+    EXPECT_EQ(UX_FIRMWARE_STATE_IDLE, State());
 
     // The size announced for a file is not compared with it.
     const std::wstring id = Prepare(imageFile ? 7 : kImageSize);
     EXPECT_TRUE(std::regex_match(std::string(id.begin(), id.end()),
                                  std::regex("\\{[0-9A-F]{8}-[0-9A-F]{4}-[0-9A-F]{4}-[0-9A-F]{4}-"
                                             "[0-9A-F]{12}\\}")));
-    FirmwareStatus status = Poll();
-    EXPECT_EQ(UX_FIRMWARE_STATE_PREPARED, status.state);
-    EXPECT_EQ(20, status.percent);
+    EXPECT_EQ(std::make_tuple(S_OK, UX_FIRMWARE_STATE_PREPARED, 20), Poll());
     EXPECT_EQ(E_FAIL, PrepareStatus());
     ASSERT_EQ(S_OK, Start(id, image));
     EXPECT_EQ(1u, image.References());
     EXPECT_EQ(UX_E_FIRMWARE_BUSY, Start(id, image));
     EXPECT_EQ(E_FAIL, PrepareStatus());
-    EXPECT_EQ(kRunning, Poll().state);
+    EXPECT_EQ(kRunning, State());
     ReleaseTool(0);
     WaitForTool();
 
-    status = Poll();
-    EXPECT_EQ(S_OK, status.result);
-    EXPECT_EQ(kInstalled, status.state);
-    EXPECT_EQ(90, status.percent);
+    EXPECT_EQ(std::make_tuple(S_OK, kInstalled, 90), Poll());
     EXPECT_EQ(kImage, sysroot.ReadFile("/tool/image"));
     EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
     EXPECT_EQ(sysroot.PathOf(kToolPath) + "\n" + sysroot.PathOf(kStagingPath) + "\n3\n",
@@ -327,7 +321,7 @@ TEST_F(FirmwareUpdateTest, PrepareNeedsTwiceTheAnnouncedSizeFree) {
         EXPECT_EQ(E_FAIL, firmware->PrepareFirmwareUpdate(kSystemItemName, 0, size, &id)) << size;
         EXPECT_EQ(nullptr, id);
     }
-    EXPECT_EQ(UX_FIRMWARE_STATE_IDLE, Poll().state);
+    EXPECT_EQ(UX_FIRMWARE_STATE_IDLE, State());
     EXPECT_EQ(S_OK, PrepareStatus());
 }
 
@@ -366,9 +360,7 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndLeaveTheStagingPath) {
         if (entry.image != nullptr) {
             EXPECT_EQ(1u, entry.image->References());
         }
-        const FirmwareStatus after = Poll();
-        EXPECT_EQ(kFailed, after.state);
-        EXPECT_EQ(-1, after.percent);
+        EXPECT_EQ(std::make_tuple(S_OK, kFailed, -1), Poll());
         EXPECT_EQ(before, FileIdOf(staging));
         ExpectNoTemporaries();
     }
@@ -386,7 +378,7 @@ TEST_F(FirmwareUpdateTest, AnImageThatCannotBeSyncedLeavesTheEarlierStagingFile)
         GTEST_SKIP() << "no system call filter here";
     }
     EXPECT_EQ(E_FAIL, started);
-    EXPECT_EQ(kFailed, Poll().state);
+    EXPECT_EQ(kFailed, State());
     EXPECT_EQ("an earlier image", sysroot.ReadFile(kStagingPath));
 }
 
@@ -427,7 +419,7 @@ TEST_F(FirmwareUpdateTest, AStagingFilePlantedByAnotherUserAndRewrittenLaterIsNo
     EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
     ReleaseTool(0);
     WaitForTool();
-    EXPECT_EQ(kInstalled, Poll().state);
+    EXPECT_EQ(kInstalled, State());
     EXPECT_EQ(kImage, sysroot.ReadFile("/tool/image"));
     EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
     EXPECT_EQ(kImage, sysroot.ReadFile(kStagingPath));
@@ -457,7 +449,7 @@ TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
     ASSERT_EQ(S_OK, otherPrepare());
     HostImage image(kImage, kImageSize);
     EXPECT_EQ(E_FAIL, Start(id, image));
-    EXPECT_EQ(kFailed, Poll().state);
+    EXPECT_EQ(kFailed, State());
 
     ASSERT_EQ(S_OK, otherFirmware->StartFirmwareUpdate(
                         kSystemItemName, TakeWideHostString(otherId).c_str(), 0, nullptr, &image));
@@ -470,58 +462,21 @@ TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
     EXPECT_EQ(S_OK, PrepareStatus());
 }
 
-TEST_F(FirmwareUpdateTest, StatusFileStagesReportTheirPercentages) {
-    HostImage image(kImage, kImageSize);
-    // A status file of an earlier run is removed before the tool starts.
-    sysroot.WriteFile(kStatusFilePath, "d\n");
-    ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
-    const FirmwareStatus first = Poll();
-    EXPECT_EQ(S_OK, first.result);
-    EXPECT_EQ(kRunning, first.state);
-    EXPECT_EQ(5, first.percent);
-    WaitForToolStart();
+// A status file content written while the tool runs (null: none written, "/": a directory in
+// the file's place), and what the poll that follows answers.
+struct Stage {
+    const char* content;
+    HRESULT result;
+    int32_t state;
+    int32_t percent;
+};
 
-    const std::string statusFile = sysroot.PathOf(kStatusFilePath);
-    const struct {
-        const char* content;  // "/": a directory in the file's place
-        int32_t state;
-        int32_t percent;
-    } stages[] = {
-        {"0\n", kRunning, 5},
-        {"1", kRunning, 20},
-        {" \t\n2\n", kRunning, 30},
-        {"3x", kRunning, 40},
-        {"4\n", kRunning, 50},
-        {"/", kRunning, 50},
-        {"5\n", kRunning, 60},
-        {"5\n", UX_FIRMWARE_STATE_FINISHING, 70},
-        {"x", UX_FIRMWARE_STATE_FINISHING, 70},
-    };
-    for (const auto& stage : stages) {
-        SCOPED_TRACE(stage.content);
-        unlink(statusFile.c_str());
-        rmdir(statusFile.c_str());
-        if (std::string(stage.content) == "/") {
-            ASSERT_EQ(0, mkdir(statusFile.c_str(), 0700));
-        } else {
-            sysroot.WriteFile(kStatusFilePath, stage.content);
-        }
-        const FirmwareStatus status = Poll();
-        EXPECT_EQ(S_OK, status.result);
-        EXPECT_EQ(stage.state, status.state);
-        EXPECT_EQ(stage.percent, status.percent);
-    }
-    ReleaseTool(0);
-    WaitForTool();
-    EXPECT_EQ(kInstalled, Poll().state);
-}
-
-// How the tool ends, or the failure code it writes to the status file while it runs.
+// How the tool ends, and the stages it goes through first (then it waits for its release and
+// exits 0).
 struct ToolRun {
     const char* name;
     const char* ending;
-    const char* status;  // null: none; else written once the tool runs, then the tool exits 0
-    HRESULT statusResult;
+    std::vector<Stage> stages;
     int32_t state;                     // at the end
     bool hostIgnoresChildren = false;  // the host sets SIGCHLD to SIG_IGN
 };
@@ -538,19 +493,25 @@ TEST_P(FirmwareToolRunTest, DecidesTheOutcome) {
         ignore.sa_handler = SIG_IGN;
         ASSERT_EQ(0, sigaction(SIGCHLD, &ignore, &previous));
     }
+    // A status file of an earlier run is removed before the tool starts.
+    sysroot.WriteFile(kStatusFilePath, "d\n");
     ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
-    if (GetParam().status != nullptr) {
-        // A failure code fails the update at once and the tool's end decides the final state.
+    if (!GetParam().stages.empty()) {
+        EXPECT_EQ(std::make_tuple(S_OK, kRunning, 5), Poll());
         WaitForToolStart();
-        sysroot.WriteFile(kStatusFilePath, GetParam().status);
-        FirmwareStatus status = Poll();
-        EXPECT_EQ(GetParam().statusResult, status.result);
-        EXPECT_EQ(kRunning, status.state);
-        EXPECT_EQ(kUntouchedPercent, status.percent);
-        status = Poll();
-        EXPECT_EQ(S_OK, status.result);
-        EXPECT_EQ(kFailed, status.state);
-        EXPECT_EQ(-1, status.percent);
+        for (const Stage& stage : GetParam().stages) {
+            if (stage.content != nullptr) {
+                Shell("rm -rf var/run/firmware_update/status");
+                if (std::string(stage.content) == "/") {
+                    sysroot.MakeDirectory(kStatusFilePath);
+                } else {
+                    sysroot.WriteFile(kStatusFilePath, stage.content);
+                }
+            }
+            EXPECT_EQ(std::make_tuple(stage.result, stage.state, stage.percent), Poll())
+                << (stage.content ? stage.content : "(unchanged)");
+        }
+        // The tool is not stopped by a failure code; how it ends decides the final state.
         EXPECT_EQ(E_FAIL, PrepareStatus());
         ReleaseTool(0);
     }
@@ -558,38 +519,55 @@ TEST_P(FirmwareToolRunTest, DecidesTheOutcome) {
     if (GetParam().hostIgnoresChildren) {
         sigaction(SIGCHLD, &previous, nullptr);
     }
-    const FirmwareStatus status = Poll();
-    EXPECT_EQ(GetParam().state, status.state);
     const bool installed = GetParam().state == kInstalled;
-    EXPECT_EQ(installed ? 90 : -1, status.percent);
+    EXPECT_EQ(std::make_tuple(S_OK, GetParam().state, installed ? 90 : -1), Poll());
     EXPECT_EQ(installed, sysroot.Exists(kStagingPath));
     EXPECT_EQ(installed ? E_FAIL : S_OK, PrepareStatus());
 }
 
+// A failure code fails the update at once, leaving the percentage alone.
+std::vector<Stage> FailsWith(const char* code, HRESULT result) {
+    return {{code, result, kRunning, kUntouchedPercent}, {nullptr, S_OK, kFailed, -1}};
+}
+
 INSTANTIATE_TEST_SUITE_P(
     Endings, FirmwareToolRunTest,
-    testing::Values(
-        ToolRun{"ExitStatus0", "exit 0\n", nullptr, S_OK, kInstalled},
-        ToolRun{"ExitStatus1", "exit 1\n", nullptr, S_OK, kFailed},
-        ToolRun{"Killed", "kill -KILL $$\n", nullptr, S_OK, kFailed},
-        ToolRun{"Terminated", "kill -TERM $$\n", nullptr, S_OK, kFailed},
-        ToolRun{"ExitStatus0HostIgnoringChildren", "exit 0\n", nullptr, S_OK, kInstalled, true},
-        ToolRun{"ExitStatus1HostIgnoringChildren", "exit 1\n", nullptr, S_OK, kFailed, true},
-        ToolRun{"StatusCodeA", kWaitForRelease, "a\n", E_FAIL, kInstalled},
-        ToolRun{"StatusCodeD", kWaitForRelease, "d", UX_E_FIRMWARE_STATUS_FAILED, kInstalled},
-        ToolRun{"StatusCodeT", kWaitForRelease, " t\n", UX_E_FIRMWARE_STATUS_FAILED, kInstalled},
-        ToolRun{"UnknownStatusCode", kWaitForRelease, "x\n", UX_E_FIRMWARE_STATUS_UNEXPECTED,
-                kInstalled},
-        ToolRun{"EmptyStatus", kWaitForRelease, "", UX_E_FIRMWARE_STATUS_UNEXPECTED, kInstalled},
-        ToolRun{"BlankStatus", kWaitForRelease, " \n\n", UX_E_FIRMWARE_STATUS_UNEXPECTED,
-                kInstalled}),
+    testing::Values(ToolRun{"ExitStatus0", "exit 0\n", {}, kInstalled},
+                    ToolRun{"ExitStatus1", "exit 1\n", {}, kFailed},
+                    ToolRun{"Killed", "kill -KILL $$\n", {}, kFailed},
+                    ToolRun{"Terminated", "kill -TERM $$\n", {}, kFailed},
+                    ToolRun{"ExitStatus0HostIgnoringChildren", "exit 0\n", {}, kInstalled, true},
+                    ToolRun{"ExitStatus1HostIgnoringChildren", "exit 1\n", {}, kFailed, true},
+                    ToolRun{"StagesReportTheirPercentages",
+                            kWaitForRelease,
+                            {{"0\n", S_OK, kRunning, 5},
+                             {"1", S_OK, kRunning, 20},
+                             {" \t\n2\n", S_OK, kRunning, 30},
+                             {"3x", S_OK, kRunning, 40},
+                             {"4\n", S_OK, kRunning, 50},
+                             {"/", S_OK, kRunning, 50},
+                             {"5\n", S_OK, kRunning, 60},
+                             {nullptr, S_OK, UX_FIRMWARE_STATE_FINISHING, 70},
+                             {"x", S_OK, UX_FIRMWARE_STATE_FINISHING, 70}},
+                            kInstalled},
+                    ToolRun{"StatusCodeA", kWaitForRelease, FailsWith("a\n", E_FAIL), kInstalled},
+                    ToolRun{"StatusCodeD", kWaitForRelease,
+                            FailsWith("d", UX_E_FIRMWARE_STATUS_FAILED), kInstalled},
+                    ToolRun{"StatusCodeT", kWaitForRelease,
+                            FailsWith(" t\n", UX_E_FIRMWARE_STATUS_FAILED), kInstalled},
+                    ToolRun{"UnknownStatusCode", kWaitForRelease,
+                            FailsWith("x\n", UX_E_FIRMWARE_STATUS_UNEXPECTED), kInstalled},
+                    ToolRun{"EmptyStatus", kWaitForRelease,
+                            FailsWith("", UX_E_FIRMWARE_STATUS_UNEXPECTED), kInstalled},
+                    ToolRun{"BlankStatus", kWaitForRelease,
+                            FailsWith(" \n\n", UX_E_FIRMWARE_STATUS_UNEXPECTED), kInstalled}),
     [](const testing::TestParamInfo<ToolRun>& entry) { return entry.param.name; });
 
 TEST_F(FirmwareUpdateTest, UninitializeAndDestructionWaitForTheRunningTool) {
     HostImage image(kImage, kImageSize);
     ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
     ExpectStopWaitsForTheTool([&] { EXPECT_EQ(S_OK, expert->Uninitialize()); });
-    EXPECT_EQ(kInstalled, Poll().state);
+    EXPECT_EQ(kInstalled, State());
 
     // A host that uninitialises a new expert before it starts the update leaves only the
     // destruction to wait (and the process-wide tracer shut down for the tests that follow).
