@@ -4,9 +4,6 @@
 #include <gtest/gtest.h>
 #include <time.h>
 
-#include <cstdlib>
-#include <sstream>
-
 #include "ExpertHost.h"
 
 namespace kest::test::e2e {
@@ -40,22 +37,6 @@ class EthernetItemTest : public ExpertHostTest {
         bag->ClearAllModified();
     }
 
-    // The logged calls that change the controller, and their times.
-    std::vector<std::string> ControllerChanges(std::vector<double>* times = nullptr) const {
-        std::vector<std::string> calls;
-        std::istringstream log(sysroot.ReadFile(kControllerCallLogPath));
-        for (std::string line; std::getline(log, line);) {
-            const std::string call = line.substr(line.find('\t') + 1);
-            if (call.compare(0, 3, "Set") == 0) {
-                calls.push_back(call);
-                if (times != nullptr) {
-                    times->push_back(std::strtod(line.c_str(), nullptr));
-                }
-            }
-        }
-        return calls;
-    }
-
     InterfaceRef<IuxSysPropertyBag2> bag;
 };
 
@@ -72,7 +53,7 @@ TEST_F(EthernetItemTest, NewAddressesAreWrittenAtOnceAndEachRestartFollowsTheAns
     ASSERT_EQ(S_OK, expert->PersistPropertyChanges(kEth0, bag.Get(), &restart));
     const double returnedMs = MonotonicMs();
     EXPECT_EQ(0, restart);
-    EXPECT_EQ(1u, ControllerChanges().size());
+    EXPECT_EQ(1u, ControllerCalls("Set").size());
     // The second address comes after the first restart ended; the second restart runs on until
     // the expert is released.
     ASSERT_EQ(S_OK, bag->SetString(kIPAddressTag, L"10.0.0.6"));
@@ -90,7 +71,7 @@ TEST_F(EthernetItemTest, NewAddressesAreWrittenAtOnceAndEachRestartFollowsTheAns
                                                "SetNetworkInterfaceState\t0\teth0\t0",
                                                "SetNetworkInterfaceState\t0\teth0\t1",
                                                "SetDeviceSettings\t0\t0\t4\t0\t0"};
-    EXPECT_EQ(expected, ControllerChanges(&times));
+    EXPECT_EQ(expected, ControllerCalls("Set", &times));
     ASSERT_EQ(8u, times.size());
     // The log keeps three decimals, so a logged time may lie up to 1 µs before the call.
     EXPECT_GE(times[1] + 0.001, returnedMs);

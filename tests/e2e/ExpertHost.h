@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cstdlib>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -105,13 +106,19 @@ class ExpertHostTest : public ::testing::Test {
         kest::hostkit::WriteControllerState(sysroot.Root(), state);
     }
 
-    // How often the controller library has been called with `callName`.
-    int ControllerCalls(const std::string& callName) const {
+    // The logged controller calls (name and arguments, tab-separated) that start with `prefix`,
+    // and their times in milliseconds when `times` is given.
+    std::vector<std::string> ControllerCalls(const std::string& prefix,
+                                             std::vector<double>* times = nullptr) const {
+        std::vector<std::string> calls;
         std::istringstream log(sysroot.ReadFile(kControllerCallLogPath));
-        int calls = 0;
         for (std::string line; std::getline(log, line);) {
-            if (line.find("\t" + callName + "\t") != std::string::npos) {
-                ++calls;
+            const std::string call = line.substr(line.find('\t') + 1);
+            if (call.compare(0, prefix.size(), prefix) == 0) {
+                calls.push_back(call);
+                if (times != nullptr) {
+                    times->push_back(std::strtod(line.c_str(), nullptr));
+                }
             }
         }
         return calls;

@@ -1,13 +1,15 @@
 // Initialize as a host sees it: the diagnostics settings file decides which failures reach the
 // trace log, and where the log goes. The tracer fixes its log path once per process, so each
 // host session runs in a child process of its own and the test reads the files it left.
-#include <dirent.h>
+#include <glob.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdlib>
+#include <iterator>
 #include <regex>
 #include <string>
 #include <vector>
@@ -47,18 +49,13 @@ class ExpertInitializeTest : public ExpertHostTest {
 
     // The names of the trace logs in the log directory `systemPath`.
     std::vector<std::string> TraceLogs(const std::string& systemPath) const {
-        static const std::regex logName("[0-9]{8}_[0-9]{6}-uxTracer-[0-9A-F]{8}\\.log");
+        static const std::regex logName(".*/[0-9]{8}_[0-9]{6}-uxTracer-[0-9A-F]{8}\\.log");
+        glob_t found{};
+        glob(sysroot.PathOf(systemPath + "/*").c_str(), 0, nullptr, &found);
         std::vector<std::string> logs;
-        DIR* directory = opendir(sysroot.PathOf(systemPath).c_str());
-        if (directory == nullptr) {
-            return logs;
-        }
-        while (const dirent* entry = readdir(directory)) {
-            if (std::regex_match(entry->d_name, logName)) {
-                logs.push_back(entry->d_name);
-            }
-        }
-        closedir(directory);
+        std::copy_if(found.gl_pathv, found.gl_pathv + found.gl_pathc, std::back_inserter(logs),
+                     [](const char* path) { return std::regex_match(path, logName); });
+        globfree(&found);
         return logs;
     }
 
@@ -66,7 +63,8 @@ class ExpertInitializeTest : public ExpertHostTest {
     std::string TraceLogText(const std::string& systemPath) const {
         const std::vector<std::string> logs = TraceLogs(systemPath);
         EXPECT_LE(logs.size(), 1u);
-        return logs.empty() ? std::string() : sysroot.ReadFile(systemPath + "/" + logs[0]);
+        return logs.empty() ? std::string()
+                            : sysroot.ReadFile(logs[0].substr(sysroot.Root().size()));
     }
 };
 

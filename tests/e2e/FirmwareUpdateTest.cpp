@@ -1,7 +1,6 @@
 // Firmware update as a host drives it: prepare, start with either kind of image source, follow
 // the progress of a stand-in update tool, and the end of the worker at Uninitialize and
 // destruction. The stand-in records its arguments, environment and image, then runs its ending.
-#include <fcntl.h>
 #include <gtest/gtest.h>
 #include <linux/filter.h>
 #include <linux/seccomp.h>
@@ -10,7 +9,6 @@
 #include <sys/stat.h>
 #include <sys/statvfs.h>
 #include <sys/syscall.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -40,6 +38,14 @@ constexpr int32_t kRunning = UX_FIRMWARE_STATE_RUNNING;
 constexpr int32_t kInstalled = UX_FIRMWARE_STATE_INSTALLED;
 constexpr int32_t kFailed = UX_FIRMWARE_STATE_FAILED;
 
+// What the stand-in tool records before its ending.
+constexpr char kToolRecords[] = R"(printf '%s\n' "$0" "$@" > "$root/tool/args"
+export -p > "$root/tool/environment"
+cat "$1" > "$root/tool/image"
+cksum < "$1" > "$root/tool/sum.start"
+: > "$root/tool/started"
+)";
+
 // The stand-in's ending that waits for ReleaseTool, checksums the staging file again and exits
 // with the code given there.
 constexpr char kWaitForRelease[] =
@@ -52,24 +58,20 @@ constexpr char kWaitForRelease[] =
 class HostImage : public IuxSysFirmwareImageFile {
   public:
     HostImage(std::string bytes, uint32_t reportedSize)
-        : bytes_(std::move(bytes)), reportedSize_(reportedSize) {}
+        : bytes_(std::move(bytes)), size_(reportedSize) {}
     // A file at `path`; GetImageFilePath answers `pathStatus`.
     explicit HostImage(const std::string& path, HRESULT pathStatus = S_OK)
-        : path_(path.begin(), path.end()), pathStatus_(pathStatus), isFile_(true) {}
+        : path_(path.begin(), path.end()), pathStatus_(pathStatus) {}
 
     HRESULT QueryInterface(const IID& iid, void** object) override {
-        if (iid == IID_IUnknown || iid == IID_IuxSysFirmwareImageSource ||
-            (isFile_ && iid == IID_IuxSysFirmwareImageFile)) {
-            AddRef();
-            *object = this;
-            return S_OK;
-        }
-        *object = nullptr;
-        return E_NOINTERFACE;
+        const bool offered = iid == IID_IUnknown || iid == IID_IuxSysFirmwareImageSource ||
+                             (!path_.empty() && iid == IID_IuxSysFirmwareImageFile);
+        *object = offered ? this : nullptr;
+        return offered ? (AddRef(), S_OK) : E_NOINTERFACE;
     }
     uint32_t AddRef() override { return ++references_; }
     uint32_t Release() override { return --references_; }
-    uint32_t GetImageSize() override { return reportedSize_; }
+    uint32_t GetImageSize() override { return size_; }
     const uint8_t* GetImageBytes() override {
         return reinterpret_cast<const uint8_t*>(bytes_.data());
     }
@@ -81,10 +83,9 @@ class HostImage : public IuxSysFirmwareImageFile {
 
   private:
     std::string bytes_;
-    uint32_t reportedSize_ = 0;
+    uint32_t size_ = 0;
     std::wstring path_;
     HRESULT pathStatus_ = S_OK;
-    bool isFile_ = false;
     std::atomic<uint32_t> references_{1};
 };
 
@@ -146,22 +147,14 @@ class FirmwareUpdateTest : public ExpertHostTest {
 
     // The tool gets an empty environment, so it names the sysroot itself.
     void InstallTool(const std::string& ending) const {
-        sysroot.WriteScript(kToolPath, "root='" + sysroot.Root() +
-                                           "'\n"
-                                           "printf '%s\\n' \"$0\" \"$@\" > \"$root/tool/args\"\n"
-                                           "export -p > \"$root/tool/environment\"\n"
-                                           "cat \"$1\" > \"$root/tool/image\"\n"
-                                           "cksum < \"$1\" > \"$root/tool/sum.start\"\n"
-                                           ": > \"$root/tool/started\"\n" +
-                                           ending);
+        sysroot.WriteScript(kToolPath, "root='" + sysroot.Root() + "'\n" + kToolRecords + ending);
     }
 
     // Runs shell `commands` in the sysroot, with the staging path relative to it in $S.
     void Shell(const std::string& commands) const {
-        ASSERT_EQ(0, std::system(("cd '" + sysroot.Root() + "' && S=" + (kStagingPath + 1) +
-                                  " && " + commands)
-                                     .c_str()))
-            << commands;
+        const std::string script = "cd '" + sysroot.Root() + "' && export S=" + (kStagingPath + 1) +
+                                   " && {\n" + commands + "\n}";
+        ASSERT_EQ(0, std::system(script.c_str())) << commands;
     }
 
     void ReleaseTool(int exitCode) const {
@@ -171,12 +164,14 @@ class FirmwareUpdateTest : public ExpertHostTest {
     // No temporary is left beside the staging file.
     void ExpectNoTemporaries() const { Shell("! ls -A var/volatile/tmp | grep -vx ${S##*/}"); }
 
-    // Returns once the tool runs; it removes the status file first, so write that only after.
-    void WaitForToolStart() const {
-        while (!sysroot.Exists("/tool/started")) {
-            usleep(10000);
-        }
+    // Shell commands that wait until the test `condition` holds, failing after a minute.
+    static std::string WaitUntil(const std::string& condition) {
+        return "for i in $(seq 6000); do [ " + condition + " ] && break; sleep 0.01; done; [ " +
+               condition + " ]";
     }
+
+    // Returns once the tool runs; it removes the status file first, so write that only after.
+    void WaitForToolStart() const { Shell(WaitUntil("-e tool/started")); }
 
     std::wstring Prepare(uint32_t size) const {
         CvqBStr id = nullptr;
@@ -386,50 +381,29 @@ TEST_F(FirmwareUpdateTest, AStagingFilePlantedByAnotherUserAndRewrittenLaterIsNo
     // The sysroot is reachable for an unprivileged user and the staging directory is shared.
     ASSERT_EQ(0, chmod(sysroot.Root().c_str(), 0755));
     ASSERT_EQ(0, chmod(sysroot.PathOf(kStagingDirectory).c_str(), 01777));
-    const std::string staging = sysroot.PathOf(kStagingPath);
-    int planted[2];
-    int rewrite[2];
-    ASSERT_EQ(0, pipe(planted));
-    ASSERT_EQ(0, pipe(rewrite));
-    const pid_t user = fork();
-    ASSERT_LE(0, user);
-    if (user == 0) {
-        // Only system calls between fork and _exit: the test process has other threads.
-        char go = 0;
-        if (setgid(65534) != 0 || setuid(65534) != 0) {
-            _exit(2);
-        }
-        const int file = open(staging.c_str(), O_WRONLY | O_CREAT | O_EXCL, 0666);
-        const bool written = file >= 0 && write(file, "planted", 7) == 7;
-        if (write(planted[1], written ? "y" : "n", 1) != 1 || read(rewrite[0], &go, 1) != 1) {
-            _exit(3);
-        }
-        static const char kEvil[] = "the user's own image";
-        _exit(pwrite(file, kEvil, sizeof kEvil - 1, 0) == sizeof kEvil - 1 ? 0 : 4);
-    }
-    char answer = 0;
-    ASSERT_EQ(1, read(planted[0], &answer, 1));
-    ASSERT_EQ('y', answer);
+    // The user plants the staging file and keeps it open; once the update has put another file
+    // in its place, the user writes its own image through the planted one and says so.
+    Shell(
+        "setpriv --reuid=65534 --regid=65534 --clear-groups sh -c '"
+        "exec 3>$S && echo planted >&3 && : >$S.planted || exit; "
+        "while [ $S -ef /proc/$$/fd/3 ]; do sleep 0.01; done; "
+        "echo the users own image >&3 && : >$S.rewritten' & " +
+        WaitUntil("-e $S.planted"));
     HostImage image(kImage, kImageSize);
     ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
     WaitForToolStart();
-    ASSERT_EQ(1, write(rewrite[1], "g", 1));
-    int status = 0;
-    ASSERT_EQ(user, waitpid(user, &status, 0));
-    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+    Shell(WaitUntil("-e $S.rewritten"));
     ReleaseTool(0);
     WaitForTool();
     EXPECT_EQ(kInstalled, State());
     EXPECT_EQ(kImage, sysroot.ReadFile("/tool/image"));
     EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
     EXPECT_EQ(kImage, sysroot.ReadFile(kStagingPath));
-    for (int descriptor : {planted[0], planted[1], rewrite[0], rewrite[1]}) {
-        close(descriptor);
-    }
 }
 
-// A second expert of the same process stands for any other host: the controller runs one update.
-TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
+// A second expert of the same process stands for any other host: the controller runs one update
+// at a time. Uninitialize and the destruction of an expert wait for its running tool.
+TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerControllerAndExpertsWaitForTheirTool) {
     const InterfaceRef<IuxSysExpert3> other = plugin.CreateExpert();
     ASSERT_EQ(S_OK, other->Initialize());
     const auto otherFirmware = kest::hostkit::QueryInterfaceAs<IuxSysExpertFirmware>(
@@ -455,11 +429,17 @@ TEST_F(FirmwareUpdateTest, TheUpdateLockAdmitsOneUpdatePerController) {
                         kSystemItemName, TakeWideHostString(otherId).c_str(), 0, nullptr, &image));
     WaitForToolStart();
     EXPECT_EQ(E_FAIL, PrepareStatus());
-    ReleaseTool(0);
-    ASSERT_EQ(S_OK, other->Uninitialize());
+    ExpectStopWaitsForTheTool([&] { EXPECT_EQ(S_OK, other->Uninitialize()); });
     EXPECT_EQ(sysroot.ReadFile("/tool/sum.start"), sysroot.ReadFile("/tool/sum.end"));
+
     // The tool has ended: the controller is free again, although the other expert stays busy.
-    EXPECT_EQ(S_OK, PrepareStatus());
+    // This expert was uninitialised before its update starts: only its destruction waits.
+    Shell("rm tool/release tool/finished");
+    ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
+    ExpectStopWaitsForTheTool([&] {
+        firmware.Reset();
+        expert.Reset();
+    });
 }
 
 // A status file content written while the tool runs (null: none written, "/": a directory in
@@ -562,29 +542,6 @@ INSTANTIATE_TEST_SUITE_P(
                     ToolRun{"BlankStatus", kWaitForRelease,
                             FailsWith(" \n\n", UX_E_FIRMWARE_STATUS_UNEXPECTED), kInstalled}),
     [](const testing::TestParamInfo<ToolRun>& entry) { return entry.param.name; });
-
-TEST_F(FirmwareUpdateTest, UninitializeAndDestructionWaitForTheRunningTool) {
-    HostImage image(kImage, kImageSize);
-    ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
-    ExpectStopWaitsForTheTool([&] { EXPECT_EQ(S_OK, expert->Uninitialize()); });
-    EXPECT_EQ(kInstalled, State());
-
-    // A host that uninitialises a new expert before it starts the update leaves only the
-    // destruction to wait (and the process-wide tracer shut down for the tests that follow).
-    firmware.Reset();
-    expert = plugin.CreateExpert();
-    ASSERT_EQ(S_OK, expert->Initialize());
-    ASSERT_EQ(S_OK, expert->Uninitialize());
-    firmware = kest::hostkit::QueryInterfaceAs<IuxSysExpertFirmware>(expert.Get(),
-                                                                     IID_IuxSysExpertFirmware);
-    unlink(sysroot.PathOf("/tool/release").c_str());
-    unlink(sysroot.PathOf("/tool/finished").c_str());
-    ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
-    ExpectStopWaitsForTheTool([&] {
-        firmware.Reset();
-        expert.Reset();
-    });
-}
 
 }  // namespace
 }  // namespace kest::test::e2e

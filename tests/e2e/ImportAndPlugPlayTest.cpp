@@ -75,16 +75,14 @@ TEST_F(ImportAndPlugPlayTest, MatchingItemsFollowTheDescribedName) {
         EXPECT_EQ(entry.exactName != nullptr, exactName != nullptr);
         EXPECT_EQ(entry.exactName ? entry.exactName : L"", TakeWideHostString(exactName));
     }
-}
 
-TEST_F(ImportAndPlugPlayTest, MatchingItemsRejectsMissingArgumentsAndUnnamedDescriptions) {
+    // Missing arguments, and a description without an item name.
     const InterfaceRef<IuxSysPropertyBag> description = DescriptionNaming(L"eth0");
     CvqBStr exactName = nullptr;
     IuxSysEnumStringList* names = nullptr;
     void* reserved = nullptr;
     EXPECT_EQ(E_POINTER, GetMatchingItems(description.Get(), &exactName, &names, nullptr));
     EXPECT_EQ(E_POINTER, GetMatchingItems(nullptr, &exactName, &names, &reserved));
-
     ASSERT_EQ(S_OK, description->RemoveTag(kItemNameTag));
     EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND,
               GetMatchingItems(description.Get(), &exactName, &names, &reserved));
