@@ -22,7 +22,6 @@ namespace kest::test::e2e {
 
 using kest::hostkit::InterfaceRef;
 using kest::hostkit::kControllerCallLogPath;
-using kest::hostkit::kControllerStatePath;
 using kest::hostkit::TakeWideHostString;
 
 constexpr uint32_t kItemNameTag = 0x0101D000;
@@ -122,13 +121,6 @@ class ExpertHostTest : public ::testing::Test {
             }
         }
         return calls;
-    }
-
-    // The item names the expert reports.
-    std::vector<std::wstring> ItemNames(IuxSysExpert3* from) const {
-        IuxSysEnumStringList* names = nullptr;
-        EXPECT_EQ(S_OK, from->SearchForItemNames(&names));
-        return names == nullptr ? std::vector<std::wstring>{} : TakeNames(names);
     }
 
     kest::test::TempSysroot sysroot;

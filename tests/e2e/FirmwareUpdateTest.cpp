@@ -326,6 +326,7 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndLeaveTheStagingPath) {
     HostImage failingPath("/nowhere", E_FAIL);
     HostImage missingFile("/nonexistent/firmware.bin");
     HostImage pipeFile(sysroot.PathOf("/images/pipe"));
+    HostImage copiedFile(shmImage);
     const std::string staging = sysroot.PathOf(kStagingPath);
     const struct {
         const char* name;
@@ -333,6 +334,7 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndLeaveTheStagingPath) {
         HostImage* image;  // null: no image source
         HRESULT expected;
         const char* setup;
+        bool syncFails = false;  // every fsync of the starting thread fails
     } cases[] = {
         {"wrong identifier", false, &bytes, UX_E_FIRMWARE_ID_MISMATCH, ":"},
         {"wrong byte count", true, &shortImage, UX_E_FIRMWARE_STATUS_UNEXPECTED, ":"},
@@ -342,6 +344,9 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndLeaveTheStagingPath) {
         // A pipe links like a file but would stall the tool.
         {"image file is a pipe", true, &pipeFile, E_FAIL, "mkdir -p images && mkfifo images/pipe"},
         {"staging path is a directory", true, &bytes, E_FAIL, "mkdir $S"},
+        // A copied image is synced before it replaces the staging file.
+        {"copied image cannot be synced", true, &copiedFile, E_FAIL,
+         "echo an earlier image > $S && echo image > /dev/shm/kest-image-$PPID", true},
     };
     for (const auto& entry : cases) {
         SCOPED_TRACE(entry.name);
@@ -350,8 +355,17 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndLeaveTheStagingPath) {
         // Each Prepare succeeds only because the attempt before freed the expert.
         const std::wstring id = Prepare(kImageSize);
         const std::wstring given = entry.rightIdentifier ? id : id + L"0";
-        EXPECT_EQ(entry.expected, firmware->StartFirmwareUpdate(kSystemItemName, given.c_str(), 0,
-                                                                nullptr, entry.image));
+        HRESULT started = S_OK;
+        const auto start = [&] {
+            started = firmware->StartFirmwareUpdate(kSystemItemName, given.c_str(), 0, nullptr,
+                                                    entry.image);
+        };
+        if (!entry.syncFails) {
+            start();
+        } else if (!RunWithFailingSync(start)) {
+            continue;  // the system refuses the filter (an emulator may); the last row
+        }
+        EXPECT_EQ(entry.expected, started);
         if (entry.image != nullptr) {
             EXPECT_EQ(1u, entry.image->References());
         }
@@ -360,21 +374,6 @@ TEST_F(FirmwareUpdateTest, RejectedStartsEndTheAttemptAndLeaveTheStagingPath) {
         ExpectNoTemporaries();
     }
     EXPECT_FALSE(sysroot.Exists("/tool/args"));
-}
-
-// A copied image is synced before it replaces the staging file.
-TEST_F(FirmwareUpdateTest, AnImageThatCannotBeSyncedLeavesTheEarlierStagingFile) {
-    sysroot.WriteFile(kStagingPath, "an earlier image");
-    Shell("printf 'new firmware image' > " + shmImage);
-    HostImage file(shmImage);
-    const std::wstring id = Prepare(kImageSize);
-    HRESULT started = S_OK;
-    if (!RunWithFailingSync([&] { started = Start(id, file); })) {
-        GTEST_SKIP() << "no system call filter here";
-    }
-    EXPECT_EQ(E_FAIL, started);
-    EXPECT_EQ(kFailed, State());
-    EXPECT_EQ("an earlier image", sysroot.ReadFile(kStagingPath));
 }
 
 TEST_F(FirmwareUpdateTest, AStagingFilePlantedByAnotherUserAndRewrittenLaterIsNotInstalled) {
