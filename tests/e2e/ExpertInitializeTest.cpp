@@ -8,6 +8,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdlib>
 #include <iterator>
 #include <regex>
 #include <string>
@@ -82,41 +83,29 @@ TEST_F(ExpertInitializeTest, ExistingSharedLogDirectoryIsPreferred) {
     EXPECT_FALSE(sysroot.Exists(kFallbackLogDirectory));
 }
 
-struct SettingsCase {
-    const char* name;
-    const char* settings;
-    bool traced;
-};
-
-class DiagnosticsSettingsTest : public ExpertInitializeTest,
-                                public ::testing::WithParamInterface<SettingsCase> {};
-
-TEST_P(DiagnosticsSettingsTest, DecideWhetherTheErrorReachesTheLog) {
-    sysroot.WriteFile(kSettingsPath, GetParam().settings);
-    ASSERT_EQ(0, SessionWithFailedLookup());
-    EXPECT_EQ(GetParam().traced,
-              std::regex_search(TraceLogText(kFallbackLogDirectory), kNotFoundRecord));
+TEST_F(ExpertInitializeTest, DiagnosticsSettingsDecideWhetherTheErrorReachesTheLog) {
+    const std::string shared = "[AllComponents]\nSeverity = 2\n";
+    const std::pair<std::string, bool> cases[] = {
+        {"[vqsyscfg]\nSeverity = 2\n", true},
+        {shared, true},
+        {shared + "[vqsyscfg]\nSeverity = 1\n", false},  // the own section wins
+        {"[vqsyscfg]\nSeverity = -2\n" + shared, true},
+        {"[vqsyscfg]\nSeverity = 2x\n" + shared, true},
+        {"[vqsyscfg]\nSeverity = 9\n" + shared, false},
+        {"[vqsyscfg]\nSeverity = \"  \"\n" + shared, true},
+        {"[vqsyscfg]\nSeverity = \" +2 \"\n", true},
+        {"[vqsyscfg]\nSeverity = 4294967298\n", false},
+        {"[vqsyscfg]\nSeverity = 2\nTarget = 0\n", false},
+    };
+    for (const auto& [settings, traced] : cases) {
+        ASSERT_EQ(0,
+                  std::system(("rm -rf '" + sysroot.PathOf(kFallbackLogDirectory) + "'").c_str()));
+        sysroot.WriteFile(kSettingsPath, settings);
+        ASSERT_EQ(0, SessionWithFailedLookup());
+        EXPECT_EQ(traced, std::regex_search(TraceLogText(kFallbackLogDirectory), kNotFoundRecord))
+            << settings;
+    }
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    Settings, DiagnosticsSettingsTest,
-    ::testing::Values(
-        SettingsCase{"OwnSection", "[vqsyscfg]\nSeverity = 2\n", true},
-        SettingsCase{"SharedSection", "[AllComponents]\nSeverity = 2\n", true},
-        SettingsCase{"OwnSectionWins", "[AllComponents]\nSeverity = 2\n[vqsyscfg]\nSeverity = 1\n",
-                     false},
-        SettingsCase{"NegativeFallsBack",
-                     "[vqsyscfg]\nSeverity = -2\n[AllComponents]\nSeverity = 2\n", true},
-        SettingsCase{"MalformedFallsBack",
-                     "[vqsyscfg]\nSeverity = 2x\n[AllComponents]\nSeverity = 2\n", true},
-        SettingsCase{"NineIsADigit", "[vqsyscfg]\nSeverity = 9\n[AllComponents]\nSeverity = 2\n",
-                     false},
-        SettingsCase{"OnlyBlanksFallsBack",
-                     "[vqsyscfg]\nSeverity = \"  \"\n[AllComponents]\nSeverity = 2\n", true},
-        SettingsCase{"PlusSignAndBlanks", "[vqsyscfg]\nSeverity = \" +2 \"\n", true},
-        SettingsCase{"TooLargeIsAbsent", "[vqsyscfg]\nSeverity = 4294967298\n", false},
-        SettingsCase{"NoOutputs", "[vqsyscfg]\nSeverity = 2\nTarget = 0\n", false}),
-    [](const ::testing::TestParamInfo<SettingsCase>& param) { return param.param.name; });
 
 // What another user planted where the log directory belongs: Initialize succeeds, tracing goes
 // on without the log file, and nothing lands where a link points.

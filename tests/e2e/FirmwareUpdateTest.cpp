@@ -38,7 +38,6 @@ constexpr int32_t kRunning = UX_FIRMWARE_STATE_RUNNING;
 constexpr int32_t kInstalled = UX_FIRMWARE_STATE_INSTALLED;
 constexpr int32_t kFailed = UX_FIRMWARE_STATE_FAILED;
 
-// What the stand-in tool records before its ending.
 constexpr char kToolRecords[] = R"(printf '%s\n' "$0" "$@" > "$root/tool/args"
 export -p > "$root/tool/environment"
 cat "$1" > "$root/tool/image"
@@ -46,8 +45,7 @@ cksum < "$1" > "$root/tool/sum.start"
 : > "$root/tool/started"
 )";
 
-// The stand-in's ending that waits for ReleaseTool, checksums the staging file again and exits
-// with the code given there.
+// The stand-in's ending that waits for ReleaseTool, checksums the image again and exits.
 constexpr char kWaitForRelease[] =
     "while [ ! -e \"$root/tool/release\" ]; do sleep 0.02; done\n"
     "cksum < \"$1\" > \"$root/tool/sum.end\"\n"
@@ -89,7 +87,6 @@ class HostImage : public IuxSysFirmwareImageFile {
     std::atomic<uint32_t> references_{1};
 };
 
-// What GetFirmwareUpdateStatus answers: its status, the state and the percentage.
 using FirmwareStatus = std::tuple<HRESULT, int32_t, int32_t>;
 
 // The file `path` names (links followed) by device and inode; zeros when there is none.
@@ -118,7 +115,6 @@ bool RunWithFailingSync(const std::function<void()>& action) {
     return filtered;
 }
 
-// An initialised expert, its firmware interface and the stand-in tool in the sysroot.
 class FirmwareUpdateTest : public ExpertHostTest {
   protected:
     void SetUp() override {
@@ -199,7 +195,7 @@ class FirmwareUpdateTest : public ExpertHostTest {
     }
     int32_t State() const { return std::get<1>(Poll()); }
 
-    // Uninitialize returns once the tool has ended and its outcome is recorded.
+    // Returns once the tool has ended and its outcome is recorded.
     void WaitForTool() const { ASSERT_EQ(S_OK, expert->Uninitialize()); }
 
     // Runs `stop` on another thread while the tool waits: it returns only after the tool ended.
@@ -450,8 +446,7 @@ struct Stage {
     int32_t percent;
 };
 
-// How the tool ends, and the stages it goes through first (then it waits for its release and
-// exits 0).
+// How the tool ends, and the stages it goes through first (then it is released with 0).
 struct ToolRun {
     const char* name;
     const char* ending;
