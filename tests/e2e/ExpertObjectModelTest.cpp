@@ -1,7 +1,9 @@
-// The expert as a host sees it: raw interface pointers from the loaded plug-in, their identities
-// and counts, and the operations at fixed slots of their tables.
+// The plug-in as a host sees it: the factory as its only exported symbol, raw interface pointers
+// from it, their identities and counts, and the operations at fixed slots of their tables.
 #include <gtest/gtest.h>
 
+#include <cstdio>
+#include <regex>
 #include <string>
 
 #include "ExpertHost.h"
@@ -76,21 +78,8 @@ TEST_F(ExpertObjectModelTest, SecondaryInterfacesShareTheIdentityAndTheCount) {
     EXPECT_EQ(1u, expert->Release());
 }
 
-TEST_F(ExpertObjectModelTest, UnmappedIdentifiersGiveNoInterfaceAndNull) {
-    IUnknown* firmware = Query(expert, IID_IuxSysExpertFirmware);
-    const std::pair<IUnknown*, const IID*> cases[] = {{expert, &IID_IuxSysExpertImportExport},
-                                                      {expert, &IID_IuxSysExpertInfo},
-                                                      {expert, &kUnknownIdentifier},
-                                                      {firmware, &IID_IuxSysExpertImportExport}};
-    for (const auto& [object, iid] : cases) {
-        void* result = &result;
-        EXPECT_EQ(E_NOINTERFACE, object->QueryInterface(*iid, &result));
-        EXPECT_EQ(nullptr, result);
-    }
-    firmware->Release();
-}
-
-TEST_F(ExpertObjectModelTest, OperationsAnswerAtTheirSlots) {
+// Unmapped identifiers give no interface and null; the operations answer at their slots.
+TEST_F(ExpertObjectModelTest, UnmappedIdentifiersAndOperationsAtTheirSlots) {
     GUID classId{};
     ASSERT_EQ(S_OK, expert->GetExpertClassId(&classId));
     EXPECT_TRUE(classId == kKestExpertClassId);
@@ -105,6 +94,15 @@ TEST_F(ExpertObjectModelTest, OperationsAnswerAtTheirSlots) {
     }
 
     IUnknown* firmware = Query(expert, IID_IuxSysExpertFirmware);
+    const std::pair<IUnknown*, const IID*> unmapped[] = {{expert, &IID_IuxSysExpertImportExport},
+                                                         {expert, &IID_IuxSysExpertInfo},
+                                                         {expert, &kUnknownIdentifier},
+                                                         {firmware, &IID_IuxSysExpertImportExport}};
+    for (const auto& [object, iid] : unmapped) {
+        void* result = &result;
+        EXPECT_EQ(E_NOINTERFACE, object->QueryInterface(*iid, &result));
+        EXPECT_EQ(nullptr, result);
+    }
     const struct {
         IUnknown* object;
         int slot;
@@ -125,6 +123,20 @@ TEST_F(ExpertObjectModelTest, OperationsAnswerAtTheirSlots) {
         EXPECT_EQ(E_NOTIMPL, notifications->HandleFrameworkNotification(code, expert));
     }
     notifications->Release();
+}
+
+TEST(ExportedSymbolsTest, OnlyTheFactoryIsDefined) {
+    const std::string command = std::string("nm -D --defined-only '") + KEST_PLUGIN_PATH + "'";
+    FILE* pipe = popen(command.c_str(), "r");
+    ASSERT_NE(nullptr, pipe) << command;
+    std::string lines;
+    char buffer[512];
+    while (std::fgets(buffer, sizeof buffer, pipe) != nullptr) {
+        lines += buffer;
+    }
+    pclose(pipe);
+    EXPECT_TRUE(std::regex_match(lines, std::regex("[0-9a-f]+ T createKestSysApiChassisExpert\n")))
+        << lines;
 }
 
 }  // namespace

@@ -4,7 +4,6 @@
 #include <gtest/gtest.h>
 #include <linux/filter.h>
 #include <linux/seccomp.h>
-#include <signal.h>
 #include <sys/prctl.h>
 #include <sys/stat.h>
 #include <sys/statvfs.h>
@@ -451,8 +450,7 @@ struct ToolRun {
     const char* name;
     const char* ending;
     std::vector<Stage> stages;
-    int32_t state;                     // at the end
-    bool hostIgnoresChildren = false;  // the host sets SIGCHLD to SIG_IGN
+    int32_t state;  // at the end
 };
 
 class FirmwareToolRunTest : public FirmwareUpdateTest,
@@ -461,12 +459,6 @@ class FirmwareToolRunTest : public FirmwareUpdateTest,
 TEST_P(FirmwareToolRunTest, DecidesTheOutcome) {
     InstallTool(GetParam().ending);
     HostImage image(kImage, kImageSize);
-    struct sigaction previous {};
-    if (GetParam().hostIgnoresChildren) {
-        struct sigaction ignore {};
-        ignore.sa_handler = SIG_IGN;
-        ASSERT_EQ(0, sigaction(SIGCHLD, &ignore, &previous));
-    }
     // A status file of an earlier run is removed before the tool starts.
     sysroot.WriteFile(kStatusFilePath, "d\n");
     ASSERT_EQ(S_OK, Start(Prepare(kImageSize), image));
@@ -490,9 +482,6 @@ TEST_P(FirmwareToolRunTest, DecidesTheOutcome) {
         ReleaseTool(0);
     }
     WaitForTool();
-    if (GetParam().hostIgnoresChildren) {
-        sigaction(SIGCHLD, &previous, nullptr);
-    }
     const bool installed = GetParam().state == kInstalled;
     EXPECT_EQ(std::make_tuple(S_OK, GetParam().state, installed ? 90 : -1), Poll());
     EXPECT_EQ(installed, sysroot.Exists(kStagingPath));
@@ -510,8 +499,6 @@ INSTANTIATE_TEST_SUITE_P(
                     ToolRun{"ExitStatus1", "exit 1\n", {}, kFailed},
                     ToolRun{"Killed", "kill -KILL $$\n", {}, kFailed},
                     ToolRun{"Terminated", "kill -TERM $$\n", {}, kFailed},
-                    ToolRun{"ExitStatus0HostIgnoringChildren", "exit 0\n", {}, kInstalled, true},
-                    ToolRun{"ExitStatus1HostIgnoringChildren", "exit 1\n", {}, kFailed, true},
                     ToolRun{"StagesReportTheirPercentages",
                             kWaitForRelease,
                             {{"0\n", S_OK, kRunning, 5},
