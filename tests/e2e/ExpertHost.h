@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <cstdlib>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -21,7 +22,6 @@ namespace kest::test::e2e {
 
 using kest::hostkit::InterfaceRef;
 using kest::hostkit::kControllerCallLogPath;
-using kest::hostkit::kControllerStatePath;
 using kest::hostkit::TakeWideHostString;
 
 constexpr uint32_t kItemNameTag = 0x0101D000;
@@ -65,7 +65,8 @@ inline std::wstring ItemNameIn(IuxSysPropertyBag* bag) {
     return TakeWideHostString(name);
 }
 
-// A search sink that records the item name of every bag and answers with a fixed status.
+// A search sink that records the item name of every bag and answers with a fixed status; it
+// counts its references, so it also stands for a host's callback object.
 class RecordingSink : public IuxSysSearchSink {
   public:
     explicit RecordingSink(HRESULT answer) : answer_(answer) {}
@@ -82,6 +83,8 @@ class RecordingSink : public IuxSysSearchSink {
         names.push_back(ItemNameIn(item));
         return answer_;
     }
+
+    uint32_t References() const { return count_; }
 
     std::vector<std::wstring> names;
 
@@ -102,23 +105,22 @@ class ExpertHostTest : public ::testing::Test {
         kest::hostkit::WriteControllerState(sysroot.Root(), state);
     }
 
-    // How often the controller library has been called with `callName`.
-    int ControllerCalls(const std::string& callName) const {
+    // The logged controller calls (name and arguments, tab-separated) that start with `prefix`,
+    // and their times in milliseconds when `times` is given.
+    std::vector<std::string> ControllerCalls(const std::string& prefix,
+                                             std::vector<double>* times = nullptr) const {
+        std::vector<std::string> calls;
         std::istringstream log(sysroot.ReadFile(kControllerCallLogPath));
-        int calls = 0;
         for (std::string line; std::getline(log, line);) {
-            if (line.find("\t" + callName + "\t") != std::string::npos) {
-                ++calls;
+            const std::string call = line.substr(line.find('\t') + 1);
+            if (call.compare(0, prefix.size(), prefix) == 0) {
+                calls.push_back(call);
+                if (times != nullptr) {
+                    times->push_back(std::strtod(line.c_str(), nullptr));
+                }
             }
         }
         return calls;
-    }
-
-    // The item names the expert reports.
-    std::vector<std::wstring> ItemNames(IuxSysExpert3* from) const {
-        IuxSysEnumStringList* names = nullptr;
-        EXPECT_EQ(S_OK, from->SearchForItemNames(&names));
-        return names == nullptr ? std::vector<std::wstring>{} : TakeNames(names);
     }
 
     kest::test::TempSysroot sysroot;

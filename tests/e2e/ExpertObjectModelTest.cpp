@@ -1,18 +1,22 @@
-// The expert as a host sees it: raw interface pointers from the loaded plug-in.
+// The plug-in as a host sees it: the factory as its only exported symbol, raw interface pointers
+// from it, their identities and counts, and the operations at fixed slots of their tables.
 #include <gtest/gtest.h>
 
+#include <cstdio>
+#include <regex>
 #include <string>
 
 #include "ExpertHost.h"
 
 namespace kest::test::e2e {
-
 namespace {
 
 constexpr GUID kKestExpertClassId = {
     0x999d9aa4, 0x5475, 0x4ca7, {0xa5, 0x60, 0x93, 0xc5, 0x1b, 0x5b, 0xfc, 0xeb}};
 constexpr IID kUnknownIdentifier = {
     0x01234567, 0x89ab, 0xcdef, {0x01, 0x23, 0x45, 0x67, 0x89, 0xab, 0xcd, 0xef}};
+const IID* const kPrimaryIdentifiers[] = {&IID_IUnknown, &IID_IuxSysExpert, &IID_IuxSysExpert2,
+                                          &IID_IuxSysExpert3};
 
 class ExpertObjectModelTest : public ::testing::Test {
   protected:
@@ -26,7 +30,7 @@ class ExpertObjectModelTest : public ::testing::Test {
         }
     }
 
-    // The interface `iid` of the expert, which must answer it.
+    // The interface `iid` of `from`, which must answer it.
     IUnknown* Query(IUnknown* from, const IID& iid) {
         void* result = nullptr;
         EXPECT_EQ(S_OK, from->QueryInterface(iid, &result));
@@ -38,20 +42,10 @@ class ExpertObjectModelTest : public ::testing::Test {
     IuxSysExpert3* expert = nullptr;
 };
 
-TEST_F(ExpertObjectModelTest, FactoryRejectsANullResultPointer) {
+// The factory hands out exactly one reference, which the primary identifiers share.
+TEST_F(ExpertObjectModelTest, PrimaryIdentifiersYieldThePrimaryPointer) {
     EXPECT_EQ(E_POINTER, plugin.Factory()(nullptr));
-}
-
-TEST_F(ExpertObjectModelTest, FactoryHandsOutExactlyOneReference) {
-    EXPECT_EQ(2u, expert->AddRef());
-    EXPECT_EQ(1u, expert->Release());
-    EXPECT_EQ(0u, expert->Release());
-    expert = nullptr;
-}
-
-TEST_F(ExpertObjectModelTest, PrimaryIdentifiersAndIUnknownYieldThePrimaryPointer) {
-    for (const IID* iid :
-         {&IID_IUnknown, &IID_IuxSysExpert, &IID_IuxSysExpert2, &IID_IuxSysExpert3}) {
+    for (const IID* iid : kPrimaryIdentifiers) {
         IUnknown* result = Query(expert, *iid);
         EXPECT_EQ(static_cast<void*>(expert), static_cast<void*>(result));
         EXPECT_EQ(3u, result->AddRef());
@@ -69,8 +63,7 @@ TEST_F(ExpertObjectModelTest, SecondaryInterfacesShareTheIdentityAndTheCount) {
         EXPECT_NE(static_cast<void*>(expert), static_cast<void*>(second));
         EXPECT_EQ(++expected + 1, second->AddRef());
         EXPECT_EQ(expected, second->Release());
-        for (const IID* iid :
-             {&IID_IUnknown, &IID_IuxSysExpert, &IID_IuxSysExpert2, &IID_IuxSysExpert3}) {
+        for (const IID* iid : kPrimaryIdentifiers) {
             IUnknown* back = Query(second, *iid);
             EXPECT_EQ(static_cast<void*>(expert), static_cast<void*>(back));
             EXPECT_EQ(expected, back->Release());
@@ -85,47 +78,43 @@ TEST_F(ExpertObjectModelTest, SecondaryInterfacesShareTheIdentityAndTheCount) {
     EXPECT_EQ(1u, expert->Release());
 }
 
-TEST_F(ExpertObjectModelTest, UnmappedIdentifiersGiveNoInterfaceAndNull) {
-    for (const IID* iid :
-         {&IID_IuxSysExpertImportExport, &IID_IuxSysExpertInfo, &kUnknownIdentifier}) {
-        void* result = &result;
-        EXPECT_EQ(E_NOINTERFACE, expert->QueryInterface(*iid, &result));
-        EXPECT_EQ(nullptr, result);
-    }
-    IUnknown* firmware = Query(expert, IID_IuxSysExpertFirmware);
-    void* result = &result;
-    EXPECT_EQ(E_NOINTERFACE, firmware->QueryInterface(IID_IuxSysExpertImportExport, &result));
-    EXPECT_EQ(nullptr, result);
-    firmware->Release();
-}
-
-TEST_F(ExpertObjectModelTest, IdentityOperationsAnswerAtTheirSlots) {
+// Unmapped identifiers give no interface and null; the operations answer at their slots.
+TEST_F(ExpertObjectModelTest, UnmappedIdentifiersAndOperationsAtTheirSlots) {
     GUID classId{};
     ASSERT_EQ(S_OK, expert->GetExpertClassId(&classId));
     EXPECT_TRUE(classId == kKestExpertClassId);
-
-    const struct {
-        int slot;
-        const wchar_t* text;
-    } strings[] = {{4, L"KEST Configuration"}, {5, L"22.5"}, {6, L"vqsyscfg"}};
-    for (const auto& entry : strings) {
-        SCOPED_TRACE(entry.slot);
-        CvqBStr text = nullptr;
-        ASSERT_EQ(S_OK, CallSlot<HRESULT>(expert, entry.slot, &text));
-        EXPECT_EQ(std::wstring(entry.text), TakeWideHostString(text));
-        EXPECT_EQ(E_POINTER, CallSlot<HRESULT>(expert, entry.slot, static_cast<CvqBStr*>(nullptr)));
-    }
     EXPECT_EQ(E_POINTER, expert->GetExpertClassId(nullptr));
-}
+    const std::pair<int, const wchar_t*> strings[] = {
+        {4, L"KEST Configuration"}, {5, L"22.5"}, {6, L"vqsyscfg"}};
+    for (const auto& [slot, expectedText] : strings) {
+        CvqBStr text = nullptr;
+        ASSERT_EQ(S_OK, CallSlot<HRESULT>(expert, slot, &text)) << slot;
+        EXPECT_EQ(expectedText, TakeWideHostString(text));
+        EXPECT_EQ(E_POINTER, CallSlot<HRESULT>(expert, slot, static_cast<CvqBStr*>(nullptr)));
+    }
 
-TEST_F(ExpertObjectModelTest, UnsupportedSlotsAnswerTheirConstants) {
-    EXPECT_EQ(E_NOTIMPL, CallSlot<HRESULT>(expert, 13));
-    EXPECT_EQ(E_NOTIMPL, CallSlot<HRESULT>(expert, 14));
-    EXPECT_EQ(S_FALSE, CallSlot<HRESULT>(expert, 17));
-
-    auto* firmware = static_cast<IuxSysExpertFirmware*>(Query(expert, IID_IuxSysExpertFirmware));
-    EXPECT_EQ(E_NOTIMPL, CallSlot<HRESULT>(firmware, 5));
-    EXPECT_EQ(E_NOTIMPL, CallSlot<HRESULT>(firmware, 6));
+    IUnknown* firmware = Query(expert, IID_IuxSysExpertFirmware);
+    const std::pair<IUnknown*, const IID*> unmapped[] = {{expert, &IID_IuxSysExpertImportExport},
+                                                         {expert, &IID_IuxSysExpertInfo},
+                                                         {expert, &kUnknownIdentifier},
+                                                         {firmware, &IID_IuxSysExpertImportExport}};
+    for (const auto& [object, iid] : unmapped) {
+        void* result = &result;
+        EXPECT_EQ(E_NOINTERFACE, object->QueryInterface(*iid, &result));
+        EXPECT_EQ(nullptr, result);
+    }
+    const struct {
+        IUnknown* object;
+        int slot;
+        HRESULT answer;
+    } unsupported[] = {{expert, 13, E_NOTIMPL},
+                       {expert, 14, E_NOTIMPL},
+                       {expert, 17, S_FALSE},
+                       {firmware, 5, E_NOTIMPL},
+                       {firmware, 6, E_NOTIMPL}};
+    for (const auto& entry : unsupported) {
+        EXPECT_EQ(entry.answer, CallSlot<HRESULT>(entry.object, entry.slot)) << entry.slot;
+    }
     firmware->Release();
 
     auto* notifications = static_cast<IuxSysFrameworkNotificationHandler*>(
@@ -136,6 +125,19 @@ TEST_F(ExpertObjectModelTest, UnsupportedSlotsAnswerTheirConstants) {
     notifications->Release();
 }
 
-}  // namespace
+TEST(ExportedSymbolsTest, OnlyTheFactoryIsDefined) {
+    const std::string command = std::string("nm -D --defined-only '") + KEST_PLUGIN_PATH + "'";
+    FILE* pipe = popen(command.c_str(), "r");
+    ASSERT_NE(nullptr, pipe) << command;
+    std::string lines;
+    char buffer[512];
+    while (std::fgets(buffer, sizeof buffer, pipe) != nullptr) {
+        lines += buffer;
+    }
+    pclose(pipe);
+    EXPECT_TRUE(std::regex_match(lines, std::regex("[0-9a-f]+ T createKestSysApiChassisExpert\n")))
+        << lines;
+}
 
+}  // namespace
 }  // namespace kest::test::e2e
