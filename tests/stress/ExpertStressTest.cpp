@@ -18,6 +18,7 @@ namespace {
 
 using kest::test::e2e::InterfaceRef;
 using kest::test::e2e::kSystemItemName;
+using kest::test::e2e::TakeNames;
 
 constexpr uint32_t kHostNameTag = 0x0101F000;
 constexpr uint32_t kCommentTag = 0x0103D000;
@@ -69,7 +70,9 @@ TEST_F(StressExpertTest, ThreadsCreateQueryAndReleaseExperts) {
                 ASSERT_EQ(plugin.Factory()(&own), S_OK);
                 ASSERT_NE(own, nullptr);
                 EXPECT_EQ(own->Initialize(), S_OK);
-                EXPECT_EQ(ItemNames(own), expectedNames);
+                IuxSysEnumStringList* names = nullptr;
+                ASSERT_EQ(own->SearchForItemNames(&names), S_OK);
+                EXPECT_EQ(TakeNames(names), expectedNames);
                 EXPECT_EQ(ReadText(own, kHostNameTag), L"kest-1");
                 const InterfaceRef<IuxSysPropertyBag> changes =
                     Changes(own, [&](IuxSysPropertyBag* bag) {
