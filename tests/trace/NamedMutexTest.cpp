@@ -64,14 +64,13 @@ class SharedSysroot : public TempSysroot {
     }
 };
 
-TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLastMutex) {
+TEST(NamedMutexTest, LockFileIsPrivateSharedByNameAndHeldUntilTheOutermostUnlock) {
     TempSysroot sysroot;
-    mode_t previousMask = umask(022);
-    std::string path;
+    const mode_t previousMask = umask(022);
     {
         NamedMutex mutex("modes.lock");
         NamedMutex sameName("modes.lock");
-        path = mutex.LockFilePath();
+        const std::string path = mutex.LockFilePath();
         EXPECT_EQ(path, sysroot.PathOf("/var/tmp/korvane/shared/mutex/modes.lock"));
         EXPECT_EQ(ModeOf(path), 0600u);
         EXPECT_TRUE(mutex.HasFileLock());
@@ -79,9 +78,22 @@ TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLast
              {"/var/tmp/korvane", "/var/tmp/korvane/shared", "/var/tmp/korvane/shared/mutex"}) {
             EXPECT_EQ(ModeOf(sysroot.PathOf(directory)), 01777u) << directory;
         }
+        mutex.Lock();
+        sameName.Lock();
+        EXPECT_FALSE(FileLockIsFree(path));
+        sameName.Unlock();
+        EXPECT_FALSE(FileLockIsFree(path));
+        mutex.Unlock();
+        EXPECT_TRUE(FileLockIsFree(path));
     }
     umask(previousMask);
     EXPECT_FALSE(sysroot.Exists("/var/tmp/korvane/shared/mutex/modes.lock"));
+    // A process without standard input gets descriptor 0 for the lock file.
+    const int input = dup(STDIN_FILENO);
+    close(STDIN_FILENO);
+    EXPECT_TRUE(NamedMutex("zero.lock").HasFileLock());
+    dup2(input, STDIN_FILENO);
+    close(input);
     TempSysroot shared;
     setenv("VQDSCTMPSHAREDFILEDIR", shared.Root().c_str(), 1);
     NamedMutex elsewhere("elsewhere.lock");
@@ -89,7 +101,7 @@ TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLast
     EXPECT_EQ(elsewhere.LockFilePath(), shared.Root() + "/mutex/elsewhere.lock");
 }
 
-TEST(NamedMutexTest, AnythingButOurOwnPlainFileLeavesTheMutexWithoutFileLock) {
+TEST(NamedMutexTest, OnlyOurOwnPlainFileGivesAFileLock) {
     SharedSysroot sysroot;
     std::string directory = sysroot.PathOf("/var/tmp/korvane/shared/mutex");
     std::string victim = sysroot.PathOf("/victim");
@@ -100,10 +112,13 @@ TEST(NamedMutexTest, AnythingButOurOwnPlainFileLeavesTheMutexWithoutFileLock) {
     ASSERT_EQ(mkdir((directory + "/directory.lock").c_str(), 0777), 0);
     ASSERT_EQ(0, ExitCodeOf(StartAsNobody(
                      [&] { return close(creat((directory + "/foreign.lock").c_str(), 0666)); })));
-    for (const char* name :
-         {"symlink.lock", "hardlink.lock", "fifo.lock", "directory.lock", "foreign.lock"}) {
+    sysroot.WriteFile("/var/tmp/korvane/shared/mutex/left.lock", "");  // ours, from an earlier run
+    const std::pair<const char*, bool> names[] = {
+        {"left.lock", true},  {"symlink.lock", false},   {"hardlink.lock", false},
+        {"fifo.lock", false}, {"directory.lock", false}, {"foreign.lock", false}};
+    for (const auto& [name, fileLock] : names) {
         NamedMutex mutex(name);
-        EXPECT_FALSE(mutex.HasFileLock()) << name;
+        EXPECT_EQ(mutex.HasFileLock(), fileLock) << name;
         ScopedNamedLock stillOrdersThreads(mutex);
     }
     EXPECT_EQ(ModeOf(victim), 0600u);
@@ -172,19 +187,6 @@ TEST(NamedMutexTest, AFileLockHeldByAnotherUserCostsOneBoundedWait) {
     waitpid(holder, nullptr, 0);
     close(ready[0]);
     close(ready[1]);
-}
-
-TEST(NamedMutexTest, FileLockIsHeldUntilTheOutermostUnlock) {
-    TempSysroot sysroot;
-    NamedMutex mutex("recursive.lock");
-    NamedMutex sameName("recursive.lock");
-    mutex.Lock();
-    sameName.Lock();
-    EXPECT_FALSE(FileLockIsFree(mutex.LockFilePath()));
-    sameName.Unlock();
-    EXPECT_FALSE(FileLockIsFree(mutex.LockFilePath()));
-    mutex.Unlock();
-    EXPECT_TRUE(FileLockIsFree(mutex.LockFilePath()));
 }
 
 }  // namespace
