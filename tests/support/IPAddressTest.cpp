@@ -110,16 +110,6 @@ TEST(IPAddressTest, EqualityComparesFamilyZoneAndBytes) {
     EXPECT_EQ(a, b);
 }
 
-TEST(IPAddressTest, TextWithAZeroCharacterIsNoAddress) {
-    using namespace std::string_literals;
-    for (const std::string& text : {"::1\0junk"s, "fe80::1%lo\0x"s, "1.2.3.4\0"s, "\0"s}) {
-        IPAddress address;
-        EXPECT_FALSE(address.TryParse(text)) << text.size();
-        EXPECT_TRUE(address.IsUnset());
-        EXPECT_FALSE(address.TryParse(std::wstring(text.begin(), text.end()))) << text.size();
-    }
-}
-
 }  // namespace
 
 }  // namespace kest::test::support
