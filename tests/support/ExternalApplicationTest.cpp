@@ -1,6 +1,5 @@
 #include "support/ExternalApplication.h"
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <limits.h>
 #include <pthread.h>
@@ -11,6 +10,7 @@
 #include <cerrno>
 #include <chrono>
 #include <cstring>
+#include <filesystem>
 #include <fstream>
 #include <set>
 
@@ -34,38 +34,26 @@ void StartShell(ExternalApplication& application, const std::wstring& script) {
     ASSERT_TRUE(application.Start(L"/bin/sh", {L"-c", script}));
 }
 
-struct ExitCase {
-    int32_t mode;
-    const char* script;
-    int32_t expectedResult;
-};
-
-void PrintTo(const ExitCase& c, std::ostream* out) {
-    *out << "mode " << c.mode << ": " << c.script;
-}
-
-class ExitResultTest : public ::testing::TestWithParam<ExitCase> {};
-
-TEST_P(ExitResultTest, WaitRecordsExitStatusOrMinusSignal) {
-    ExternalApplication application(static_cast<Mode>(GetParam().mode));
-    StartShell(application, WideFromNarrow(GetParam().script));
-    EXPECT_EQ(application.GetState(), State::Running);
-    EXPECT_TRUE(application.Wait());
-    EXPECT_EQ(application.GetState(), State::Finished);
-    EXPECT_EQ(application.ExitResult(), GetParam().expectedResult);
-}
-
-INSTANTIATE_TEST_SUITE_P(ModesAndResults, ExitResultTest,
-                         ::testing::Values(ExitCase{0, "exit 0", 0}, ExitCase{1, "exit 1", 1},
-                                           ExitCase{2, "exit 7", 7}, ExitCase{1, "kill -9 $$", -9},
-                                           ExitCase{2, "kill -9 $$", -9}));
-
-TEST(ExternalApplicationTest, ProgramThatCannotBeExecutedExitsWithOne) {
-    for (Mode mode : {Mode::Fork, Mode::Vfork}) {
-        ExternalApplication application(mode);
-        ASSERT_TRUE(application.Start(L"/nonexistent/program", {}));
+TEST(ExternalApplicationTest, WaitRecordsExitStatusOrMinusSignalInEveryMode) {
+    const struct {
+        Mode mode;
+        const wchar_t* script;  // null: a program that cannot be executed
+        int32_t result;
+    } cases[] = {{Mode::Default, L"exit 0", 0},    {Mode::Fork, L"exit 1", 1},
+                 {Mode::Vfork, L"exit 7", 7},      {Mode::Fork, L"kill -9 $$", -9},
+                 {Mode::Vfork, L"kill -9 $$", -9}, {Mode::Fork, nullptr, 1},
+                 {Mode::Vfork, nullptr, 1}};
+    for (const auto& c : cases) {
+        ExternalApplication application(c.mode);
+        if (c.script != nullptr) {
+            StartShell(application, c.script);
+        } else {
+            ASSERT_TRUE(application.Start(L"/nonexistent/program", {}));
+        }
+        EXPECT_EQ(application.GetState(), State::Running);
         EXPECT_TRUE(application.Wait());
-        EXPECT_EQ(application.ExitResult(), 1);
+        EXPECT_EQ(application.GetState(), State::Finished);
+        EXPECT_EQ(application.ExitResult(), c.result) << (c.script ? c.script : L"not executable");
     }
 }
 
@@ -214,14 +202,9 @@ std::string ProcText(pid_t pid, const char* file, const std::string& key = "") {
 
 std::set<int> OpenDescriptors(pid_t pid) {
     std::set<int> descriptors;
-    DIR* directory = opendir(("/proc/" + std::to_string(pid) + "/fd").c_str());
-    while (const dirent* entry = directory != nullptr ? readdir(directory) : nullptr) {
-        if (entry->d_name[0] != '.') {
-            descriptors.insert(std::atoi(entry->d_name));
-        }
-    }
-    if (directory != nullptr) {
-        closedir(directory);
+    for (const auto& entry :
+         std::filesystem::directory_iterator("/proc/" + std::to_string(pid) + "/fd")) {
+        descriptors.insert(std::stoi(entry.path().filename()));
     }
     return descriptors;
 }
