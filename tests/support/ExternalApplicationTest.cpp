@@ -1,7 +1,6 @@
 #include "support/ExternalApplication.h"
 
 #include <fcntl.h>
-#include <limits.h>
 #include <pthread.h>
 #include <signal.h>
 #include <sys/wait.h>
@@ -9,6 +8,7 @@
 
 #include <cerrno>
 #include <chrono>
+#include <csignal>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
@@ -19,6 +19,7 @@
 #include "common/TempSysroot.h"
 #include "support/Exceptions.h"
 #include "support/TextConversion.h"
+#include "trace/TraceTestSupport.h"
 
 namespace kest::test::support {
 
@@ -153,39 +154,6 @@ TEST(ExternalApplicationTest, ChildGetsArgumentsWorkingDirectoryAndForkHook) {
     EXPECT_FALSE(tree.Exists("/vforked")) << "the hook runs only after fork";
 }
 
-// The host's state that must not reach a started program: ignored and blocked signals, a
-// descriptor without close-on-exec, its environment. SIGCHLD is ignored as some hosts do, which
-// makes the system reap children at once.
-class HostStateTest : public ::testing::Test {
-  protected:
-    void SetUp() override {
-        struct sigaction ignore {};
-        ignore.sa_handler = SIG_IGN;
-        for (int signal : {SIGINT, SIGPIPE, SIGCHLD}) {
-            sigaction(signal, &ignore, &previous_[signal]);
-        }
-        sigset_t blocked;
-        sigemptyset(&blocked);
-        sigaddset(&blocked, SIGUSR1);
-        pthread_sigmask(SIG_BLOCK, &blocked, &previousMask_);
-        stray_ = open("/dev/null", O_RDONLY);
-        handedOver_ = open("/dev/null", O_RDONLY | O_CLOEXEC);
-    }
-    void TearDown() override {
-        for (int signal : {SIGINT, SIGPIPE, SIGCHLD}) {
-            sigaction(signal, &previous_[signal], nullptr);
-        }
-        pthread_sigmask(SIG_SETMASK, &previousMask_, nullptr);
-        close(stray_);
-        close(handedOver_);
-    }
-
-    struct sigaction previous_[NSIG] {};
-    sigset_t previousMask_{};
-    int stray_ = -1;
-    int handedOver_ = -1;
-};
-
 // The first line of /proc/<pid>/<file> that starts with `key`, or all of it without a key.
 std::string ProcText(pid_t pid, const char* file, const std::string& key = "") {
     std::ifstream in("/proc/" + std::to_string(pid) + "/" + file, std::ios::binary);
@@ -209,44 +177,58 @@ std::set<int> OpenDescriptors(pid_t pid) {
     return descriptors;
 }
 
-TEST_F(HostStateTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSigchld) {
-    for (Mode mode : {Mode::Fork, Mode::Vfork}) {
-        ExternalApplication application(mode);
-        application.SetInheritedDescriptors({handedOver_});
-        application.SetEnvironment({"PATH=/usr/bin:/bin", "A=b c"});
-        ASSERT_TRUE(application.Start(L"/bin/sleep", {L"30"}));
-        const pid_t pid = application.ProcessId();
-        char exe[PATH_MAX] = {};
-        for (int attempt = 0; attempt < 2000 && std::strstr(exe, "sleep") == nullptr; ++attempt) {
-            std::fill(std::begin(exe), std::end(exe), '\0');
-            static_cast<void>(
-                readlink(("/proc/" + std::to_string(pid) + "/exe").c_str(), exe, sizeof exe - 1));
-            usleep(5000);
+// The host's state must not reach a started program: ignored and blocked signals, a descriptor
+// without close-on-exec, its environment. SIGCHLD is ignored as some hosts do, which makes the
+// system reap children at once. The child process set up as such a host ends with the test.
+TEST(ExternalApplicationTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSigchld) {
+    kest::test::trace::RunInChild([] {
+        for (int signal : {SIGINT, SIGPIPE, SIGCHLD}) {
+            std::signal(signal, SIG_IGN);
         }
-        ASSERT_NE(std::strstr(exe, "sleep"), nullptr) << "the program never ran";
-        // Right after exec the dynamic loader briefly holds the libraries it maps open: wait
-        // until the program has settled; a descriptor that stays open still fails below.
-        const std::set<int> expected{0, 1, 2, handedOver_};
-        for (int attempt = 0; attempt < 400 && OpenDescriptors(pid) != expected; ++attempt) {
-            usleep(5000);
+        sigset_t blocked;
+        sigemptyset(&blocked);
+        sigaddset(&blocked, SIGUSR1);
+        pthread_sigmask(SIG_BLOCK, &blocked, nullptr);
+        const int stray = open("/dev/null", O_RDONLY);
+        const int handedOver = open("/dev/null", O_RDONLY | O_CLOEXEC);
+        for (Mode mode : {Mode::Fork, Mode::Vfork}) {
+            ExternalApplication application(mode);
+            application.SetInheritedDescriptors({handedOver});
+            application.SetEnvironment({"PATH=/usr/bin:/bin", "A=b c"});
+            ASSERT_TRUE(application.Start(L"/bin/sleep", {L"30"}));
+            const pid_t pid = application.ProcessId();
+            const std::set<int> expected{0, 1, 2, handedOver};
+            auto runs = [pid] {
+                std::error_code error;
+                const std::filesystem::path exe = "/proc/" + std::to_string(pid) + "/exe";
+                return std::filesystem::read_symlink(exe, error).string().find("sleep") !=
+                       std::string::npos;
+            };
+            // Right after exec the dynamic loader briefly holds the libraries it maps open: wait
+            // until the program has settled; a descriptor that stays open still fails below.
+            for (int attempt = 0; attempt < 2000 && (!runs() || OpenDescriptors(pid) != expected);
+                 ++attempt) {
+                usleep(5000);
+            }
+            ASSERT_TRUE(runs()) << "the program never ran";
+            EXPECT_EQ(OpenDescriptors(pid), expected);
+            EXPECT_EQ(ProcText(pid, "status", "SigIgn:"), "SigIgn:\t0000000000000000");
+            EXPECT_EQ(ProcText(pid, "status", "SigBlk:"), "SigBlk:\t0000000000000000");
+            EXPECT_EQ(getsid(pid), pid) << "own session";
+            EXPECT_EQ(ProcText(pid, "environ"), std::string("PATH=/usr/bin:/bin\0A=b c\0", 25));
+            EXPECT_EQ(fcntl(handedOver, F_GETFD), FD_CLOEXEC) << "cleared in the child only";
+            EXPECT_FALSE(application.Wait(0, true, true));
+            EXPECT_EQ(application.ExitResult(), -9);
         }
-        EXPECT_EQ(OpenDescriptors(pid), expected);
-        EXPECT_EQ(ProcText(pid, "status", "SigIgn:"), "SigIgn:\t0000000000000000");
-        EXPECT_EQ(ProcText(pid, "status", "SigBlk:"), "SigBlk:\t0000000000000000");
-        EXPECT_EQ(getsid(pid), pid) << "own session";
-        EXPECT_EQ(ProcText(pid, "environ"), std::string("PATH=/usr/bin:/bin\0A=b c\0", 25));
-        EXPECT_EQ(fcntl(handedOver_, F_GETFD), FD_CLOEXEC) << "cleared in the child only";
-        EXPECT_FALSE(application.Wait(0, true, true));
-        EXPECT_EQ(application.ExitResult(), -9);
-    }
-    ExternalApplication exiting;
-    StartShell(exiting, L"exit 5");
-    EXPECT_TRUE(exiting.Wait());
-    EXPECT_EQ(exiting.ExitResult(), 5);
+        ExternalApplication exiting;
+        StartShell(exiting, L"exit 5");
+        EXPECT_TRUE(exiting.Wait());
+        EXPECT_EQ(exiting.ExitResult(), 5);
 
-    ExternalApplication closedDescriptor;
-    closedDescriptor.SetInheritedDescriptors({stray_ + 100});
-    EXPECT_THROW(closedDescriptor.Start(L"/bin/true", {}), vq::dsc::osdep::PosixError);
+        ExternalApplication closedDescriptor;
+        closedDescriptor.SetInheritedDescriptors({stray + 100});
+        EXPECT_THROW(closedDescriptor.Start(L"/bin/true", {}), vq::dsc::osdep::PosixError);
+    });
 }
 
 }  // namespace
