@@ -69,13 +69,6 @@ TEST(StatusHolder, StoresSuccessAndThrowsFailureAsLong) {
     }
 }
 
-struct ThrowRow {
-    const char* name;
-    void (*thrower)();
-    HRESULT status;
-    Lines trace;
-};
-
 HRESULT ConvertThrown(void (*thrower)()) {
     try {
         thrower();
@@ -85,43 +78,36 @@ HRESULT ConvertThrown(void (*thrower)()) {
     return S_OK;
 }
 
-TEST_F(StatusConversion, CurrentExceptionMapsEachKindWithItsTrace) {
-    const Lines stdTrace = {"std::exception(-2147467259)"};
-    const ThrowRow rows[] = {
-        {"status", [] { throw static_cast<long>(UX_E_ITEM_NOT_FOUND); }, UX_E_ITEM_NOT_FOUND, {}},
-        {"bad_alloc", [] { throw std::bad_alloc(); }, E_OUTOFMEMORY, {}},
-        {"range", [] { throw std::out_of_range("x"); }, E_FAIL, {"out of range(-2147467259)"}},
-        {"runtime_error", [] { throw std::runtime_error("x"); }, E_FAIL, stdTrace},
-        {"dsc", [] { throw exception::NotImplemented(); }, E_FAIL, stdTrace},
-        {"dsc out of range", [] { throw exception::OutOfRange(); }, E_FAIL, stdTrace}};
-    for (const ThrowRow& row : rows) {
+// Each kind of exception as the current-exception conversion and the entry guard see it.
+TEST_F(StatusConversion, EveryKindOfExceptionWithItsTrace) {
+    const Lines standard = {"std::exception(-2147467259)"}, uncaught = {"Uncaught exception"};
+    const struct {
+        void (*thrower)();
+        HRESULT status;
+        Lines trace, guardTrace;
+    } rows[] = {
+        {[] { throw long{UX_E_VALUE_INVALID}; }, UX_E_VALUE_INVALID, {}, {"Failure(-2147220609)"}},
+        {[] { throw std::bad_alloc(); }, E_OUTOFMEMORY, {}, {"Error allocating memory"}},
+        {[] { throw std::out_of_range("x"); }, E_FAIL, {"out of range(-2147467259)"}, uncaught},
+        {[] { throw std::runtime_error("x"); }, E_FAIL, standard, uncaught},
+        {[] { throw exception::NotImplemented(); }, E_FAIL, standard, {"Uncaught dsc Exception"}},
+        {[] { throw exception::OutOfRange(); }, E_FAIL, standard, {"Uncaught dsc Exception"}}};
+    for (size_t i = 0; i < std::size(rows); ++i) {
         CaptureWithMask(kTraceErrors);
-        EXPECT_EQ(row.status, ConvertThrown(row.thrower)) << row.name;
-        EXPECT_EQ(row.trace, Texts()) << row.name;
+        EXPECT_EQ(rows[i].status, ConvertThrown(rows[i].thrower)) << i;
+        EXPECT_EQ(rows[i].trace, Texts()) << i;
+        CaptureWithMask(kTraceErrors);
+        const auto entry = [&rows, i]() -> HRESULT {
+            rows[i].thrower();
+            return S_OK;
+        };
+        EXPECT_EQ(rows[i].status, GuardEntryPoint("Failure", entry)) << i;
+        EXPECT_EQ(rows[i].guardTrace, Texts()) << i;
     }
     EXPECT_THROW(ConvertThrown([] { throw 42; }), int);
-}
-
-TEST_F(StatusConversion, EntryGuardConvertsEveryExceptionWithItsTrace) {
-    const ThrowRow rows[] = {
-        {"status",
-         [] { throw static_cast<long>(UX_E_VALUE_INVALID); },
-         UX_E_VALUE_INVALID,
-         {"Failure(-2147220609)"}},
-        {"bad_alloc", [] { throw std::bad_alloc(); }, E_OUTOFMEMORY, {"Error allocating memory"}},
-        {"dsc", [] { throw exception::NotImplemented(); }, E_FAIL, {"Uncaught dsc Exception"}},
-        {"standard", [] { throw std::out_of_range("x"); }, E_FAIL, {"Uncaught exception"}},
-        {"foreign", [] { throw 3; }, E_FAIL, {"Uncaught exception"}}};
-    for (const ThrowRow& row : rows) {
-        CaptureWithMask(kTraceErrors);
-        EXPECT_EQ(row.status, GuardEntryPoint("Failure",
-                                              [&row]() -> HRESULT {
-                                                  row.thrower();
-                                                  return S_OK;
-                                              }))
-            << row.name;
-        EXPECT_EQ(row.trace, Texts()) << row.name;
-    }
+    CaptureWithMask(kTraceErrors);
+    EXPECT_EQ(E_FAIL, GuardEntryPoint("Failure", []() -> HRESULT { throw 3; }));
+    EXPECT_EQ(uncaught, Texts());
     EXPECT_EQ(S_FALSE, GuardEntryPoint("x", [] { return S_FALSE; }));
     SetTraceGate(kTraceErrors, [](char, const char*, bool) { throw std::runtime_error("disk"); });
     EXPECT_EQ(E_FAIL, GuardEntryPoint("x", []() -> HRESULT { throw static_cast<long>(E_FAIL); }));
