@@ -22,15 +22,7 @@ constexpr IID IID_ITestDerived = TestIid(2);
 constexpr IID IID_ITestSecondary = TestIid(3);
 constexpr IID IID_ITestUnanswered = TestIid(4);
 
-class ITestBase : public IUnknown {
-  public:
-    virtual int Base() = 0;
-
-  protected:
-    ~ITestBase() = default;
-};
-
-class ITestDerived : public ITestBase {
+class ITestDerived : public IUnknown {
   public:
     virtual int Derived() = 0;
 
@@ -46,7 +38,7 @@ class ITestSecondary : public IUnknown {
     ~ITestSecondary() = default;
 };
 
-// A primary chain of two interfaces plus a secondary one; counts its destructions.
+// A primary interface answering two identifiers plus a secondary one; counts its destructions.
 class TestComponent : public ITestDerived,
                       public ITestSecondary,
                       public virtual CVQComObjectRootEx<CVQComMultiThreadModelNoCS> {
@@ -69,7 +61,6 @@ class TestComponent : public ITestDerived,
         ++*destructions_;
     }
 
-    int Base() override { return 1; }
     int Derived() override { return 2; }
     int Secondary() override { return 3; }
 

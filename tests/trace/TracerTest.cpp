@@ -128,22 +128,36 @@ TEST(TracerTest, ShortSpaceAtTheFirstLineCreatesNoFileButStandardErrorGoesOn) {
     });
 }
 
-TEST(TracerTest, ThresholdZeroNeverMeasuresAndTheAbortMessageEndsTheFile) {
+// Later initialisations change outputs and threshold but not the path; with threshold 0 nothing
+// is measured, and once space is short the abort message ends the file.
+TEST(TracerTest, LaterInitialisationsKeepThePathAndTheAbortMessageEndsTheFile) {
     WithFreshTracer([](TracerFixture& fixture) {
         kest::trace::SetFreeSpaceMeasure(&FakeMeasure);
-        fixture.Start(kFileAndErrors);
+        fixture.Sysroot().MakeDirectory("/other");
+        const std::wstring other = Wide(fixture.Sysroot().PathOf("/other"));
+        fixture.Start(kTraceToLogFile);
+        TraceLine(' ', "first", false);
+        InitializeTracing(kTraceErrors, kTraceToStandardError, other, 0);
+        TraceLine(' ', "second", false);
+        InitializeTracing(kTraceErrors, kTraceToLogFile, other, 0);
+        TraceLine(' ', "third", false);
+        ShutdownTracing();
+        TraceLine(' ', "after shutdown", false);
+        InitializeTracing(kTraceErrors, kFileAndErrors, other, 0);
         TraceLine(' ', "unmeasured", false);
         EXPECT_EQ(measurements, 0);
         reportedFreeBytes = 4096;
-        fixture.Start(kFileAndErrors, 4096);
+        InitializeTracing(kTraceErrors, kFileAndErrors, other, 4096);
         TraceLine(' ', "enough", false);
         reportedFreeBytes = 4095;
         TraceLine(' ', "short", false);
         reportedFreeBytes = 1u << 30;
         TraceLine(' ', "later", false);
         const std::string abort = kest::trace::kAbortMessage;
-        EXPECT_EQ(fixture.LogText(), "  unmeasured\n  enough\n" + abort + "\n");
-        EXPECT_EQ(fixture.ErrorText(), "  unmeasured\n  enough\n" + abort + "\n  later\n");
+        EXPECT_EQ(fixture.LogText(), "  first\n  third\n  unmeasured\n  enough\n" + abort + "\n");
+        EXPECT_TRUE(EntriesOf(fixture.Sysroot().PathOf("/other")).empty());
+        EXPECT_EQ(fixture.ErrorText(),
+                  "  second\n  unmeasured\n  enough\n" + abort + "\n  later\n");
     });
 }
 
@@ -184,26 +198,6 @@ TEST(TracerTest, OneSeparatorBetweenDirectoryAndFileName) {
                 << suffix;
         });
     }
-}
-
-TEST(TracerTest, LaterInitialisationsChangeOutputsButNotThePath) {
-    WithFreshTracer([](TracerFixture& fixture) {
-        fixture.Sysroot().MakeDirectory("/other");
-        const std::wstring other = Wide(fixture.Sysroot().PathOf("/other"));
-        fixture.Start(kTraceToLogFile);
-        TraceLine(' ', "first", false);
-        InitializeTracing(kTraceErrors, kTraceToStandardError, other, 0);
-        TraceLine(' ', "second", false);
-        InitializeTracing(kTraceErrors, kTraceToLogFile, other, 0);
-        TraceLine(' ', "third", false);
-        ShutdownTracing();
-        TraceLine(' ', "after shutdown", false);
-        InitializeTracing(kTraceErrors, kTraceToLogFile, other, 0);
-        TraceLine(' ', "fourth", false);
-        EXPECT_EQ(fixture.LogText(), "  first\n  third\n  fourth\n");
-        EXPECT_TRUE(EntriesOf(fixture.Sysroot().PathOf("/other")).empty());
-        EXPECT_EQ(fixture.ErrorText(), "  second\n");
-    });
 }
 
 TEST(TracerTest, OverlongPathTurnsFileOutputOffAndOtherOutputsGoOn) {
