@@ -2,7 +2,6 @@
 // long as the process), capturing a standard stream, and listing files.
 #pragma once
 
-#include <dirent.h>
 #include <fcntl.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -10,6 +9,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <functional>
 #include <sstream>
@@ -21,14 +21,12 @@ namespace kest::test::trace {
 // Runs `body` in a forked child so that it starts with a fresh tracer; failures are reported by
 // the child and make the test fail here.
 inline void RunInChild(const std::function<void()>& body) {
-    std::fflush(stdout);
-    std::fflush(stderr);
+    std::fflush(nullptr);
     pid_t child = fork();
     ASSERT_GE(child, 0);
     if (child == 0) {
         body();
-        std::fflush(stdout);
-        std::fflush(stderr);
+        std::fflush(nullptr);
         _exit(::testing::Test::HasFailure() ? 1 : 0);
     }
     int status = 0;
@@ -42,13 +40,13 @@ class StreamCapture {
   public:
     StreamCapture(int descriptor, const std::string& file)
         : descriptor_(descriptor), file_(file), saved_(dup(descriptor)) {
-        Flush();
+        std::fflush(nullptr);
         int target = open(file.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
         dup2(target, descriptor);
         close(target);
     }
     ~StreamCapture() {
-        Flush();
+        std::fflush(nullptr);
         dup2(saved_, descriptor_);
         close(saved_);
         if (::testing::Test::HasFailure()) {  // failure reports may be among the captured text
@@ -60,7 +58,7 @@ class StreamCapture {
     StreamCapture& operator=(const StreamCapture&) = delete;
 
     std::string Text() const {
-        Flush();
+        std::fflush(nullptr);
         std::ifstream in(file_, std::ios::binary);
         std::ostringstream content;
         content << in.rdbuf();
@@ -68,27 +66,17 @@ class StreamCapture {
     }
 
   private:
-    static void Flush() {
-        std::fflush(stdout);
-        std::fflush(stderr);
-    }
-
     int descriptor_;
     std::string file_;
     int saved_;
 };
 
-// Names of the entries of `directory` (without "." and ".."), unsorted.
+// Names of the entries of `directory` (without "." and ".."), unsorted; none when it is missing.
 inline std::vector<std::string> EntriesOf(const std::string& directory) {
     std::vector<std::string> names;
-    if (DIR* listing = opendir(directory.c_str())) {
-        while (dirent* entry = readdir(listing)) {
-            std::string name = entry->d_name;
-            if (name != "." && name != "..") {
-                names.push_back(name);
-            }
-        }
-        closedir(listing);
+    std::error_code error;
+    for (const auto& entry : std::filesystem::directory_iterator(directory, error)) {
+        names.push_back(entry.path().filename());
     }
     return names;
 }
