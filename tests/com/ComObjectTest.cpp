@@ -163,7 +163,7 @@ class CountedThing {
     int* destroyed_;
 };
 
-TEST(CountedPtrTest, AdoptingKeepsTheCountSharingAddsOne) {
+TEST(CountedPtrTest, AdoptingKeepsTheCountSharingAddsOneDetachHandsItOn) {
     int destroyed = 0;
     auto* thing = new CountedThing(&destroyed);
     {
@@ -184,10 +184,8 @@ TEST(CountedPtrTest, AdoptingKeepsTheCountSharingAddsOne) {
         EXPECT_EQ(0, destroyed);
     }
     EXPECT_EQ(1, destroyed);
-}
 
-TEST(CountedPtrTest, DetachHandsTheReferenceOnAndReceiveDropsTheOldOne) {
-    int destroyed = 0;
+    // Detach hands the reference on; Receive drops the old one.
     CountedPtr<CountedThing> first(new CountedThing(&destroyed), kAdoptReference);
     CountedThing* raw = first.Detach();
     EXPECT_EQ(nullptr, first.Get());
@@ -195,12 +193,12 @@ TEST(CountedPtrTest, DetachHandsTheReferenceOnAndReceiveDropsTheOldOne) {
 
     CountedPtr<CountedThing> holder(raw, kAdoptReference);
     CountedThing** slot = holder.Receive();
-    EXPECT_EQ(1, destroyed);
+    EXPECT_EQ(2, destroyed);
     EXPECT_EQ(nullptr, *slot);
     *slot = new CountedThing(&destroyed);
     EXPECT_TRUE(holder);
     holder = nullptr;
-    EXPECT_EQ(2, destroyed);
+    EXPECT_EQ(3, destroyed);
 }
 
 }  // namespace

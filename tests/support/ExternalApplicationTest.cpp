@@ -8,8 +8,6 @@
 
 #include <cerrno>
 #include <chrono>
-#include <csignal>
-#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <set>
@@ -174,8 +172,8 @@ std::set<int> OpenDescriptors(pid_t pid) {
 // system reap children at once. The child process set up as such a host ends with the test.
 TEST(ExternalApplicationTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSigchld) {
     kest::test::trace::RunInChild([] {
-        for (int signal : {SIGINT, SIGPIPE, SIGCHLD}) {
-            std::signal(signal, SIG_IGN);
+        for (int ignored : {SIGINT, SIGPIPE, SIGCHLD}) {
+            signal(ignored, SIG_IGN);
         }
         sigset_t blocked;
         sigemptyset(&blocked);

@@ -89,24 +89,20 @@ TEST(Guid, TimeBasedNeverRepeatAndCarryVersionVariantAndTheFirstAdapterAsNode) {
 // identifiers. Three equal sequences of 14 random bits come up once in 2^28 runs.
 TEST(Guid, ProcessesStartDifferentClockSequences) {
     std::set<uint16_t> sequences = {ClockSequenceOf(Guid::CreateTimeBased())};
+    int channel[2];
+    ASSERT_EQ(0, pipe(channel));
     for (int i = 0; i < 2; ++i) {
-        int channel[2];
-        ASSERT_EQ(0, pipe(channel));
-        const pid_t child = fork();
-        ASSERT_GE(child, 0);
-        if (child == 0) {
+        if (fork() == 0) {
             const uint16_t sequence = ClockSequenceOf(Guid::CreateTimeBased());
             _exit(write(channel[1], &sequence, sizeof sequence) == sizeof sequence ? 0 : 1);
         }
-        close(channel[1]);
-        uint16_t sequence = 0;
-        EXPECT_EQ(static_cast<ssize_t>(sizeof sequence),
-                  read(channel[0], &sequence, sizeof sequence));
-        close(channel[0]);
-        int status = 0;
-        waitpid(child, &status, 0);
-        sequences.insert(sequence);
     }
+    close(channel[1]);
+    for (uint16_t sequence = 0; read(channel[0], &sequence, sizeof sequence) == sizeof sequence;) {
+        sequences.insert(sequence);
+        wait(nullptr);
+    }
+    close(channel[0]);
     EXPECT_GT(sequences.size(), 1u);
 }
 
