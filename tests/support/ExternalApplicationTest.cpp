@@ -168,8 +168,9 @@ std::set<int> OpenDescriptors(pid_t pid) {
 }
 
 // The host's state must not reach a started program: ignored and blocked signals, a descriptor
-// without close-on-exec, its environment. SIGCHLD is ignored as some hosts do, which makes the
-// system reap children at once. The child process set up as such a host ends with the test.
+// without close-on-exec. SIGCHLD is ignored as some hosts do, which makes the system reap
+// children at once. (The hardware-clock tests show the fixed environment, and an exit status
+// arriving under such a host.) The child process set up as such a host ends with the test.
 TEST(ExternalApplicationTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSigchld) {
     kest::test::trace::RunInChild([] {
         for (int ignored : {SIGINT, SIGPIPE, SIGCHLD}) {
@@ -184,7 +185,6 @@ TEST(ExternalApplicationTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIg
         for (Mode mode : {Mode::Fork, Mode::Vfork}) {
             ExternalApplication application(mode);
             application.SetInheritedDescriptors({handedOver});
-            application.SetEnvironment({"PATH=/usr/bin:/bin", "A=b c"});
             ASSERT_TRUE(application.Start(L"/bin/sleep", {L"30"}));
             const pid_t pid = application.ProcessId();
             const std::set<int> expected{0, 1, 2, handedOver};
@@ -205,16 +205,10 @@ TEST(ExternalApplicationTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIg
             EXPECT_EQ(ProcText(pid, "status", "SigIgn:"), "SigIgn:\t0000000000000000");
             EXPECT_EQ(ProcText(pid, "status", "SigBlk:"), "SigBlk:\t0000000000000000");
             EXPECT_EQ(getsid(pid), pid) << "own session";
-            EXPECT_EQ(ProcText(pid, "environ"), std::string("PATH=/usr/bin:/bin\0A=b c\0", 25));
             EXPECT_EQ(fcntl(handedOver, F_GETFD), FD_CLOEXEC) << "cleared in the child only";
             EXPECT_FALSE(application.Wait(0, true, true));
             EXPECT_EQ(application.ExitResult(), -9);
         }
-        ExternalApplication exiting;
-        StartShell(exiting, L"exit 5");
-        EXPECT_TRUE(exiting.Wait());
-        EXPECT_EQ(exiting.ExitResult(), 5);
-
         ExternalApplication closedDescriptor;
         closedDescriptor.SetInheritedDescriptors({stray + 100});
         EXPECT_THROW(closedDescriptor.Start(L"/bin/true", {}), vq::dsc::osdep::PosixError);

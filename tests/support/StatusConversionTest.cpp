@@ -12,7 +12,6 @@
 #include "support/CurrentExceptionToStatus.h"
 #include "support/EntryGuard.h"
 #include "support/Exceptions.h"
-#include "support/StatusHolder.h"
 #include "support/TraceGate.h"
 
 namespace kest::test::support {
@@ -55,18 +54,6 @@ TEST_F(StatusConversion, LibraryCodesMapAndOthersAreTracedAsFail) {
     CaptureWithMask(0xFF & ~kTraceErrors);
     EXPECT_EQ(E_FAIL, ConvertStatusCode(7));
     EXPECT_TRUE(Texts().empty());
-}
-
-TEST(StatusHolder, StoresSuccessAndThrowsFailureAsLong) {
-    StatusHolder holder;
-    holder = S_FALSE;
-    EXPECT_EQ(S_FALSE, holder.Get());
-    try {
-        holder = UX_E_PROPERTY_NOT_FOUND;
-        FAIL() << "a negative status must be thrown";
-    } catch (long status) {
-        EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND, status);
-    }
 }
 
 HRESULT ConvertThrown(void (*thrower)()) {
