@@ -1,4 +1,3 @@
-#include <dirent.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -14,6 +13,7 @@
 
 #include "support/Guid.h"
 #include "support/HostInfo.h"
+#include "trace/TraceTestSupport.h"
 
 namespace kest::test::support {
 
@@ -60,16 +60,13 @@ TEST(Guid, TimeBasedNeverRepeatAndCarryVersionVariantAndTheFirstAdapterAsNode) {
     // The node is the first adapter's address, one of the machine's non-zero six-byte adapter
     // addresses as the kernel lists them; only a machine without any gets a random node.
     std::set<std::string> addresses;
-    DIR* adapters = opendir("/sys/class/net");
-    ASSERT_NE(nullptr, adapters);
-    while (const dirent* entry = readdir(adapters)) {
+    for (const std::string& adapter : kest::test::trace::EntriesOf("/sys/class/net")) {
         std::string address;
-        std::ifstream(std::string("/sys/class/net/") + entry->d_name + "/address") >> address;
+        std::ifstream("/sys/class/net/" + adapter + "/address") >> address;
         if (address.size() == 17 && address != "00:00:00:00:00:00") {
             addresses.insert(address);
         }
     }
-    closedir(adapters);
     const std::string first = vq::dsc::osdep::FirstAdapterHardwareAddress();
     const uint8_t* node = &made[0].Data4[2];
     char text[18];
