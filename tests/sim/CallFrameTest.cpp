@@ -11,7 +11,7 @@
 #include <functional>
 
 #include "SimFixture.h"
-#include "trace/TraceTestSupport.h"
+#include "common/ChildProcess.h"
 
 namespace kest::test::sim {
 namespace {
@@ -138,7 +138,7 @@ TEST_F(SimTest, WithoutSysrootEveryCallFailsWithOneLineOnStandardError) {
             setenv("KEST_SYSROOT", value, 1);
         }
         for (const NamedCall& entry : calls.List()) {
-            const kest::test::trace::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
+            const kest::test::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
             EXPECT_EQ(entry.call(), -375501) << entry.name;
             const std::string text = capture.Text();
             EXPECT_EQ(std::count(text.begin(), text.end(), '\n'), 1) << entry.name << text;

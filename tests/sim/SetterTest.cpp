@@ -3,7 +3,7 @@
 #include <set>
 
 #include "SimFixture.h"
-#include "trace/TraceTestSupport.h"
+#include "common/ChildProcess.h"
 
 namespace kest::test::sim {
 namespace {
@@ -124,7 +124,7 @@ TEST(SimSetters, StateFileAndCallLog) {
 
         // The file is replaced by rename: no temporary file stays behind.
         const std::vector<std::string> entries =
-            kest::test::trace::EntriesOf(sim.sysroot_.PathOf("/var/lib/vqtargetcfg"));
+            kest::test::EntriesOf(sim.sysroot_.PathOf("/var/lib/vqtargetcfg"));
         EXPECT_EQ(std::set<std::string>(entries.begin(), entries.end()),
                   (std::set<std::string>{"state.ini", "state.lock", "calls.log"}));
     }

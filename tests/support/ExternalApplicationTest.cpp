@@ -14,10 +14,10 @@
 
 #include <gtest/gtest.h>
 
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "support/Exceptions.h"
 #include "support/TextConversion.h"
-#include "trace/TraceTestSupport.h"
 
 namespace kest::test::support {
 
@@ -124,7 +124,7 @@ class RedirectingApplication : public ExternalApplication {
 
 TEST(ExternalApplicationTest,
      CommandLineSplitsAtWhitespaceRunsChildGetsWorkingDirectoryAndForkHook) {
-    kest::test::TempSysroot tree;
+    TempSysroot tree;
     tree.WriteScript("/bin/args", "printf '%s|' \"$0\" \"$@\" \"$(pwd)\"\n");
     RedirectingApplication forked(Mode::Fork, tree.PathOf("/forked"));
     forked.SetWorkingDirectory(WideFromNarrow(tree.PathOf("/bin")));
@@ -158,7 +158,7 @@ std::set<int> OpenDescriptors(pid_t pid) {
 // children at once. (The hardware-clock tests show the fixed environment, and an exit status
 // arriving under such a host.) The child process set up as such a host ends with the test.
 TEST(ExternalApplicationTest, ProgramStartsCleanAndItsStatusArrivesWhenTheHostIgnoresSigchld) {
-    kest::test::trace::RunInChild([] {
+    RunInChild([] {
         for (int ignored : {SIGINT, SIGPIPE, SIGCHLD}) {
             signal(ignored, SIG_IGN);
         }

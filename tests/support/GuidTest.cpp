@@ -11,9 +11,9 @@
 #include <string>
 #include <vector>
 
+#include "common/ChildProcess.h"
 #include "support/Guid.h"
 #include "support/HostInfo.h"
-#include "trace/TraceTestSupport.h"
 
 namespace kest::test::support {
 
@@ -60,7 +60,7 @@ TEST(Guid, TimeBasedNeverRepeatAndCarryVersionVariantAndTheFirstAdapterAsNode) {
     // The node is the first adapter's address, one of the machine's non-zero six-byte adapter
     // addresses as the kernel lists them; only a machine without any gets a random node.
     std::set<std::string> addresses;
-    for (const std::string& adapter : kest::test::trace::EntriesOf("/sys/class/net")) {
+    for (const std::string& adapter : EntriesOf("/sys/class/net")) {
         std::string address;
         std::ifstream("/sys/class/net/" + adapter + "/address") >> address;
         if (address.size() == 17 && address != "00:00:00:00:00:00") {

@@ -9,13 +9,13 @@
 
 #include <gtest/gtest.h>
 
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "support/Exceptions.h"
 #include "support/ProcessControl.h"
 #include "support/Sysroot.h"
 #include "support/SystemClock.h"
 #include "support/TextConversion.h"
-#include "trace/TraceTestSupport.h"
 
 namespace kest::test::support {
 
@@ -24,9 +24,6 @@ namespace {
 using namespace vq::dsc::osdep;
 using vq::dsc::WideFromNarrow;
 namespace exception = vq::dsc::exception;
-using kest::test::TempSysroot;
-using kest::test::trace::EntriesOf;
-using kest::test::trace::RunInChild;
 
 // A scratch tree with one directory "/dir" and one regular file "/file".
 class PathHelpersTest : public ::testing::Test {

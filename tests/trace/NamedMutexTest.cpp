@@ -8,14 +8,13 @@
 #include <functional>
 #include <string>
 
-#include "TraceTestSupport.h"
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "support/Exceptions.h"
 #include "trace/NamedMutex.h"
 
 namespace kest::test::trace {
 
-using kest::test::TempSysroot;
 using vq::dsc::NamedMutex;
 using vq::dsc::ScopedNamedLock;
 

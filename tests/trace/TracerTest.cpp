@@ -9,7 +9,7 @@
 
 #include <gmock/gmock.h>
 
-#include "TraceTestSupport.h"
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "support/PathHelpers.h"
 #include "support/TraceGate.h"
@@ -20,7 +20,6 @@
 
 namespace kest::test::trace {
 
-using kest::test::TempSysroot;
 using ::testing::ElementsAre;
 
 namespace {

@@ -1,5 +1,6 @@
-// Helpers for tracer tests: running a test body in a child process (the tracer's state lives as
-// long as the process), capturing a standard stream, and listing files.
+// Helpers for tests that need a process of their own (process-wide state such as the tracer's,
+// the environment, signal dispositions or a dropped privilege): running a body in a forked
+// child, capturing a standard stream, and listing what a directory holds.
 #pragma once
 
 #include <fcntl.h>
@@ -16,10 +17,10 @@
 #include <string>
 #include <vector>
 
-namespace kest::test::trace {
+namespace kest::test {
 
-// Runs `body` in a forked child so that it starts with a fresh tracer; failures are reported by
-// the child and make the test fail here.
+// Runs `body` in a forked child, whose changes to process-wide state end with it; failures are
+// reported by the child and make the test fail here.
 inline void RunInChild(const std::function<void()>& body) {
     std::fflush(nullptr);
     pid_t child = fork();
@@ -91,4 +92,4 @@ inline std::vector<std::string> LinesOf(const std::string& text) {
     return lines;
 }
 
-}  // namespace kest::test::trace
+}  // namespace kest::test
