@@ -17,17 +17,17 @@ namespace {
 constexpr IID TestIid(uint8_t last) {
     return {0x11111111, 0x2222, 0x3333, {0x44, 0x44, 0x55, 0x55, 0x55, 0x55, 0x55, last}};
 }
-constexpr IID IID_ITestBase = TestIid(1);
-constexpr IID IID_ITestDerived = TestIid(2);
+constexpr IID IID_ITestPrimaryAlias = TestIid(1);
+constexpr IID IID_ITestPrimary = TestIid(2);
 constexpr IID IID_ITestSecondary = TestIid(3);
 constexpr IID IID_ITestUnanswered = TestIid(4);
 
-class ITestDerived : public IUnknown {
+class ITestPrimary : public IUnknown {
   public:
-    virtual int Derived() = 0;
+    virtual int Primary() = 0;
 
   protected:
-    ~ITestDerived() = default;
+    ~ITestPrimary() = default;
 };
 
 class ITestSecondary : public IUnknown {
@@ -39,12 +39,12 @@ class ITestSecondary : public IUnknown {
 };
 
 // A primary interface answering two identifiers plus a secondary one; counts its destructions.
-class TestComponent : public ITestDerived,
+class TestComponent : public ITestPrimary,
                       public ITestSecondary,
                       public virtual CVQComObjectRootEx<CVQComMultiThreadModelNoCS> {
   public:
-    using InterfaceMap = ComInterfaceMap<ComInterface<&IID_ITestBase, ITestDerived>,
-                                         ComInterface<&IID_ITestDerived, ITestDerived>,
+    using InterfaceMap = ComInterfaceMap<ComInterface<&IID_ITestPrimaryAlias, ITestPrimary>,
+                                         ComInterface<&IID_ITestPrimary, ITestPrimary>,
                                          ComInterface<&IID_ITestSecondary, ITestSecondary>>;
 
     explicit TestComponent(std::atomic<int>* destructions, bool failConstruction = false)
@@ -61,7 +61,7 @@ class TestComponent : public ITestDerived,
         ++*destructions_;
     }
 
-    int Derived() override { return 2; }
+    int Primary() override { return 2; }
     int Secondary() override { return 3; }
 
     // The count seen by the last destructor after taking one more reference (2 when sound).
@@ -73,21 +73,12 @@ class TestComponent : public ITestDerived,
 
 using TestObject = CVQComObject<TestComponent>;
 
-class ComObjectTest : public ::testing::Test {
-  protected:
-    // A new object holding one reference, as its primary interface.
-    ITestDerived* Create() {
-        TestObject* object = nullptr;
-        EXPECT_EQ(S_OK, CreateComObjectInstance<TestComponent>(&object, &destructions));
-        EXPECT_EQ(1u, object->AddRef());
-        return object;
-    }
-
+TEST(ComObjectTest, EveryMappedInterfaceSharesOneIdentityAndOneCount) {
     std::atomic<int> destructions{0};
-};
-
-TEST_F(ComObjectTest, EveryMappedInterfaceSharesOneIdentityAndOneCount) {
-    ITestDerived* primary = Create();
+    TestObject* object = nullptr;
+    ASSERT_EQ(S_OK, CreateComObjectInstance<TestComponent>(&object, &destructions));
+    EXPECT_EQ(1u, object->AddRef());
+    ITestPrimary* primary = object;
     void* unknown = nullptr;
     ASSERT_EQ(S_OK, primary->QueryInterface(IID_IUnknown, &unknown));
     EXPECT_EQ(static_cast<void*>(primary), unknown);
@@ -98,31 +89,32 @@ TEST_F(ComObjectTest, EveryMappedInterfaceSharesOneIdentityAndOneCount) {
     EXPECT_EQ(3, second->Secondary());
     EXPECT_NE(static_cast<void*>(primary), secondary);
 
-    for (const IID* iid : {&IID_ITestBase, &IID_ITestDerived, &IID_IUnknown}) {
+    for (const IID* iid : {&IID_ITestPrimaryAlias, &IID_ITestPrimary, &IID_IUnknown}) {
         void* back = nullptr;
         ASSERT_EQ(S_OK, second->QueryInterface(*iid, &back));
         EXPECT_EQ(static_cast<void*>(primary), back);
-        EXPECT_EQ(2, static_cast<ITestDerived*>(back)->Derived());
-        static_cast<ITestDerived*>(back)->Release();
+        EXPECT_EQ(2, static_cast<ITestPrimary*>(back)->Primary());
+        static_cast<ITestPrimary*>(back)->Release();
     }
     void* result = &result;
     EXPECT_EQ(E_NOINTERFACE, second->QueryInterface(IID_ITestUnanswered, &result));
     EXPECT_EQ(nullptr, result);
-    EXPECT_EQ(E_POINTER, primary->QueryInterface(IID_ITestBase, nullptr));
+    EXPECT_EQ(E_POINTER, primary->QueryInterface(IID_ITestPrimaryAlias, nullptr));
     // Three references: the creator's, the IUnknown one and the secondary one.
     EXPECT_EQ(4u, second->AddRef());
     EXPECT_EQ(3u, primary->Release());
     EXPECT_EQ(2u, second->Release());
-    EXPECT_EQ(1u, static_cast<ITestDerived*>(unknown)->Release());
+    EXPECT_EQ(1u, static_cast<ITestPrimary*>(unknown)->Release());
     EXPECT_EQ(0, destructions.load());
     EXPECT_EQ(0u, primary->Release());
     EXPECT_EQ(1, destructions.load());
     EXPECT_EQ(2, TestComponent::countDuringDestruction.load());
 }
 
-TEST_F(ComObjectTest, CountedCreationHoldsTheOnlyReferenceAndFailsWithOutOfMemory) {
+TEST(ComObjectTest, CountedCreationHoldsTheOnlyReferenceAndFailsWithOutOfMemory) {
+    std::atomic<int> destructions{0};
     {
-        CountedPtr<ITestDerived> primary = CreateCountedComObject<TestComponent>(&destructions);
+        CountedPtr<ITestPrimary> primary = CreateCountedComObject<TestComponent>(&destructions);
         CountedPtr<ITestSecondary> second =
             QueryCounted<ITestSecondary>(primary, IID_ITestSecondary);
         ASSERT_TRUE(second);
