@@ -1,7 +1,7 @@
-// Address texts: IPAddress parsing of narrow and wide text, the display text of every parsed
-// address parsing back to the same address, and the IPv4 text checks of the network items
-// (which must be monotonic in their permissions, agree with plain dotted decimal, and accept only
-// texts that are stored as the address they were checked as).
+// Address texts: IPAddress parsing of narrow and wide text (never of a text with a zero character
+// in it), the display text of every parsed address parsing back to the same address, and the IPv4
+// text checks of the network items (which must be monotonic in their permissions, agree with plain
+// dotted decimal, and accept only texts that are stored as the address they were checked as).
 //
 // Input: byte 0 selects the permissions of the IPv4 check (bits 0-2) and whether the rest is
 // read as 32-bit wide characters (bit 3) instead of one character per byte.
@@ -106,6 +106,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 
     IPAddress fromWide;
     if (fromWide.TryParse(wide)) {
+        FUZZ_CHECK(wide.find(L'\0') == std::wstring::npos);
         CheckAddressRoundTrip(fromWide);
     } else {
         FUZZ_CHECK(fromWide.IsUnset());

@@ -7,8 +7,7 @@
 #include <map>
 
 #include "SimFixture.h"
-#include "common/ChildProcesses.h"
-#include "trace/TraceTestSupport.h"
+#include "common/ChildProcess.h"
 
 namespace kest::test::sim {
 namespace {
@@ -52,7 +51,7 @@ TEST_F(SimTest, WithoutSysrootEveryCallFailsWithOneLineOnStandardError) {
             setenv("KEST_SYSROOT", value, 1);
         }
         for (const CallRow& row : CallRows()) {
-            const kest::test::trace::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
+            const kest::test::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
             Outputs outputs;
             EXPECT_EQ(row.call(outputs), -375501) << row.logLine;
             EXPECT_EQ(outputs.Changed(), "");
@@ -67,7 +66,7 @@ TEST_F(SimTest, WithoutSysrootEveryCallFailsWithOneLineOnStandardError) {
 TEST_F(SimTest, AFailedCallLogWriteIsReportedAndKeepsTheStatus) {
     sysroot_.MakeDirectory(kCallLogPath);
     WriteState(kState);
-    const kest::test::trace::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
+    const kest::test::StreamCapture capture(2, sysroot_.PathOf("/stderr"));
     Outputs outputs;
     EXPECT_EQ(tc::system::GetHostName(outputs.text), 0);
     EXPECT_EQ(outputs.Changed(), "text=kest-1");

@@ -6,7 +6,7 @@
 #include <set>
 
 #include "SimFixture.h"
-#include "trace/TraceTestSupport.h"
+#include "common/ChildProcess.h"
 
 namespace kest::test::sim {
 namespace {
@@ -33,7 +33,7 @@ TEST_F(SimTest, EachCallGivesItsStatusOutputsStateAndLogLine) {
         EXPECT_EQ(log.back(), row.logLine);
         // The file is replaced by rename: no temporary file stays behind.
         const std::vector<std::string> entries =
-            kest::test::trace::EntriesOf(sysroot_.PathOf("/var/lib/vqtargetcfg"));
+            kest::test::EntriesOf(sysroot_.PathOf("/var/lib/vqtargetcfg"));
         EXPECT_EQ(std::set<std::string>(entries.begin(), entries.end()),
                   (std::set<std::string>{"state.ini", "state.lock", "calls.log"}));
     }

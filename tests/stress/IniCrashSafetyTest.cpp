@@ -11,7 +11,7 @@
 #include <string>
 #include <thread>
 
-#include "common/ChildProcesses.h"
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "config/IniText.h"
 #include "config/IniTextPtr.h"

@@ -10,7 +10,7 @@
 #include <thread>
 #include <vector>
 
-#include "common/ChildProcesses.h"
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "config/IniFileManager.h"
 #include "config/IniText.h"

@@ -1,18 +1,20 @@
 #include "support/PathHelpers.h"
 
-#include <signal.h>
 #include <sys/stat.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cerrno>
+#include <ctime>
 #include <fstream>
 
 #include <gtest/gtest.h>
 
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "support/Exceptions.h"
 #include "support/ProcessControl.h"
+#include "support/Sysroot.h"
+#include "support/SystemClock.h"
 #include "support/TextConversion.h"
 
 namespace kest::test::support {
@@ -47,7 +49,7 @@ class PathHelpersTest : public ::testing::Test {
         return 0;
     }
 
-    kest::test::TempSysroot tree_;
+    TempSysroot tree_;
 };
 
 TEST_F(PathHelpersTest, PathTests) {
@@ -125,37 +127,19 @@ TEST_F(PathHelpersTest, CreateDirectoriesFailures) {
     chmod(tree_.Root().c_str(), 0755);
     chmod(At("/dir").c_str(), 0755);
     const std::string target = At("/dir/denied");
-    const pid_t child = fork();
-    ASSERT_GE(child, 0);
-    if (child == 0) {
-        if (setgid(65534) != 0 || setuid(65534) != 0) {
-            _exit(2);
-        }
+    RunInChild([&target] {
+        ASSERT_TRUE(setgid(65534) == 0 && setuid(65534) == 0);
         try {
             CreateDirectories(target);
+            ADD_FAILURE() << "created as nobody";
         } catch (const exception::AccessDenied& error) {
-            _exit(std::string(error.what()) == "Access denied: " + target ? 0 : 3);
-        } catch (...) {
-            _exit(4);
+            EXPECT_EQ(std::string(error.what()), "Access denied: " + target);
         }
-        _exit(5);
-    }
-    int status = 0;
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+    });
 }
 
-TEST(KillProcessTest, KillsRunningProcessesOnly) {
-    const pid_t child = fork();
-    ASSERT_GE(child, 0);
-    if (child == 0) {
-        pause();
-        _exit(0);
-    }
-    KillProcess(child);
-    int status = 0;
-    ASSERT_EQ(waitpid(child, &status, 0), child);
-    EXPECT_TRUE(WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL);
+// Killing a running program is shown by the external-program time-out tests.
+TEST(KillProcessTest, IgnoresProcessesThatAreGoneAndRefusesGroups) {
     // A reaped id might be reused at once; an id above the system's limit never names a process.
     long pidLimit = 0;
     std::ifstream("/proc/sys/kernel/pid_max") >> pidLimit;
@@ -164,6 +148,66 @@ TEST(KillProcessTest, KillsRunningProcessesOnly) {
     for (pid_t processGroup : {0, -1, -getpid()}) {
         EXPECT_THROW(KillProcess(processGroup), exception::InvalidArgument) << processGroup;
     }
+}
+
+// An absolute shared-file directory wins over the sysroot: the named mutex tests show it.
+TEST(SysrootTest, ResolvesOnlyUnderAnAbsoluteSysroot) {
+    const struct {
+        const char* value;  // KEST_SYSROOT, null for unset
+        const char* prefix;
+        bool hasSysroot;
+    } cases[] = {{nullptr, "", false},
+                 {"", "", false},
+                 {"relative/root", "", false},
+                 {"/", "", true},
+                 {"/srv/root", "/srv/root", true},
+                 {"/srv/root//", "/srv/root", true}};
+    for (const auto& c : cases) {
+        RunInChild([&c] {  // the environment changes end with the child
+            SCOPED_TRACE(c.value != nullptr ? c.value : "unset");
+            c.value != nullptr ? setenv("KEST_SYSROOT", c.value, 1) : unsetenv("KEST_SYSROOT");
+            setenv("VQDSCTMPSHAREDFILEDIR", "run/shared", 1);  // not absolute: ignored
+            const std::string prefix = c.prefix;
+            EXPECT_EQ(kest::SysrootDirectory(), prefix);
+            EXPECT_EQ(kest::HasSysroot(), c.hasSysroot);
+            EXPECT_EQ(kest::ResolveSystemPath("/dev/rtc0"), prefix + "/dev/rtc0");
+            EXPECT_EQ(kest::ResolveSystemPath("relative/path"), "relative/path");
+            namespace paths = kest::paths;
+            EXPECT_EQ(paths::VersionFile(), prefix + "/etc/korvane/version");
+            EXPECT_EQ(paths::FirmwareStagingFile(),
+                      prefix + "/var/volatile/tmp/kestsysxp.fwupdate.cfg");
+            EXPECT_EQ(paths::SharedTemporaryFileDirectory(), prefix + "/var/tmp/korvane/shared");
+            EXPECT_EQ(paths::NamedMutexDirectory(), prefix + "/var/tmp/korvane/shared/mutex");
+            EXPECT_EQ(paths::RealTimeClockDevices(),
+                      (std::vector<std::string>{prefix + "/dev/rtc", prefix + "/dev/rtc0",
+                                                prefix + "/dev/misc/rtc"}));
+        });
+    }
+}
+
+// Under a sysroot the time goes to a file, replaced whole. 2100-01-01 is taken where time_t has
+// 64 bits and refused, never wrapped to 1901, where it has 32 bits (ARMv7 Linux).
+TEST(SystemClockTest, UnderASysrootTheTimeGoesToAFile) {
+    TempSysroot sysroot;
+    EXPECT_THROW(kest::SetSystemClock(1, 1000000), exception::InvalidArgument);
+    EXPECT_THROW(kest::SetSystemClock(1, -1), exception::InvalidArgument);
+    if (sizeof(time_t) < sizeof(int64_t)) {
+        EXPECT_THROW(kest::SetSystemClock(4102444800, 0), exception::OutOfRange);
+    }
+    EXPECT_FALSE(sysroot.Exists("/run"));
+    kest::SetSystemClock(1700000000, 500000);
+    EXPECT_EQ(sysroot.ReadFile("/run/kest/system-clock"), "1700000000 500000\n");
+    kest::SetSystemClock(5, 0);
+    EXPECT_EQ(sysroot.ReadFile("/run/kest/system-clock"), "5 0\n");
+    if (sizeof(time_t) >= sizeof(int64_t)) {
+        kest::SetSystemClock(4102444800, 0);
+        EXPECT_EQ("4102444800 0\n", sysroot.ReadFile("/run/kest/system-clock"));
+    }
+    EXPECT_EQ(EntriesOf(sysroot.PathOf("/run/kest")).size(), 1u)
+        << "no temporary file is left behind";
+    TempSysroot other;
+    other.WriteFile("/run", "not a directory");
+    EXPECT_THROW(kest::SetSystemClock(1, 0), PosixError);
 }
 
 }  // namespace

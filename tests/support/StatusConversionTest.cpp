@@ -1,24 +1,41 @@
 #include <gtest/gtest.h>
 
+#include <cerrno>
+#include <cstring>
 #include <iterator>
 #include <new>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
-#include "TraceCapture.h"
 #include "support/ConvertStatusCode.h"
 #include "support/CurrentExceptionToStatus.h"
 #include "support/EntryGuard.h"
 #include "support/Exceptions.h"
-#include "support/StatusHolder.h"
+#include "support/TraceGate.h"
 
 namespace kest::test::support {
 
 namespace {
 
 using Lines = std::vector<std::string>;
-using StatusConversion = TraceCaptureTest;
+namespace exception = vq::dsc::exception;
+namespace osdep = vq::dsc::osdep;
+
+// Captures the trace texts; the silent gate (mask 0) comes back after each test.
+class StatusConversion : public ::testing::Test {
+  protected:
+    // The texts written since the last CaptureWithMask, in order.
+    static Lines& Texts() {
+        static Lines texts;
+        return texts;
+    }
+    static void CaptureWithMask(uint32_t mask) {
+        Texts().clear();
+        SetTraceGate(mask, [](char, const char* text, bool) { Texts().push_back(text); });
+    }
+    void TearDown() override { SetTraceGate(0, nullptr); }
+};
 
 TEST_F(StatusConversion, LibraryCodesMapAndOthersAreTracedAsFail) {
     CaptureWithMask(kTraceErrors);
@@ -39,25 +56,6 @@ TEST_F(StatusConversion, LibraryCodesMapAndOthersAreTracedAsFail) {
     EXPECT_TRUE(Texts().empty());
 }
 
-TEST(StatusHolder, StoresSuccessAndThrowsFailureAsLong) {
-    StatusHolder holder;
-    holder = S_FALSE;
-    EXPECT_EQ(S_FALSE, holder.Get());
-    try {
-        holder = UX_E_PROPERTY_NOT_FOUND;
-        FAIL() << "a negative status must be thrown";
-    } catch (long status) {
-        EXPECT_EQ(UX_E_PROPERTY_NOT_FOUND, status);
-    }
-}
-
-struct ThrowRow {
-    const char* name;
-    void (*thrower)();
-    HRESULT status;
-    Lines trace;
-};
-
 HRESULT ConvertThrown(void (*thrower)()) {
     try {
         thrower();
@@ -67,50 +65,81 @@ HRESULT ConvertThrown(void (*thrower)()) {
     return S_OK;
 }
 
-TEST_F(StatusConversion, CurrentExceptionMapsEachKindWithItsTrace) {
-    const Lines stdTrace = {"std::exception(-2147467259)"};
-    const ThrowRow rows[] = {
-        {"status", [] { throw static_cast<long>(UX_E_ITEM_NOT_FOUND); }, UX_E_ITEM_NOT_FOUND, {}},
-        {"bad_alloc", [] { throw std::bad_alloc(); }, E_OUTOFMEMORY, {}},
-        {"range", [] { throw std::out_of_range("x"); }, E_FAIL, {"out of range(-2147467259)"}},
-        {"runtime_error", [] { throw std::runtime_error("x"); }, E_FAIL, stdTrace},
-        {"dsc", [] { throw vq::dsc::exception::NotImplemented(); }, E_FAIL, stdTrace},
-        {"dsc out of range", [] { throw vq::dsc::exception::OutOfRange(); }, E_FAIL, stdTrace}};
-    for (const ThrowRow& row : rows) {
+// Each kind of exception as the current-exception conversion and the entry guard see it.
+TEST_F(StatusConversion, EveryKindOfExceptionWithItsTrace) {
+    const Lines standard = {"std::exception(-2147467259)"}, uncaught = {"Uncaught exception"};
+    const struct {
+        void (*thrower)();
+        HRESULT status;
+        Lines trace, guardTrace;
+    } rows[] = {
+        {[] { throw long{UX_E_VALUE_INVALID}; }, UX_E_VALUE_INVALID, {}, {"Failure(-2147220609)"}},
+        {[] { throw std::bad_alloc(); }, E_OUTOFMEMORY, {}, {"Error allocating memory"}},
+        {[] { throw std::out_of_range("x"); }, E_FAIL, {"out of range(-2147467259)"}, uncaught},
+        {[] { throw std::runtime_error("x"); }, E_FAIL, standard, uncaught},
+        {[] { throw exception::NotImplemented(); }, E_FAIL, standard, {"Uncaught dsc Exception"}},
+        {[] { throw exception::OutOfRange(); }, E_FAIL, standard, {"Uncaught dsc Exception"}}};
+    for (size_t i = 0; i < std::size(rows); ++i) {
         CaptureWithMask(kTraceErrors);
-        EXPECT_EQ(row.status, ConvertThrown(row.thrower)) << row.name;
-        EXPECT_EQ(row.trace, Texts()) << row.name;
+        EXPECT_EQ(rows[i].status, ConvertThrown(rows[i].thrower)) << i;
+        EXPECT_EQ(rows[i].trace, Texts()) << i;
+        CaptureWithMask(kTraceErrors);
+        const auto entry = [&rows, i]() -> HRESULT {
+            rows[i].thrower();
+            return S_OK;
+        };
+        EXPECT_EQ(rows[i].status, GuardEntryPoint("Failure", entry)) << i;
+        EXPECT_EQ(rows[i].guardTrace, Texts()) << i;
     }
     EXPECT_THROW(ConvertThrown([] { throw 42; }), int);
-}
-
-TEST_F(StatusConversion, EntryGuardConvertsEveryExceptionWithItsTrace) {
-    const ThrowRow rows[] = {
-        {"status",
-         [] { throw static_cast<long>(UX_E_VALUE_INVALID); },
-         UX_E_VALUE_INVALID,
-         {"Failure(-2147220609)"}},
-        {"bad_alloc", [] { throw std::bad_alloc(); }, E_OUTOFMEMORY, {"Error allocating memory"}},
-        {"dsc",
-         [] { throw vq::dsc::exception::NotImplemented(); },
-         E_FAIL,
-         {"Uncaught dsc Exception"}},
-        {"standard", [] { throw std::out_of_range("x"); }, E_FAIL, {"Uncaught exception"}},
-        {"foreign", [] { throw 3; }, E_FAIL, {"Uncaught exception"}}};
-    for (const ThrowRow& row : rows) {
-        CaptureWithMask(kTraceErrors);
-        EXPECT_EQ(row.status, GuardEntryPoint("Failure",
-                                              [&row]() -> HRESULT {
-                                                  row.thrower();
-                                                  return S_OK;
-                                              }))
-            << row.name;
-        EXPECT_EQ(row.trace, Texts()) << row.name;
-    }
+    CaptureWithMask(kTraceErrors);
+    EXPECT_EQ(E_FAIL, GuardEntryPoint("Failure", []() -> HRESULT { throw 3; }));
+    EXPECT_EQ(uncaught, Texts());
     EXPECT_EQ(S_FALSE, GuardEntryPoint("x", [] { return S_FALSE; }));
     SetTraceGate(kTraceErrors, [](char, const char*, bool) { throw std::runtime_error("disk"); });
     EXPECT_EQ(E_FAIL, GuardEntryPoint("x", []() -> HRESULT { throw static_cast<long>(E_FAIL); }));
     EXPECT_EQ(E_FAIL, ConvertStatusCode(5));
+}
+
+TEST(Exceptions, FixedTextsAndCodes) {
+    struct Row {
+        const exception::Exception& e;
+        const char* text;
+        uint32_t code;
+    };
+    const Row rows[] = {
+        {exception::Exception(), "unspecified exception", 0xFFFFFFFFu},
+        {exception::OutOfRange(), "Out of range", 0x8ABC7007u},
+        {exception::OutOfRange2("String offset out of range"),
+         "Out of range: String offset out of range", 0x8ABC7007u},
+        {exception::InvalidArgument2("x"), "Invalid argument(s): x", 0x8ABC700Fu},
+        {exception::InvalidOperation(), "Invalid operation", 0x8ABC700Eu},
+        {exception::Timeout(), "Operation timed out", 0x8ABC7003u},
+        {exception::NotImplemented(), "Not implemented", 0x80004001u},
+        {exception::UnableToConvert(), "Unable to convert.", 0x8ABC7034u},
+        {exception::AccessDenied("Access denied: /x"), "Access denied: /x", 0x8ABC7019u},
+        {osdep::NotResolvedException(), "Not able to resolve the network name or address",
+         0xFFFFFFFFu},
+    };
+    for (const Row& row : rows) {
+        EXPECT_STREQ(row.text, row.e.what());
+        EXPECT_EQ(row.code, static_cast<uint32_t>(row.e.ErrorCode())) << row.text;
+    }
+}
+
+TEST(Exceptions, PosixErrorCodesFollowTheErrorNumber) {
+    const osdep::PosixError missing(ENOENT);
+    EXPECT_EQ(7, missing.ErrorCode());
+    EXPECT_EQ(2, missing.OSErrorNumber());
+    EXPECT_STREQ(std::strerror(ENOENT), missing.what());
+    EXPECT_EQ(0, osdep::PosixError(0).ErrorCode());
+    EXPECT_EQ(42, osdep::PosixError(EACCES).ErrorCode());
+    const osdep::PosixError custom("custom text", ENOTDIR);
+    EXPECT_STREQ("custom text", custom.what());
+    EXPECT_EQ(ENOTDIR, custom.OSErrorNumber());
+    errno = EPERM;
+    EXPECT_EQ(EPERM, osdep::PosixError().OSErrorNumber());
+    EXPECT_THROW(throw exception::OutOfRange2("cut"), exception::OutOfRange);
 }
 
 }  // namespace

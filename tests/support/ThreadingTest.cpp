@@ -36,11 +36,11 @@ void RunOnThread(Body& body) {
     thread.Join();
 }
 
-TEST(MutexTest, RecursionIsCountedAndExcludesOtherThreads) {
+TEST(MutexTest, RecursionIsCountedExcludesOtherThreadsAndBlocksThemUntilTheFullRelease) {
     Mutex mutex;
     EXPECT_THROW(mutex.Unlock(), InvalidOperation);
     mutex.Lock();
-    ScopedLock again(mutex);
+    mutex.Lock();
     EXPECT_EQ(mutex.RecursionCount(), 2u);
     EXPECT_TRUE(mutex.IsOwnedByCurrentThread());
 
@@ -62,15 +62,11 @@ TEST(MutexTest, RecursionIsCountedAndExcludesOtherThreads) {
     EXPECT_EQ(mutex.RecursionCount(), 1u);
     RunOnThread(fromOtherThread);
     EXPECT_FALSE(otherGotIt) << "one level of recursion is still held";
-}
 
-TEST(MutexTest, BlockedLockWaitsForTheFullRelease) {
-    Mutex mutex;
+    mutex.Lock();
     std::atomic<bool> released{false};
     bool sawReleased = false;
     uint32_t countInside = 0;
-    mutex.Lock();
-    mutex.Lock();
     auto waiter = [&] {
         ScopedLock lock(mutex);
         sawReleased = released.load();

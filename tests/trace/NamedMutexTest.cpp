@@ -8,14 +8,13 @@
 #include <functional>
 #include <string>
 
-#include "TraceTestSupport.h"
+#include "common/ChildProcess.h"
 #include "common/TempSysroot.h"
 #include "support/Exceptions.h"
 #include "trace/NamedMutex.h"
 
 namespace kest::test::trace {
 
-using kest::test::TempSysroot;
 using vq::dsc::NamedMutex;
 using vq::dsc::ScopedNamedLock;
 
@@ -47,11 +46,6 @@ pid_t StartAsNobody(const std::function<int()>& body) {
     return child;
 }
 
-int ExitCodeOf(pid_t child) {
-    int status = 0;
-    return waitpid(child, &status, 0) == child && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-}
-
 // A sysroot whose shared temporary directory others may write, as on the controller.
 class SharedSysroot : public TempSysroot {
   public:
@@ -64,14 +58,13 @@ class SharedSysroot : public TempSysroot {
     }
 };
 
-TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLastMutex) {
+TEST(NamedMutexTest, LockFileIsPrivateSharedByNameAndHeldUntilTheOutermostUnlock) {
     TempSysroot sysroot;
-    mode_t previousMask = umask(022);
-    std::string path;
+    const mode_t previousMask = umask(022);
     {
         NamedMutex mutex("modes.lock");
         NamedMutex sameName("modes.lock");
-        path = mutex.LockFilePath();
+        const std::string path = mutex.LockFilePath();
         EXPECT_EQ(path, sysroot.PathOf("/var/tmp/korvane/shared/mutex/modes.lock"));
         EXPECT_EQ(ModeOf(path), 0600u);
         EXPECT_TRUE(mutex.HasFileLock());
@@ -79,9 +72,22 @@ TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLast
              {"/var/tmp/korvane", "/var/tmp/korvane/shared", "/var/tmp/korvane/shared/mutex"}) {
             EXPECT_EQ(ModeOf(sysroot.PathOf(directory)), 01777u) << directory;
         }
+        mutex.Lock();
+        sameName.Lock();
+        EXPECT_FALSE(FileLockIsFree(path));
+        sameName.Unlock();
+        EXPECT_FALSE(FileLockIsFree(path));
+        mutex.Unlock();
+        EXPECT_TRUE(FileLockIsFree(path));
     }
     umask(previousMask);
     EXPECT_FALSE(sysroot.Exists("/var/tmp/korvane/shared/mutex/modes.lock"));
+    // A process without standard input gets descriptor 0 for the lock file.
+    const int input = dup(STDIN_FILENO);
+    close(STDIN_FILENO);
+    EXPECT_TRUE(NamedMutex("zero.lock").HasFileLock());
+    dup2(input, STDIN_FILENO);
+    close(input);
     TempSysroot shared;
     setenv("VQDSCTMPSHAREDFILEDIR", shared.Root().c_str(), 1);
     NamedMutex elsewhere("elsewhere.lock");
@@ -89,7 +95,7 @@ TEST(NamedMutexTest, LockFileIsPrivateInASharedStickyDirectoryAndGoesWithTheLast
     EXPECT_EQ(elsewhere.LockFilePath(), shared.Root() + "/mutex/elsewhere.lock");
 }
 
-TEST(NamedMutexTest, AnythingButOurOwnPlainFileLeavesTheMutexWithoutFileLock) {
+TEST(NamedMutexTest, OnlyOurOwnPlainFileGivesAFileLock) {
     SharedSysroot sysroot;
     std::string directory = sysroot.PathOf("/var/tmp/korvane/shared/mutex");
     std::string victim = sysroot.PathOf("/victim");
@@ -98,12 +104,17 @@ TEST(NamedMutexTest, AnythingButOurOwnPlainFileLeavesTheMutexWithoutFileLock) {
     ASSERT_EQ(link(victim.c_str(), (directory + "/hardlink.lock").c_str()), 0);
     ASSERT_EQ(mkfifo((directory + "/fifo.lock").c_str(), 0666), 0);
     ASSERT_EQ(mkdir((directory + "/directory.lock").c_str(), 0777), 0);
-    ASSERT_EQ(0, ExitCodeOf(StartAsNobody(
-                     [&] { return close(creat((directory + "/foreign.lock").c_str(), 0666)); })));
-    for (const char* name :
-         {"symlink.lock", "hardlink.lock", "fifo.lock", "directory.lock", "foreign.lock"}) {
+    RunInChild([&directory] {
+        ASSERT_TRUE(setgid(65534) == 0 && setuid(65534) == 0);
+        EXPECT_EQ(0, close(creat((directory + "/foreign.lock").c_str(), 0666)));
+    });
+    sysroot.WriteFile("/var/tmp/korvane/shared/mutex/left.lock", "");  // ours, from an earlier run
+    const std::pair<const char*, bool> names[] = {
+        {"left.lock", true},  {"symlink.lock", false},   {"hardlink.lock", false},
+        {"fifo.lock", false}, {"directory.lock", false}, {"foreign.lock", false}};
+    for (const auto& [name, fileLock] : names) {
         NamedMutex mutex(name);
-        EXPECT_FALSE(mutex.HasFileLock()) << name;
+        EXPECT_EQ(mutex.HasFileLock(), fileLock) << name;
         ScopedNamedLock stillOrdersThreads(mutex);
     }
     EXPECT_EQ(ModeOf(victim), 0600u);
@@ -150,19 +161,17 @@ TEST(NamedMutexTest, DirectorySwapsOfAnotherUserNeverReachTheirTarget) {
 TEST(NamedMutexTest, AFileLockHeldByAnotherUserCostsOneBoundedWait) {
     SharedSysroot sysroot;
     NamedMutex mutex("held.lock");
-    ASSERT_EQ(chmod(mutex.LockFilePath().c_str(), 0666), 0);
-    int ready[2];
-    ASSERT_EQ(pipe(ready), 0);
-    const pid_t holder = StartAsNobody([&] {
-        const int descriptor = open(mutex.LockFilePath().c_str(), O_RDONLY);
-        const char taken = flock(descriptor, LOCK_EX) == 0 ? 'y' : 'n';
-        (void)!write(ready[1], &taken, 1);
+    const std::string path = mutex.LockFilePath();
+    ASSERT_EQ(chmod(path.c_str(), 0666), 0);
+    const pid_t holder = StartAsNobody([&path] {
+        flock(open(path.c_str(), O_RDONLY), LOCK_EX);
         pause();
         return 0;
     });
-    char taken = 0;
-    ASSERT_EQ(read(ready[0], &taken, 1), 1);
-    ASSERT_EQ(taken, 'y');
+    for (int attempt = 0; attempt < 5000 && FileLockIsFree(path); ++attempt) {
+        usleep(1000);
+    }
+    EXPECT_FALSE(FileLockIsFree(path)) << "the holder never took the file lock";
     mutex.Lock();
     mutex.Unlock();
     EXPECT_FALSE(mutex.HasFileLock());
@@ -170,21 +179,6 @@ TEST(NamedMutexTest, AFileLockHeldByAnotherUserCostsOneBoundedWait) {
     mutex.Unlock();
     kill(holder, SIGKILL);
     waitpid(holder, nullptr, 0);
-    close(ready[0]);
-    close(ready[1]);
-}
-
-TEST(NamedMutexTest, FileLockIsHeldUntilTheOutermostUnlock) {
-    TempSysroot sysroot;
-    NamedMutex mutex("recursive.lock");
-    NamedMutex sameName("recursive.lock");
-    mutex.Lock();
-    sameName.Lock();
-    EXPECT_FALSE(FileLockIsFree(mutex.LockFilePath()));
-    sameName.Unlock();
-    EXPECT_FALSE(FileLockIsFree(mutex.LockFilePath()));
-    mutex.Unlock();
-    EXPECT_TRUE(FileLockIsFree(mutex.LockFilePath()));
 }
 
 }  // namespace
