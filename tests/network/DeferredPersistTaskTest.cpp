@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <pthread.h>
 #include <time.h>
+#include <cstdlib>
 
 #include "NetworkTestSupport.h"
 #include "items/DeferredPersistTask.h"
@@ -22,6 +23,11 @@ double MonotonicMs() {
 
 // The log keeps three decimals, so a logged time may lie up to 1 µs before the call.
 constexpr double kLogResolutionMs = 0.001;
+
+struct LoggedCall {
+    double milliseconds;  // CLOCK_MONOTONIC
+    std::string call;     // name, status and inputs, tab-separated
+};
 
 // A handler that records when and on which thread its deferred-persist hook runs.
 class RecordingHandler : public ItemHandler {
@@ -69,6 +75,15 @@ class DeferredTaskTest : public NetworkTest {
                                          CountedPtr<IuxSysPropertyBag2>(MakeBag(changes)));
         endMs_ = MonotonicMs();
         return handler;
+    }
+
+    std::vector<LoggedCall> TimedCallLog() const {
+        std::vector<LoggedCall> calls;
+        std::istringstream log(sysroot_.ReadFile(kest::test::sim::kCallLogPath));
+        for (std::string line; std::getline(log, line);) {
+            calls.push_back({std::strtod(line.c_str(), nullptr), line.substr(line.find('\t') + 1)});
+        }
+        return calls;
     }
 
     double startMs_ = 0;

@@ -1,47 +1,23 @@
 // A simulated controller with one Ethernet adapter "eth0" (device index 0, the primary adapter,
 // TCP/IP mode 2 with a static address) under a temporary sysroot, the adapter's handler, bags
-// written from short row texts, the library's call log and captured traces.
+// written from short row texts and captured traces.
 #pragma once
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <mutex>
 #include <regex>
 #include <sstream>
 #include <string>
 #include <vector>
 
-#include "common/TempSysroot.h"
+#include "common/ChassisTestTags.h"
 #include "network/EthernetItemHandler.h"
 #include "property/CuxDynamicPropertyBag.h"
+#include "sim/SimFixture.h"
 #include "support/TraceGate.h"
-#include "vq/targetcfg/TargetConfig.h"
-
-// The network item's tags, written out here as an independent check of the plug-in's.
-namespace NetworkTag {
-constexpr uint32_t kItemName = 0x0101D000;
-constexpr uint32_t kAdapterMode = 0x0D102000;
-constexpr uint32_t kSupportedAdapterModes = 0x0D103000;
-constexpr uint32_t kMacAddress = 0x0D104000;
-constexpr uint32_t kRequestMode = 0x0D105000;
-constexpr uint32_t kIPAddress = 0x0D107000;
-constexpr uint32_t kSubnetMask = 0x0D109000;
-constexpr uint32_t kGateway = 0x0D10A000;
-constexpr uint32_t kDnsServer = 0x0D10B000;
-constexpr uint32_t kPreferredMediaMode = 0x0D10F000;
-constexpr uint32_t kEtherCATMasterId = 0x0D118000;
-constexpr uint32_t kSupportedPollingModes = 0x0D119000;
-constexpr uint32_t kPollingMode = 0x0D11A000;
-constexpr uint32_t kPollingInterval = 0x0D11B000;
-constexpr uint32_t kPrimaryAdapter = 0x0D126000;
-constexpr uint32_t kEtherCATFlag = 0x0D155000;
-}  // namespace NetworkTag
 
 namespace kest::test::network {
-
-constexpr char kStatePath[] = "/var/lib/vqtargetcfg/state.ini";
-constexpr char kCallLogPath[] = "/var/lib/vqtargetcfg/calls.log";
 
 // The adapter's state; each "Key = value" line of `overrides` replaces the line of that key or,
 // for a new key, is added (a "[Faults]" section, too).
@@ -72,22 +48,22 @@ inline void WriteRows(IuxSysPropertyBag* bag, const std::string& rows) {
         char kind;  // b boolean, u number, t text
     };
     static const Row kRows[] = {
-        {"primary", NetworkTag::kPrimaryAdapter, 'b'},
-        {"flag", NetworkTag::kEtherCATFlag, 'b'},
-        {"ip", NetworkTag::kIPAddress, 't'},
-        {"mask", NetworkTag::kSubnetMask, 't'},
-        {"gw", NetworkTag::kGateway, 't'},
-        {"dns", NetworkTag::kDnsServer, 't'},
-        {"mac", NetworkTag::kMacAddress, 't'},
-        {"name", NetworkTag::kItemName, 't'},
-        {"mode", NetworkTag::kAdapterMode, 'u'},
-        {"modes", NetworkTag::kSupportedAdapterModes, 'u'},
-        {"req", NetworkTag::kRequestMode, 'u'},
-        {"media", NetworkTag::kPreferredMediaMode, 'u'},
-        {"id", NetworkTag::kEtherCATMasterId, 'u'},
-        {"polling", NetworkTag::kPollingMode, 'u'},
-        {"pollmodes", NetworkTag::kSupportedPollingModes, 'u'},
-        {"interval", NetworkTag::kPollingInterval, 'u'},
+        {"primary", tags::kPrimaryAdapter, 'b'},
+        {"flag", tags::kEtherCATFlag, 'b'},
+        {"ip", tags::kIPAddress, 't'},
+        {"mask", tags::kSubnetMask, 't'},
+        {"gw", tags::kGateway, 't'},
+        {"dns", tags::kDnsServer, 't'},
+        {"mac", tags::kMacAddress, 't'},
+        {"name", tags::kItemName, 't'},
+        {"mode", tags::kAdapterMode, 'u'},
+        {"modes", tags::kSupportedAdapterModes, 'u'},
+        {"req", tags::kRequestMode, 'u'},
+        {"media", tags::kPreferredMediaMode, 'u'},
+        {"id", tags::kEtherCATMasterId, 'u'},
+        {"polling", tags::kPollingMode, 'u'},
+        {"pollmodes", tags::kSupportedPollingModes, 'u'},
+        {"interval", tags::kPollingInterval, 'u'},
     };
     std::istringstream tokens(rows);
     for (std::string token; tokens >> token;) {
@@ -118,28 +94,21 @@ inline CountedPtr<IuxSysPropertyBag4> MakeBag(const std::string& rows) {
     return bag;
 }
 
-// The unsigned value of `tag`, or 0xDEADBEEF when the bag has none.
-inline uint32_t ULongOf(IuxSysPropertyBag* bag, uint32_t tag) {
-    uint32_t value = 0xDEADBEEF;
-    return bag->GetULong(tag, &value) == S_OK ? value : 0xDEADBEEF;
+// The status `call` returns or throws (as a long).
+template <class Call>
+HRESULT StatusOf(Call&& call) {
+    try {
+        return call();
+    } catch (long thrown) {
+        return static_cast<HRESULT>(thrown);
+    }
 }
 
-inline std::wstring TextOf(IuxSysPropertyBag* bag, uint32_t tag) {
-    CvqBStrHolder text;
-    return bag->GetString(tag, text.Receive()) == S_OK ? text.Get() : L"<missing>";
-}
-
-struct LoggedCall {
-    double milliseconds;  // CLOCK_MONOTONIC
-    std::string call;     // name, status and inputs, tab-separated
-};
-
-class NetworkTest : public ::testing::Test {
+class NetworkTest : public ::testing::Test, public kest::test::sim::SimSysroot {
   protected:
     void TearDown() override { SetTraceGate(0, nullptr); }
 
-    void WriteState(const std::string& state) const { sysroot_.WriteFile(kStatePath, state); }
-    void ClearCallLog() const { sysroot_.WriteFile(kCallLogPath, ""); }
+    void ClearCallLog() const { sysroot_.WriteFile(kest::test::sim::kCallLogPath, ""); }
 
     // The Ethernet handler of the controller's first device.
     static CountedPtr<EthernetItemHandler> MakeHandler() {
@@ -156,22 +125,12 @@ class NetworkTest : public ::testing::Test {
         return handler;
     }
 
-    std::vector<LoggedCall> TimedCallLog() const {
-        std::vector<LoggedCall> calls;
-        std::istringstream log(sysroot_.ReadFile(kCallLogPath));
-        for (std::string line; std::getline(log, line);) {
-            const size_t tab = line.find('\t');
-            calls.push_back({std::strtod(line.c_str(), nullptr), line.substr(tab + 1)});
-        }
-        return calls;
-    }
-
-    // The logged calls whose names begin with `prefix` ("" for all), without their times.
-    std::vector<std::string> CallLog(const std::string& prefix = "") const {
+    // The logged calls whose names begin with `prefix`.
+    std::vector<std::string> Calls(const std::string& prefix) const {
         std::vector<std::string> calls;
-        for (const LoggedCall& call : TimedCallLog()) {
-            if (call.call.compare(0, prefix.size(), prefix) == 0) {
-                calls.push_back(call.call);
+        for (const std::string& call : CallLog()) {
+            if (call.compare(0, prefix.size(), prefix) == 0) {
+                calls.push_back(call);
             }
         }
         return calls;
@@ -190,8 +149,6 @@ class NetworkTest : public ::testing::Test {
         static std::vector<std::string> traces;
         return traces;
     }
-
-    kest::test::TempSysroot sysroot_;
 };
 
 }  // namespace kest::test::network

@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "common/ChassisTestTags.h"
 #include "sim/SimFixture.h"
 #include "uxsys/StatusCodes.h"
 
@@ -92,13 +93,11 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
     // What the system clock was last set to ("seconds microseconds\n"; empty: never).
     std::string Clock() const { return sysroot_.ReadFile(kClockFile); }
 
-    // The logged calls whose name starts with "Set" (name, status and arguments).
-    std::vector<std::string> SetterCalls() const {
-        std::vector<std::string> setters;
+    // The logged calls whose name starts with "Set" (name, status and arguments), one a line.
+    std::string SetterCalls() const {
+        std::string setters;
         for (const std::string& line : CallLog()) {
-            if (line.compare(0, 3, "Set") == 0) {
-                setters.push_back(line);
-            }
+            setters += line.compare(0, 3, "Set") == 0 ? line + "\n" : "";
         }
         return setters;
     }
@@ -107,16 +106,5 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
 }  // namespace kest::test::system
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
-
-// The system item's setting tags, written out here as an independent check of the plug-in's.
-namespace SystemTag {
-constexpr uint32_t kDeviceDescription = 0x01006000;
-constexpr uint32_t kHostName = 0x0101F000;
-constexpr uint32_t kComment = 0x0103D000;
-constexpr uint32_t kLocaleCode = 0x0D11D000;
-constexpr uint32_t kCurrentTime = 0x0D11F000;
-constexpr uint32_t kLegacyTimeZone = 0x0D120000;
-constexpr uint32_t kOlsonTimeZone = 0x0D14E000;
-constexpr uint32_t kWebServiceEnabled = 0x21004000;
-}  // namespace SystemTag
+namespace tags = kest::test::tags;
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100
