@@ -65,6 +65,12 @@ INSTANTIATE_TEST_SUITE_P(
         Case{"AddressLoopback", "ip=127.0.0.1", UX_E_IP_ADDRESS_INVALID},
         Case{"AddressMissing", "-ip", UX_E_IP_ADDRESS_INVALID},
         Case{"AddressTooLong", "ip=192.168.001.0010", UX_E_IP_ADDRESS_INVALID},
+        // Texts that inet_addr reads as another address than the one they would be stored as
+        // (short, octal and hexadecimal forms, leading zeros) are refused in every field.
+        Case{"AddressOctal", "ip=0300.168.10.21", UX_E_IP_ADDRESS_INVALID},
+        Case{"MaskHexadecimal", "mask=255.0xFFFF00", UX_E_SUBNET_MASK_INVALID},
+        Case{"GatewayShort", "gw=192.168.257", UX_E_GATEWAY_INVALID},
+        Case{"DnsLeadingZeros", "dns=192.168.010.020", UX_E_DNS_ADDRESS_INVALID},
         Case{"GatewayLoopback", "gw=127.0.0.1", UX_E_GATEWAY_INVALID},
         Case{"PrimaryWithoutGateway", "gw=", UX_E_GATEWAY_INVALID},
         Case{"OtherWithoutGatewayOrDns", "primary=0 gw= dns=", S_OK},

@@ -162,7 +162,8 @@ TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
     }
 }
 
-TEST_F(SystemItemChangesTest, RewritesTheWebServiceSwitchEvenWhenUnchanged) {
+// The switch is rewritten even when unchanged, and saved before the clock is set last.
+TEST_F(SystemItemChangesTest, SavesTheWebServiceSwitchThenSetsTheClock) {
     sysroot_.WriteFile(kest::test::system::kWebServicePath, "; old\n[WebService]\nEnable = 0\n");
     handler_ = MakeCounted<KestDeviceItemHandler>();
     changes_->SetBool(tags::kWebServiceEnabled, 0);
@@ -170,11 +171,10 @@ TEST_F(SystemItemChangesTest, RewritesTheWebServiceSwitchEvenWhenUnchanged) {
     EXPECT_EQ(1, persistFlag_);
     EXPECT_EQ("[WebService]\nEnable = 0\n\n",
               sysroot_.ReadFile(kest::test::system::kWebServicePath));
-}
 
-TEST_F(SystemItemChangesTest, SetsTheClockLastAfterTheWebServiceSwitch) {
     changes_->SetTimestamp(tags::kCurrentTime, k2023);
     changes_->SetBool(tags::kWebServiceEnabled, 1);
+    persistFlag_ = 0;
     EXPECT_EQ(S_OK, Persist());
     EXPECT_EQ("1700000000 0\n", Clock()) << "no legacy zone change, no correction";
     EXPECT_EQ("[WebService]\nEnable = 1\n\n",

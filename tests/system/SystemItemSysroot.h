@@ -3,11 +3,9 @@
 #pragma once
 
 #include <cstdint>
-#include <fstream>
 #include <map>
-#include <sstream>
+#include <regex>
 #include <string>
-#include <vector>
 
 #include "common/ChassisTestTags.h"
 #include "sim/SimFixture.h"
@@ -25,39 +23,25 @@ constexpr char kClockFile[] = "/run/kest/system-clock";
 // section).
 inline std::string SystemState(const std::map<std::string, std::string>& overrides = {},
                                const std::string& extra = "") {
-    std::map<std::string, std::string> keys = {
-        {"DeviceDescription", "KEST 9100"},
-        {"TargetClass", "KEST"},
-        {"HostName", "kest-01"},
-        {"TargetID", "77"},
-        {"SerialNumber", "6699"},
-        {"UserComment", "rack 4"},
-        {"LanguageName", "German"},
-        {"SupportedLanguages", "English,German,French"},
-        {"TimeZone", "America/Chicago"},
-        {"TimezoneOffset", "-360"},
-        {"FullyQualifiedDNSName", "kest-01.example.net"},
-    };
+    std::string state =
+        "[System]\nDeviceDescription = KEST 9100\nTargetClass = KEST\nHostName = kest-01\n"
+        "TargetID = 77\nSerialNumber = 6699\nUserComment = rack 4\nLanguageName = German\n"
+        "SupportedLanguages = English,German,French\nTimeZone = America/Chicago\n"
+        "TimezoneOffset = -360\nFullyQualifiedDNSName = kest-01.example.net\n";
     for (const auto& [key, value] : overrides) {
-        keys[key] = value;
-    }
-    std::string state = "[System]\n";
-    for (const auto& [key, value] : keys) {
-        state += key + " = " + value + "\n";
+        const std::regex line("\n" + key + " = [^\n]*");
+        state = std::regex_search(state, line)
+                    ? std::regex_replace(state, line, "\n" + key + " = " + value)
+                    : state + key + " = " + value + "\n";
     }
     return state + extra;
 }
 
 // A small table: two legacy texts and three Olson names.
 constexpr char kSmallTimeZoneTable[] =
-    "[LegacyToOlson]\n"
-    "CST6CDT = America/Chicago\n"
-    "PST8PDT = America/Los_Angeles\n"
-    "EST5EDT = America/New_York\n"
-    "[OlsonToLegacy]\n"
-    "America/Chicago = CST6CDT\n"
-    "America/Los_Angeles = PST8PDT\n"
-    "America/New_York = EST5EDT\n";
+    "[LegacyToOlson]\nCST6CDT = America/Chicago\nPST8PDT = America/Los_Angeles\n"
+    "EST5EDT = America/New_York\n[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n"
+    "America/Los_Angeles = PST8PDT\nAmerica/New_York = EST5EDT\n";
 
 // Runs `call`, expecting it to throw a status (a long); returns that status.
 template <class Call>
@@ -80,14 +64,6 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
         sysroot_.MakeDirectory("/etc/korvane/share");
         sysroot_.WriteScript("/sbin/hwclock",
                              "echo \"$@\" >> '" + sysroot_.PathOf(kHardwareClockLog) + "'\n");
-    }
-
-    // The shipped table from the source tree, installed in place of the small one.
-    void InstallShippedTimeZoneTable() const {
-        std::ifstream shipped(KEST_SHIPPED_TIMEZONE_TABLE, std::ios::binary);
-        std::ostringstream content;
-        content << shipped.rdbuf();
-        sysroot_.WriteFile(kTimeZoneTablePath, content.str());
     }
 
     // What the system clock was last set to ("seconds microseconds\n"; empty: never).

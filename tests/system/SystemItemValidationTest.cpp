@@ -35,46 +35,28 @@ struct Case {
 
 // Host names are judged by length, then ends, then characters, then digits; comments count the
 // bytes of the narrow text; locale codes must be whole non-empty elements of the list; times are
-// rounded to the nearest millisecond before they are judged.
+// rounded to the nearest millisecond before they are judged. (The system validation fuzzer's
+// seeds hold more host names, comments and locale codes, judged by its own rules.)
 TEST(SystemItemRules, GiveTheirStatusAndMessage) {
     std::string twoByteCharacters;  // 33 characters in 66 bytes
     for (int i = 0; i < 33; ++i) {
         twoByteCharacters += "\xC3\xA9";
     }
     const Case cases[] = {
-        {"host 63 bytes", CheckHostName(std::string(63, 'a')), S_OK, nullptr},
         {"host 64 bytes", CheckHostName(std::string(64, 'a')), UX_E_VALUE_INVALID, kLength},
-        {"host empty", CheckHostName(""), UX_E_VALUE_INVALID, kLength},
-        {"host inner hyphen", CheckHostName("a-b"), S_OK, nullptr},
         {"host leading hyphen", CheckHostName("-ab"), UX_E_HOSTNAME_INVALID, kEnds},
-        {"host trailing hyphen", CheckHostName("ab-"), UX_E_HOSTNAME_INVALID, kEnds},
         {"host underscore", CheckHostName("a_b"), UX_E_HOSTNAME_INVALID, kCharacters},
         {"host inner fault first", CheckHostName("a_b-"), UX_E_HOSTNAME_INVALID, kCharacters},
         {"host digits only", CheckHostName("123"), UX_E_HOSTNAME_INVALID, kNumeric},
-        {"host digit then letter", CheckHostName("1a"), S_OK, nullptr},
-        {"host digits with hyphen", CheckHostName("12-3"), S_OK, nullptr},
-        {"host single letter", CheckHostName("a"), S_OK, nullptr},
-        {"host single digit", CheckHostName("7"), UX_E_HOSTNAME_INVALID, kNumeric},
-        {"host long and bad", CheckHostName("-" + std::string(70, '1')), UX_E_VALUE_INVALID,
-         kLength},
         {"host non-ASCII", CheckHostName("ab\xC3\xA9z"), UX_E_HOSTNAME_INVALID, kCharacters},
-        {"comment 64 bytes", CheckComment(std::string(64, 'c')), S_OK, nullptr},
         {"comment 65 bytes", CheckComment(std::string(65, 'c')), UX_E_VALUE_INVALID,
          kCommentLength},
-        {"comment empty", CheckComment(""), S_OK, nullptr},
         {"comment line break", CheckComment("rack\n4"), UX_E_VALUE_INVALID, kControl},
         {"comment delete", CheckComment("rack 4\x7F"), UX_E_VALUE_INVALID, kControl},
         {"comment multi-byte", CheckComment("rack \xC3\xA9"), S_OK, nullptr},
         {"comment 33 two-byte characters", CheckComment(twoByteCharacters), UX_E_VALUE_INVALID,
          kCommentLength},
-        {"locale en", CheckLocaleCode(L"en", L"en,de,fr"), S_OK, nullptr},
-        {"locale fr", CheckLocaleCode(L"fr", L"en,de,fr"), S_OK, nullptr},
-        {"locale de", CheckLocaleCode(L"de", L"en,de,fr"), S_OK, nullptr},
         {"locale n", CheckLocaleCode(L"n", L"en,de,fr"), UX_E_VALUE_INVALID, kLocale},
-        {"locale e,d", CheckLocaleCode(L"e,d", L"en,de,fr"), UX_E_VALUE_INVALID, kLocale},
-        {"locale empty", CheckLocaleCode(L"", L"en,de,fr"), UX_E_VALUE_INVALID, kLocale},
-        {"locale es", CheckLocaleCode(L"es", L"en,de,fr"), UX_E_VALUE_INVALID, kLocale},
-        {"locale en,de", CheckLocaleCode(L"en,de", L"en,de,fr"), UX_E_VALUE_INVALID, kLocale},
         {"locale empty element", CheckLocaleCode(L"", L"en,de,,fr"), UX_E_VALUE_INVALID, kLocale},
         {"locale after empty", CheckLocaleCode(L"fr", L"en,de,,fr"), S_OK, nullptr},
         {"locale empty list", CheckLocaleCode(L"", L""), UX_E_VALUE_INVALID, kLocale},
