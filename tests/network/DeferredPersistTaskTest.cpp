@@ -24,11 +24,6 @@ double MonotonicMs() {
 // The log keeps three decimals, so a logged time may lie up to 1 µs before the call.
 constexpr double kLogResolutionMs = 0.001;
 
-struct LoggedCall {
-    double milliseconds;  // CLOCK_MONOTONIC
-    std::string call;     // name, status and inputs, tab-separated
-};
-
 // A handler that records when and on which thread its deferred-persist hook runs.
 class RecordingHandler : public ItemHandler {
   public:
@@ -63,10 +58,7 @@ class DeferredTaskTest : public NetworkTest {
     CountedPtr<RecordingHandler> RunTask(bool withDevice, bool adapterDisabled,
                                          const std::string& changes, HRESULT hookFailure = S_OK) {
         WriteState(AdapterState());
-        vq::dsc::Vector<vq::targetcfg::IDeviceHandler*> devices;
-        vq::targetcfg::GetDeviceHandlers(devices);
-        EXPECT_EQ(1u, devices.size());
-        CountedPtr<vq::targetcfg::IDeviceHandler> device(devices[0], kAdoptReference);
+        CountedPtr<vq::targetcfg::IDeviceHandler> device = FirstDevice();
         CountedPtr<RecordingHandler> handler = MakeCounted<RecordingHandler>(hookFailure);
         ClearCallLog();
         startMs_ = MonotonicMs();
@@ -77,8 +69,9 @@ class DeferredTaskTest : public NetworkTest {
         return handler;
     }
 
-    std::vector<LoggedCall> TimedCallLog() const {
-        std::vector<LoggedCall> calls;
+    // The logged calls with their CLOCK_MONOTONIC times.
+    std::vector<std::pair<double, std::string>> TimedCallLog() const {
+        std::vector<std::pair<double, std::string>> calls;
         std::istringstream log(sysroot_.ReadFile(kest::test::sim::kCallLogPath));
         for (std::string line; std::getline(log, line);) {
             calls.push_back({std::strtod(line.c_str(), nullptr), line.substr(line.find('\t') + 1)});
@@ -92,25 +85,25 @@ class DeferredTaskTest : public NetworkTest {
 
 TEST_F(DeferredTaskTest, TogglesTheInterfaceAfterItsDelaysAndReappliesTheLinkSpeed) {
     CountedPtr<RecordingHandler> handler = RunTask(true, false, "mode=2 media=8");
-    const std::vector<LoggedCall> calls = TimedCallLog();
+    const auto calls = TimedCallLog();
     ASSERT_EQ(3u, calls.size());
-    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].call);
-    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t1", calls[1].call);
-    EXPECT_EQ("SetDeviceSettings\t0\t0\t8\t0\t0", calls[2].call);
+    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].second);
+    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t1", calls[1].second);
+    EXPECT_EQ("SetDeviceSettings\t0\t0\t8\t0\t0", calls[2].second);
     EXPECT_GE(handler->hookMs, startMs_ + 100);
-    EXPECT_GE(calls[0].milliseconds + kLogResolutionMs, handler->hookMs);
-    EXPECT_GE(calls[1].milliseconds, calls[0].milliseconds + 900);
-    EXPECT_GE(endMs_, calls[2].milliseconds);
+    EXPECT_GE(calls[0].first + kLogResolutionMs, handler->hookMs);
+    EXPECT_GE(calls[1].first, calls[0].first + 900);
+    EXPECT_GE(endMs_, calls[2].first);
     EXPECT_EQ("ToggleNIC", handler->threadName);
     EXPECT_TRUE(handler->sawChangesAndDevice);
 }
 
 TEST_F(DeferredTaskTest, DisabledAdapterStaysDownAndNoAdapterMeansNoToggle) {
     RunTask(true, true, "mode=1 media=8");
-    const std::vector<LoggedCall> calls = TimedCallLog();
+    const auto calls = TimedCallLog();
     ASSERT_EQ(1u, calls.size());
-    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].call);
-    EXPECT_GE(calls[0].milliseconds + kLogResolutionMs, startMs_ + 100);
+    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].second);
+    EXPECT_GE(calls[0].first + kLogResolutionMs, startMs_ + 100);
 
     EXPECT_GE(RunTask(false, false, "mode=2 media=8")->hookMs, startMs_ + 100);
     EXPECT_TRUE(CallLog().empty());

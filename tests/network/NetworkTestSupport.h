@@ -110,19 +110,19 @@ class NetworkTest : public ::testing::Test, public kest::test::sim::SimSysroot {
 
     void ClearCallLog() const { sysroot_.WriteFile(kest::test::sim::kCallLogPath, ""); }
 
-    // The Ethernet handler of the controller's first device.
-    static CountedPtr<EthernetItemHandler> MakeHandler() {
+    // The controller's one device.
+    static CountedPtr<vq::targetcfg::IDeviceHandler> FirstDevice() {
         vq::dsc::Vector<vq::targetcfg::IDeviceHandler*> devices;
         vq::targetcfg::GetDeviceHandlers(devices);
-        CountedPtr<EthernetItemHandler> handler;
-        if (!devices.empty()) {
-            handler =
-                MakeCounted<EthernetItemHandler>(L"eth0", L"Ethernet Adapter eth0", devices[0]);
-        }
-        for (vq::targetcfg::IDeviceHandler* device : devices) {
-            device->Release();
-        }
-        return handler;
+        EXPECT_EQ(1u, devices.size());
+        return CountedPtr<vq::targetcfg::IDeviceHandler>(devices.empty() ? nullptr : devices[0],
+                                                         kAdoptReference);
+    }
+
+    // The Ethernet handler of the controller's first device.
+    static CountedPtr<EthernetItemHandler> MakeHandler() {
+        return MakeCounted<EthernetItemHandler>(L"eth0", L"Ethernet Adapter eth0",
+                                                FirstDevice().Get());
     }
 
     // The logged calls whose names begin with `prefix`.

@@ -8,10 +8,7 @@
 #include <unistd.h>
 
 #include <cstdio>
-#include <fstream>
-#include <iterator>
 #include <string>
-#include <vector>
 
 #include "common/TempSysroot.h"
 #include "support/ExclusiveFileLock.h"
@@ -34,11 +31,8 @@ void ReplaceSettings(const kest::test::TempSysroot& sysroot, const std::string& 
 }
 
 TEST(KestConfigIniTest, ReadsTheSwitchAsTheFileHoldsIt) {
-    struct Case {
-        const char* content;  // null: no file
-        bool enabled;
-    };
-    const Case cases[] = {
+    // The file's content (null: no file) and whether the switch is on.
+    const std::pair<const char*, bool> cases[] = {
         {nullptr, false},
         {"", false},
         {"[WebService]\n", false},
@@ -48,16 +42,16 @@ TEST(KestConfigIniTest, ReadsTheSwitchAsTheFileHoldsIt) {
         {"[WebService]\nEnable = yes\n", false},
         {"[Other]\nEnable = 1\n", false},
     };
-    for (const Case& c : cases) {
+    for (const auto& [content, enabled] : cases) {
         kest::test::TempSysroot sysroot;
-        if (c.content != nullptr) {
-            sysroot.WriteFile(kWebServicePath, c.content);
+        if (content != nullptr) {
+            sysroot.WriteFile(kWebServicePath, content);
         }
         KestConfigIni settings;
-        EXPECT_EQ(c.enabled, settings.IsWebServiceEnabled()) << (c.content ? c.content : "none");
+        EXPECT_EQ(enabled, settings.IsWebServiceEnabled()) << (content ? content : "none");
         sysroot.MakeDirectory("/etc/korvane/share");
-        ReplaceSettings(sysroot, c.enabled ? kDisabledFile : kEnabledFile);
-        EXPECT_EQ(!c.enabled, settings.IsWebServiceEnabled()) << "a change on disk is seen";
+        ReplaceSettings(sysroot, enabled ? kDisabledFile : kEnabledFile);
+        EXPECT_EQ(!enabled, settings.IsWebServiceEnabled()) << "a change on disk is seen";
         ASSERT_EQ(0, unlink(sysroot.PathOf(kWebServicePath).c_str()));
         EXPECT_FALSE(settings.IsWebServiceEnabled()) << "a removed file reads as disabled";
     }
@@ -67,26 +61,27 @@ TEST(KestConfigIniTest, ReadsTheSwitchAsTheFileHoldsIt) {
 // would block a reader) is refused and left as it is; once readable again, saving works.
 TEST(KestConfigIniTest, AFileThatCannotBeReadIsNeverOverwritten) {
     const std::string utf16("\xFF\xFE[\0W\0]\0", 8);
-    for (const char* kind : {"utf16", "directory", "fifo"}) {
+    for (const std::string kind : {"utf16", "directory", "fifo"}) {
         kest::test::TempSysroot sysroot;
         const std::string path = sysroot.PathOf(kWebServicePath);
         sysroot.WriteFile(kWebServicePath, utf16);
-        if (std::string(kind) != "utf16") {
+        if (kind != "utf16") {
             ASSERT_EQ(0, unlink(path.c_str()));
-            ASSERT_EQ(0, std::string(kind) == "fifo" ? mkfifo(path.c_str(), 0600)
-                                                     : mkdir(path.c_str(), 0700));
+            ASSERT_EQ(0, kind == "fifo" ? mkfifo(path.c_str(), 0600) : mkdir(path.c_str(), 0700));
         }
         KestConfigIni settings;
         EXPECT_FALSE(settings.IsWebServiceEnabled()) << kind;
         EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(true); })) << kind;
         struct stat status;
         ASSERT_EQ(0, lstat(path.c_str(), &status));
-        if (std::string(kind) == "utf16") {
+        EXPECT_EQ(kind == "utf16"  ? S_IFREG
+                  : kind == "fifo" ? S_IFIFO
+                                   : S_IFDIR,
+                  status.st_mode & S_IFMT);
+        if (kind == "utf16") {
             EXPECT_EQ(utf16, sysroot.ReadFile(kWebServicePath));
-        } else {
-            EXPECT_TRUE(S_ISFIFO(status.st_mode) || S_ISDIR(status.st_mode)) << kind;
-            ASSERT_EQ(0, std::string(kind) == "fifo" ? unlink(path.c_str()) : rmdir(path.c_str()));
         }
+        ASSERT_EQ(0, std::remove(path.c_str()));
         sysroot.WriteFile(kWebServicePath, "; comment\n[Other]\nKey = x\n[WebService]\n");
         settings.SetWebServiceEnabled(true);
         EXPECT_TRUE(settings.IsWebServiceEnabled());
@@ -148,45 +143,6 @@ TEST(KestConfigIniTest, SavesOfSeveralProcessesTakeTurns) {
     close(ready[1]);
     EXPECT_EQ("[Other]\nKey = x\n\n[WebService]\nEnable = 1\n\n",
               sysroot.ReadFile(kWebServicePath));
-}
-
-// Processes switching the web service at the same moment, starting with no file: every save
-// succeeds, and a reader sampling the file never sees it empty, partial or gone once it exists.
-TEST(KestConfigIniTest, ParallelSavesLeaveAWholeFileAtEveryMoment) {
-    constexpr size_t kProcesses = 6;
-    kest::test::TempSysroot sysroot;
-    sysroot.MakeDirectory("/etc/korvane/share");
-    for (size_t p = 0; p < kProcesses; ++p) {
-        if (fork() == 0) {
-            KestConfigIni settings;
-            int failures = 0;
-            for (size_t save = 0; save < 30; ++save) {
-                try {
-                    settings.SetWebServiceEnabled((save + p) % 2 == 0);
-                } catch (long) {
-                    ++failures;
-                }
-            }
-            _exit(failures);
-        }
-    }
-    bool seen = false;
-    std::vector<std::string> bad;
-    std::vector<int> statuses;
-    while (statuses.size() < kProcesses) {
-        std::ifstream file(sysroot.PathOf(kWebServicePath), std::ios::binary);
-        const std::string content{std::istreambuf_iterator<char>(file), {}};
-        if (file.is_open() ? content != kEnabledFile && content != kDisabledFile : seen) {
-            bad.push_back(content);
-        }
-        seen = seen || file.is_open();
-        int status = 0;
-        if (waitpid(-1, &status, WNOHANG) > 0) {
-            statuses.push_back(WIFEXITED(status) ? WEXITSTATUS(status) : -1);
-        }
-    }
-    EXPECT_EQ(std::vector<int>(kProcesses, 0), statuses) << "failed saves per process";
-    EXPECT_TRUE(bad.empty()) << bad.size() << " bad samples, the first: '" << bad.front() << "'";
 }
 
 }  // namespace

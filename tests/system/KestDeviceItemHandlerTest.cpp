@@ -50,30 +50,28 @@ TEST_F(KestDeviceItemHandlerTest, ReportsEveryCatalogueRowWithItsTypeAndValue) {
 }
 
 TEST_F(KestDeviceItemHandlerTest, FormatsDescriptionSerialNumberAndLocaleCodes) {
-    // Two state keys with their values, and the rows they give.
-    const char* cases[][5] = {
-        {"DeviceDescription", "VQ 9100", "SerialNumber", "0x1A2B",
+    // State lines and the rows they give.
+    const std::pair<const char*, const char*> cases[] = {
+        {"DeviceDescription = VQ 9100\nSerialNumber = 0x1A2B",
          "1006000=sVQ 9100;1007000=s00001A2B;"},
-        {"DeviceDescription", "9999", "SerialNumber", "0", "1006000=sVQ 9999;1007000=s00000000;"},
-        {"DeviceDescription", "VQ", "SerialNumber", "4294967295",
-         "1006000=sVQ VQ;1007000=sFFFFFFFF;"},
-        {"DeviceDescription", "VQX", "SerialNumber", "0xabcdef",
-         "1006000=sVQ VQX;1007000=s00ABCDEF;"},
-        {"DeviceDescription", "", "SerialNumber", "16", "1006000=sVQ ;1007000=s00000010;"},
-        {"SupportedLanguages", "English,German,Latin,French", "LanguageName", "French",
+        {"DeviceDescription = 9999\nSerialNumber = 0", "1006000=sVQ 9999;1007000=s00000000;"},
+        {"DeviceDescription = VQ\nSerialNumber = 4294967295", "1006000=sVQ VQ;1007000=sFFFFFFFF;"},
+        {"DeviceDescription = VQX\nSerialNumber = 0xabcdef", "1006000=sVQ VQX;1007000=s00ABCDEF;"},
+        {"DeviceDescription =\nSerialNumber = 16", "1006000=sVQ ;1007000=s00000010;"},
+        {"SupportedLanguages = English,German,Latin,French\nLanguageName = French",
          "d11d000=sfr;d11e000=sen,de,,fr;"},
-        {"SupportedLanguages", "English,German,Latin,French", "LanguageName", "Latin",
+        {"SupportedLanguages = English,German,Latin,French\nLanguageName = Latin",
          "d11d000=s;d11e000=sen,de,,fr;"},
-        {"SupportedLanguages", "English,,German", "LanguageName", "English",
+        {"SupportedLanguages = English,,German\nLanguageName = English",
          "d11d000=sen;d11e000=sen;"},
-        {"SupportedLanguages", "Japanese,Korean,Chinese", "LanguageName", "Korean",
+        {"SupportedLanguages = Japanese,Korean,Chinese\nLanguageName = Korean",
          "d11d000=skr;d11e000=sja,kr,zh;"},
-        {"SupportedLanguages", "", "LanguageName", "Chinese", "d11d000=szh;d11e000=s;"},
+        {"SupportedLanguages =\nLanguageName = Chinese", "d11d000=szh;d11e000=s;"},
     };
-    for (const auto& c : cases) {
-        WriteState(kest::test::system::SystemState({{c[0], c[1]}, {c[2], c[3]}}));
-        ASSERT_EQ(S_OK, ReadCatalogue()) << c[1];
-        EXPECT_THAT(Listing(bag_.Get()), ::testing::HasSubstr(c[4])) << c[1] << " " << c[3];
+    for (const auto& [state, rows] : cases) {
+        WriteState(kest::test::system::SystemState(state));
+        ASSERT_EQ(S_OK, ReadCatalogue()) << state;
+        EXPECT_THAT(Listing(bag_.Get()), ::testing::HasSubstr(rows)) << state;
     }
 }
 
@@ -95,9 +93,8 @@ TEST_F(KestDeviceItemHandlerTest, FailuresEndTheCatalogue) {
         {"Klingon", "None", E_FAIL, 0x0103D000, 0x0D11D000},
     };
     for (const Case& c : cases) {
-        WriteState(kest::test::system::SystemState(
-            {{"LanguageName", c.language}},
-            std::string("[Faults]\n") + c.failingCall + " = -375501\n"));
+        WriteState(kest::test::system::SystemState(std::string("LanguageName = ") + c.language +
+                                                   "\n[Faults]\n" + c.failingCall + " = -375501"));
         EXPECT_EQ(c.status, ReadCatalogue()) << c.failingCall;
         EXPECT_EQ(S_OK, bag_->HasTag(c.lastWritten)) << c.failingCall;
         EXPECT_EQ(S_FALSE, bag_->HasTag(c.firstMissing)) << c.failingCall;
@@ -155,8 +152,7 @@ TEST_F(KestDeviceItemHandlerTest, RefreshWritesTheRequestedTimeAndDnsNameBeforeT
 }
 
 TEST_F(KestDeviceItemHandlerTest, ARefreshWhoseDnsNameFailsWritesNoCatalogue) {
-    WriteState(
-        kest::test::system::SystemState({}, "[Faults]\nGetFullyQualifiedDNSName = -375501\n"));
+    WriteState(kest::test::system::SystemState("[Faults]\nGetFullyQualifiedDNSName = -375501"));
     ASSERT_EQ(S_OK, ReadCatalogue());
     CountedPtr<IuxSysPropertyBag4> refreshed = CreatePropertyBag();
     const uint32_t requested[] = {0x0D114000};

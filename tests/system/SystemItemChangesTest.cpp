@@ -36,7 +36,6 @@ class SystemItemChangesTest : public ::testing::Test, public kest::test::system:
         return handler_->PersistPropertyChanges(changes_.Get(), persistFlag_, device,
                                                 adapterDisabled);
     }
-    std::wstring Message() const { return message_.Get() ? message_.Get() : L"(none)"; }
 
     CountedPtr<KestDeviceItemHandler> handler_ = MakeCounted<KestDeviceItemHandler>();
     CountedPtr<IuxSysPropertyBag4> changes_ = CreatePropertyBag();
@@ -96,7 +95,7 @@ TEST_F(SystemItemChangesTest, StopsAtTheFirstRejectionWithItsStatusAndMessage) {
         }
         changes_->SetBool(0x7FFFF000, 1);
         EXPECT_EQ(c.status, Validate()) << c.name;
-        EXPECT_EQ(c.message, Message()) << c.name;
+        EXPECT_EQ(c.message, std::wstring(message_.Get() ? message_.Get() : L"(none)")) << c.name;
         EXPECT_EQ(PropertyTagSet{tags::kHostName}, validated_) << c.name;
         EXPECT_EQ(c.status, handler_->ValidatePropertyChanges(changes_.Get(), validated_, nullptr))
             << c.name << " without message slot";
@@ -114,43 +113,63 @@ TEST_F(SystemItemChangesTest, NothingModifiedIsNothingToDo) {
     EXPECT_TRUE(validated_.empty());
 }
 
+// Every change also sets the clock to 2023, last; a new legacy zone corrects it by the difference
+// of the legacy offsets, and a failing change stops before it.
 TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
     struct Case {
         const char* name;
+        const char* state;  // overrides
         uint32_t tag;
         const wchar_t* text;
         uint32_t secondTag;  // 0: none
         const wchar_t* secondText;
         const char* setters;
         int32_t persistFlag;
+        const char* clock;
         HRESULT result = S_OK;
-        const char* faults = "";
     };
+    const char* set = "1700000000 0\n";
+    const char* losAngeles = "SetTimeZone\t0\tAmerica/Los_Angeles\n";
+    const uint32_t legacy = tags::kLegacyTimeZone;
     const Case cases[] = {
-        {"host name and comment", tags::kComment, L"spare", tags::kHostName, L"kest-02",
-         "SetHostName\t0\tkest-02\nSetUserComment\t0\tspare\n", 1},
-        {"comment only", tags::kComment, L"spare", 0, L"", "SetUserComment\t0\tspare\n", 0},
-        {"locale", tags::kLocaleCode, L"fr", 0, L"", "SetLanguageName\t0\tfr\n", 1},
-        {"failing locale after host name", tags::kHostName, L"kest-02", tags::kLocaleCode, L"fr",
-         "SetHostName\t0\tkest-02\nSetLanguageName\t-375523\tfr\n", 1, UX_E_VALUE_INVALID,
-         "[Faults]\nSetLanguageName = -375523\n"},
+        {"host name and comment", "", tags::kComment, L"spare", tags::kHostName, L"kest-02",
+         "SetHostName\t0\tkest-02\nSetUserComment\t0\tspare\n", 1, set},
+        {"comment only", "", tags::kComment, L"spare", 0, L"", "SetUserComment\t0\tspare\n", 0,
+         set},
+        {"locale", "", tags::kLocaleCode, L"fr", 0, L"", "SetLanguageName\t0\tfr\n", 1, set},
+        {"failing locale after host name", "[Faults]\nSetLanguageName = -375523", tags::kHostName,
+         L"kest-02", tags::kLocaleCode, L"fr",
+         "SetHostName\t0\tkest-02\nSetLanguageName\t-375523\tfr\n", 1, "", UX_E_VALUE_INVALID},
         // Persisting without validating first: a rejected value stops everything.
-        {"host name with a line break", tags::kHostName, L"kest\n02; reboot", 0, L"", "", 0,
+        {"host name with a line break", "", tags::kHostName, L"kest\n02; reboot", 0, L"", "", 0, "",
          UX_E_HOSTNAME_INVALID},
-        {"Olson zone leading out", tags::kOlsonTimeZone, L"../x", 0, L"", "", 0,
+        {"Olson zone leading out", "", tags::kOlsonTimeZone, L"../x", 0, L"", "", 0, "",
          UX_E_VALUE_INVALID},
-        {"control character in a comment after a good host name", tags::kHostName, L"kest-02",
-         tags::kComment, L"rack\x7f", "", 0, UX_E_VALUE_INVALID},
-        {"unsupported locale", tags::kLocaleCode, L"xx", 0, L"", "", 0, UX_E_VALUE_INVALID},
-        {"Olson zone", tags::kOlsonTimeZone, L"Europe/Berlin", 0, L"",
-         "SetTimeZone\t0\tEurope/Berlin\n", 0},
-        {"unchanged legacy zone", tags::kLegacyTimeZone, L"CST6CDT", 0, L"", "", 0},
+        {"control character in a comment after a good host name", "", tags::kHostName, L"kest-02",
+         tags::kComment, L"rack\x7f", "", 0, "", UX_E_VALUE_INVALID},
+        {"unsupported locale", "", tags::kLocaleCode, L"xx", 0, L"", "", 0, "", UX_E_VALUE_INVALID},
+        {"Olson zone", "", tags::kOlsonTimeZone, L"Europe/Berlin", 0, L"",
+         "SetTimeZone\t0\tEurope/Berlin\n", 0, set},
+        {"unchanged legacy zone", "", legacy, L"CST6CDT", 0, L"", "", 0, "1700021600 0\n"},
+        {"Olson to legacy", "", legacy, L"PST8PDT", 0, L"", losAngeles, 0, "1700028800 0\n"},
+        {"legacy to legacy", "TimeZone = EST5EDT", legacy, L"PST8PDT", 0, L"", losAngeles, 0,
+         "1700010800 0\n"},
+        {"legacy eastwards", "TimeZone = PST8PDT", legacy, L"EST5EDT", 0, L"",
+         "SetTimeZone\t0\tAmerica/New_York\n", 0, "1699989200 0\n"},
+        // Spellings the time-zone table accepts get the same correction.
+        {"lower case", "", legacy, L"pst8pdt", 0, L"", losAngeles, 0, "1700028800 0\n"},
+        {"blanks", "", legacy, L" PST8PDT  ", 0, L"", losAngeles, 0, "1700028800 0\n"},
+        {"mixed", "TimeZone = EST5EDT", legacy, L"  Pst8Pdt ", 0, L"", losAngeles, 0,
+         "1700010800 0\n"},
+        {"unknown legacy zone", "", legacy, L"XYZ1", 0, L"", "", 0, "", UX_E_VALUE_INVALID},
     };
     sysroot_.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
-        WriteState(kest::test::system::SystemState({}, c.faults));
+        WriteState(kest::test::system::SystemState(c.state));
         sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
+        sysroot_.WriteFile(kest::test::system::kClockFile, "");
         changes_ = CreatePropertyBag();
+        changes_->SetTimestamp(tags::kCurrentTime, k2023);
         changes_->SetString(c.tag, c.text);
         if (c.secondTag != 0) {
             changes_->SetString(c.secondTag, c.secondText);
@@ -159,6 +178,7 @@ TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
         EXPECT_EQ(c.result, Persist()) << c.name;
         EXPECT_EQ(c.setters, SetterCalls()) << c.name;
         EXPECT_EQ(c.persistFlag, persistFlag_) << c.name;
+        EXPECT_EQ(c.clock, Clock()) << c.name;
     }
 }
 
@@ -181,41 +201,6 @@ TEST_F(SystemItemChangesTest, SavesTheWebServiceSwitchThenSetsTheClock) {
               sysroot_.ReadFile(kest::test::system::kHardwareClockLog))
         << "the switch was saved when the hardware clock was written";
     EXPECT_EQ(1, persistFlag_);
-}
-
-// The clock is corrected by the difference of the legacy offsets; a failing zone change stops
-// before the clock.
-TEST_F(SystemItemChangesTest, CorrectsTheClockByTheLegacyOffsetDifference) {
-    struct Case {
-        const char* currentZone;
-        const wchar_t* newLegacyText;
-        const char* clock;
-        const char* setters;
-        HRESULT result = S_OK;
-    };
-    const char* losAngeles = "SetTimeZone\t0\tAmerica/Los_Angeles\n";
-    const Case cases[] = {
-        {"America/Chicago", L"PST8PDT", "1700028800 0\n", losAngeles},
-        {"EST5EDT", L"PST8PDT", "1700010800 0\n", losAngeles},
-        {"PST8PDT", L"EST5EDT", "1699989200 0\n", "SetTimeZone\t0\tAmerica/New_York\n"},
-        // Spellings the time-zone table accepts get the same correction.
-        {"America/Chicago", L"pst8pdt", "1700028800 0\n", losAngeles},
-        {"America/Chicago", L" PST8PDT  ", "1700028800 0\n", losAngeles},
-        {"EST5EDT", L"  Pst8Pdt ", "1700010800 0\n", losAngeles},
-        {"America/Chicago", L"XYZ1", "", "", UX_E_VALUE_INVALID},
-    };
-    for (const Case& c : cases) {
-        WriteState(kest::test::system::SystemState({{"TimeZone", c.currentZone}}));
-        sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
-        sysroot_.WriteFile(kest::test::system::kClockFile, "");
-        changes_ = CreatePropertyBag();
-        changes_->SetTimestamp(tags::kCurrentTime, k2023);
-        changes_->SetString(tags::kLegacyTimeZone, c.newLegacyText);
-        EXPECT_EQ(c.result, Persist()) << c.currentZone;
-        EXPECT_EQ(c.clock, Clock()) << c.currentZone;
-        EXPECT_EQ(c.setters, SetterCalls()) << c.currentZone;
-        EXPECT_EQ(0, persistFlag_);
-    }
 }
 
 }  // namespace

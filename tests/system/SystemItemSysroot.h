@@ -3,8 +3,8 @@
 #pragma once
 
 #include <cstdint>
-#include <map>
 #include <regex>
+#include <sstream>
 #include <string>
 
 #include "common/ChassisTestTags.h"
@@ -19,22 +19,21 @@ constexpr char kHardwareClockLog[] = "/hwclock.log";
 constexpr char kClockFile[] = "/run/kest/system-clock";
 
 // The [System] section of a controller with a description, identity, languages and an Olson time
-// zone; `overrides` replace or add keys, `extra` follows the section (for example a [Faults]
-// section).
-inline std::string SystemState(const std::map<std::string, std::string>& overrides = {},
-                               const std::string& extra = "") {
+// zone; each "Key = value" line of `overrides` replaces the line of that key or, for a new key,
+// is added (a "[Faults]" section, too).
+inline std::string SystemState(const std::string& overrides = "") {
     std::string state =
         "[System]\nDeviceDescription = KEST 9100\nTargetClass = KEST\nHostName = kest-01\n"
         "TargetID = 77\nSerialNumber = 6699\nUserComment = rack 4\nLanguageName = German\n"
         "SupportedLanguages = English,German,French\nTimeZone = America/Chicago\n"
         "TimezoneOffset = -360\nFullyQualifiedDNSName = kest-01.example.net\n";
-    for (const auto& [key, value] : overrides) {
-        const std::regex line("\n" + key + " = [^\n]*");
-        state = std::regex_search(state, line)
-                    ? std::regex_replace(state, line, "\n" + key + " = " + value)
-                    : state + key + " = " + value + "\n";
+    std::istringstream lines(overrides);
+    for (std::string line; std::getline(lines, line);) {
+        const std::regex key("\n" + line.substr(0, line.find(' ')) + " = [^\n]*");
+        state = std::regex_search(state, key) ? std::regex_replace(state, key, "\n" + line)
+                                              : state + line + "\n";
     }
-    return state + extra;
+    return state;
 }
 
 // A small table: two legacy texts and three Olson names.
