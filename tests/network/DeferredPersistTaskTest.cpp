@@ -2,7 +2,7 @@
 // adapter, failures on its thread, and waiting for it when the last reference goes.
 #include <gmock/gmock.h>
 #include <pthread.h>
-#include <time.h>
+#include <chrono>
 #include <cstdlib>
 
 #include "NetworkTestSupport.h"
@@ -15,10 +15,11 @@ namespace {
 
 using ::testing::ElementsAre;
 
+// Milliseconds on the clock the call log uses (CLOCK_MONOTONIC).
 double MonotonicMs() {
-    timespec now{};
-    clock_gettime(CLOCK_MONOTONIC, &now);
-    return static_cast<double>(now.tv_sec) * 1000.0 + static_cast<double>(now.tv_nsec) / 1e6;
+    return std::chrono::duration<double, std::milli>(
+               std::chrono::steady_clock::now().time_since_epoch())
+        .count();
 }
 
 // The log keeps three decimals, so a logged time may lie up to 1 µs before the call.

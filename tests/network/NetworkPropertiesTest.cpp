@@ -19,18 +19,15 @@ constexpr char kIdentity[] =
 
 class PropertiesTest : public NetworkTest {
   protected:
-    std::string Properties(const std::string& stateOverrides) {
-        WriteState(AdapterState(stateOverrides));
+    // The catalogue of the adapter in the state with `overrides`, or only the rows a refresh of
+    // `requested` writes.
+    std::string Properties(const std::string& overrides, std::vector<uint32_t> requested = {}) {
+        WriteState(AdapterState(overrides));
         CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-        EXPECT_EQ(S_OK, MakeHandler()->GetItemProperties(bag.Get()));
-        return Listing(bag.Get());
-    }
-
-    std::string Refreshed(std::vector<uint32_t> requested) {
-        WriteState(AdapterState());
-        CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-        EXPECT_EQ(S_OK, MakeHandler()->RefreshProperties(static_cast<uint32_t>(requested.size()),
-                                                         requested.data(), bag.Get()));
+        EXPECT_EQ(S_OK, requested.empty() ? MakeHandler()->GetItemProperties(bag.Get())
+                                          : MakeHandler()->RefreshProperties(
+                                                static_cast<uint32_t>(requested.size()),
+                                                requested.data(), bag.Get()));
         return Listing(bag.Get());
     }
 };
@@ -84,13 +81,13 @@ TEST_F(PropertiesTest, FailedTestedCallAbortsKeepingEarlierRows) {
 }
 
 TEST_F(PropertiesTest, RefreshRewritesOnlyForItsOwnTags) {
-    EXPECT_EQ("", Refreshed({tags::kMacAddress, tags::kSupportedAdapterModes}));
-    const std::string network = Refreshed({tags::kGateway | 0x123});
+    EXPECT_EQ("", Properties("", {tags::kMacAddress, tags::kSupportedAdapterModes}));
+    const std::string network = Properties("", {tags::kGateway | 0x123});
     EXPECT_THAT(network, HasSubstr("1038000=b1;1039000=l1;103a000=u5;d104000="));
     EXPECT_THAT(network, Not(HasSubstr("d102000")));
     EXPECT_EQ("d102000=u2;d103000=ub;d119000=u3;d11a000=u1;d12c000=u1;",
-              Refreshed({tags::kPollingMode}));
-    EXPECT_THAT(Refreshed({tags::kPollingMode, tags::kPrimaryAdapter}),
+              Properties("", {tags::kPollingMode}));
+    EXPECT_THAT(Properties("", {tags::kPollingMode, tags::kPrimaryAdapter}),
                 HasSubstr("d102000=u2;d103000=ub;d104000="));
 }
 

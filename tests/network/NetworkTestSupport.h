@@ -6,12 +6,13 @@
 #include <gtest/gtest.h>
 
 #include <mutex>
-#include <regex>
 #include <sstream>
 #include <string>
 #include <vector>
 
 #include "common/ChassisTestTags.h"
+#include "common/StateText.h"
+#include "common/StatusOf.h"
 #include "network/EthernetItemHandler.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "sim/SimFixture.h"
@@ -21,22 +22,16 @@ namespace kest::test::network {
 
 // The adapter's state; each "Key = value" line of `overrides` replaces the line of that key or,
 // for a new key, is added (a "[Faults]" section, too).
-inline std::string AdapterState(const std::string& overrides = "", int primaryIndex = 0) {
-    std::string state = "[Network]\nPrimaryDeviceIndex = " + std::to_string(primaryIndex) +
-                        "\n[Device0]\nType = 1\nInterfaceName = eth0\nIndex = 0\n"
-                        "MACAddress = 00:80:2F:12:34:56\nMode = 2\nSupportedModes = 0x0B\n"
-                        "RequestMode = 1\nSupportedRequestModes = 0x3\nIPAddress = 192.168.1.10\n"
-                        "SubnetMask = 255.255.255.0\nGateway = 192.168.1.1\n"
-                        "DNSServer = 192.168.1.2\nSupportedMediaModes = 0x7F\n"
-                        "CurrentMediaMode = 4\nPreferredMediaMode = 4\nSupportedPollingModes = 3\n"
-                        "PollingMode = 1\nPollingInterval = 100\nInterfaceUp = 1\nAdapterUp = 1\n";
-    std::istringstream lines(overrides);
-    for (std::string line; std::getline(lines, line);) {
-        const std::regex key("(^|\n)" + line.substr(0, line.find(' ')) + " = [^\n]*");
-        state = std::regex_search(state, key) ? std::regex_replace(state, key, "$1" + line)
-                                              : state + line + "\n";
-    }
-    return state;
+inline std::string AdapterState(const std::string& overrides = "") {
+    std::string state =
+        "[Network]\nPrimaryDeviceIndex = 0\n[Device0]\nType = 1\nInterfaceName = eth0\nIndex = 0\n"
+        "MACAddress = 00:80:2F:12:34:56\nMode = 2\nSupportedModes = 0x0B\n"
+        "RequestMode = 1\nSupportedRequestModes = 0x3\nIPAddress = 192.168.1.10\n"
+        "SubnetMask = 255.255.255.0\nGateway = 192.168.1.1\n"
+        "DNSServer = 192.168.1.2\nSupportedMediaModes = 0x7F\n"
+        "CurrentMediaMode = 4\nPreferredMediaMode = 4\nSupportedPollingModes = 3\n"
+        "PollingMode = 1\nPollingInterval = 100\nInterfaceUp = 1\nAdapterUp = 1\n";
+    return kest::test::WithOverrides(state, overrides);
 }
 
 // Writes `rows` into `bag`, each a blank-separated "name=value": names primary and flag are
@@ -47,24 +42,17 @@ inline void WriteRows(IuxSysPropertyBag* bag, const std::string& rows) {
         uint32_t tag;
         char kind;  // b boolean, u number, t text
     };
+    // clang-format off
     static const Row kRows[] = {
-        {"primary", tags::kPrimaryAdapter, 'b'},
-        {"flag", tags::kEtherCATFlag, 'b'},
-        {"ip", tags::kIPAddress, 't'},
-        {"mask", tags::kSubnetMask, 't'},
-        {"gw", tags::kGateway, 't'},
-        {"dns", tags::kDnsServer, 't'},
-        {"mac", tags::kMacAddress, 't'},
-        {"name", tags::kItemName, 't'},
-        {"mode", tags::kAdapterMode, 'u'},
-        {"modes", tags::kSupportedAdapterModes, 'u'},
-        {"req", tags::kRequestMode, 'u'},
-        {"media", tags::kPreferredMediaMode, 'u'},
-        {"id", tags::kEtherCATMasterId, 'u'},
-        {"polling", tags::kPollingMode, 'u'},
-        {"pollmodes", tags::kSupportedPollingModes, 'u'},
-        {"interval", tags::kPollingInterval, 'u'},
-    };
+        {"primary", tags::kPrimaryAdapter, 'b'}, {"flag", tags::kEtherCATFlag, 'b'},
+        {"ip", tags::kIPAddress, 't'}, {"mask", tags::kSubnetMask, 't'},
+        {"gw", tags::kGateway, 't'}, {"dns", tags::kDnsServer, 't'},
+        {"mac", tags::kMacAddress, 't'}, {"name", tags::kItemName, 't'},
+        {"mode", tags::kAdapterMode, 'u'}, {"modes", tags::kSupportedAdapterModes, 'u'},
+        {"req", tags::kRequestMode, 'u'}, {"media", tags::kPreferredMediaMode, 'u'},
+        {"id", tags::kEtherCATMasterId, 'u'}, {"polling", tags::kPollingMode, 'u'},
+        {"pollmodes", tags::kSupportedPollingModes, 'u'}, {"interval", tags::kPollingInterval, 'u'}};
+    // clang-format on
     std::istringstream tokens(rows);
     for (std::string token; tokens >> token;) {
         const bool remove = token[0] == '-';
@@ -94,15 +82,7 @@ inline CountedPtr<IuxSysPropertyBag4> MakeBag(const std::string& rows) {
     return bag;
 }
 
-// The status `call` returns or throws (as a long).
-template <class Call>
-HRESULT StatusOf(Call&& call) {
-    try {
-        return call();
-    } catch (long thrown) {
-        return static_cast<HRESULT>(thrown);
-    }
-}
+using kest::test::StatusOf;
 
 class NetworkTest : public ::testing::Test, public kest::test::sim::SimSysroot {
   protected:
@@ -125,13 +105,11 @@ class NetworkTest : public ::testing::Test, public kest::test::sim::SimSysroot {
                                                 FirstDevice().Get());
     }
 
-    // The logged calls whose names begin with `prefix`.
-    std::vector<std::string> Calls(const std::string& prefix) const {
-        std::vector<std::string> calls;
+    // The logged calls whose names begin with `prefix`, one a line.
+    std::string Calls(const std::string& prefix) const {
+        std::string calls;
         for (const std::string& call : CallLog()) {
-            if (call.compare(0, prefix.size(), prefix) == 0) {
-                calls.push_back(call);
-            }
+            calls += call.compare(0, prefix.size(), prefix) == 0 ? call + "\n" : "";
         }
         return calls;
     }

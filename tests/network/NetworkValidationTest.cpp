@@ -108,20 +108,20 @@ INSTANTIATE_TEST_SUITE_P(
         Case{"PollingUnknown", "polling=3 pollmodes=0xF", UX_E_VALUE_INVALID}),
     [](const ::testing::TestParamInfo<Case>& testCase) { return testCase.param.name; });
 
+// The network rules accept their tags and the Ethernet rules theirs; making the adapter primary
+// is a change of its own, checked alone by the network rules.
 TEST_F(NetworkTest, AcceptedChangesListTheNetworkAndEthernetTags) {
     WriteState(AdapterState());
-    CountedPtr<IuxSysPropertyBag4> bag =
-        MakeBag(std::string(kStaticPrimary) + "media=4 mac=x id=5 flag=1");
     PropertyTagSet validated;
-    EXPECT_EQ(S_OK, MakeHandler()->ValidatePropertyChanges(bag.Get(), validated, nullptr));
+    EXPECT_EQ(S_OK, MakeHandler()->ValidatePropertyChanges(
+                        MakeBag(std::string(kStaticPrimary) + "media=4 mac=x id=5 flag=1").Get(),
+                        validated, nullptr));
     EXPECT_THAT(validated, ElementsAre(tags::kAdapterMode, tags::kRequestMode, tags::kIPAddress,
                                        tags::kSubnetMask, tags::kGateway, tags::kDnsServer,
                                        tags::kPreferredMediaMode, tags::kEtherCATMasterId,
                                        tags::kPrimaryAdapter, tags::kEtherCATFlag));
-}
 
-TEST_F(NetworkTest, MakingTheAdapterPrimaryAcceptsOnlyThatFlag) {
-    WriteState(AdapterState("", 1));
+    WriteState(AdapterState("PrimaryDeviceIndex = 1"));
     CountedPtr<IuxSysPropertyBag4> bag = MakeBag(std::string(kStaticPrimary) + "ip=0.0.0.0");
     CountedPtr<EthernetItemHandler> handler = MakeHandler();
     PropertyTagSet network;
@@ -130,7 +130,6 @@ TEST_F(NetworkTest, MakingTheAdapterPrimaryAcceptsOnlyThatFlag) {
               handler->NetworkItemHandler::ValidatePropertyChanges(bag.Get(), network, nullptr));
     EXPECT_EQ(S_OK, handler->ValidatePropertyChanges(bag.Get(), ethernet, nullptr));
     EXPECT_THAT(network, ElementsAre(tags::kPrimaryAdapter));
-    // The Ethernet rules still run after the shortcut.
     EXPECT_THAT(ethernet, ElementsAre(tags::kAdapterMode, tags::kPrimaryAdapter));
 }
 

@@ -10,6 +10,7 @@
 #include <cstdio>
 #include <string>
 
+#include "common/StatusOf.h"
 #include "common/TempSysroot.h"
 #include "support/ExclusiveFileLock.h"
 #include "system/SystemItemSysroot.h"
@@ -17,8 +18,8 @@
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
+using kest::test::StatusOf;
 using kest::test::system::kWebServicePath;
-using kest::test::system::ThrownStatus;
 
 constexpr char kEnabledFile[] = "[WebService]\nEnable = 1\n\n";
 constexpr char kDisabledFile[] = "[WebService]\nEnable = 0\n\n";
@@ -71,7 +72,7 @@ TEST(KestConfigIniTest, AFileThatCannotBeReadIsNeverOverwritten) {
         }
         KestConfigIni settings;
         EXPECT_FALSE(settings.IsWebServiceEnabled()) << kind;
-        EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(true); })) << kind;
+        EXPECT_EQ(E_FAIL, StatusOf([&] { settings.SetWebServiceEnabled(true); })) << kind;
         struct stat status;
         ASSERT_EQ(0, lstat(path.c_str(), &status));
         EXPECT_EQ(kind == "utf16"  ? S_IFREG
@@ -103,7 +104,7 @@ TEST(KestConfigIniTest, AFailedSaveKeepsTheFileAndForgetsTheChange) {
         rlimit limit{0, 0};
         setrlimit(RLIMIT_FSIZE, &limit);
         KestConfigIni settings;
-        const bool refused = ThrownStatus([&] { settings.SetWebServiceEnabled(false); }) == E_FAIL;
+        const bool refused = StatusOf([&] { settings.SetWebServiceEnabled(false); }) == E_FAIL;
         _exit(refused && settings.IsWebServiceEnabled() ? 0 : 1);
     }
     int status = 0;
@@ -114,7 +115,7 @@ TEST(KestConfigIniTest, AFailedSaveKeepsTheFileAndForgetsTheChange) {
     kest::test::TempSysroot blocked;
     blocked.WriteFile("/etc/korvane/share", "");
     KestConfigIni settings;
-    EXPECT_EQ(E_FAIL, ThrownStatus([&] { settings.SetWebServiceEnabled(true); }));
+    EXPECT_EQ(E_FAIL, StatusOf([&] { settings.SetWebServiceEnabled(true); }));
     EXPECT_FALSE(settings.IsWebServiceEnabled());
 }
 

@@ -4,8 +4,10 @@
 
 #include <map>
 #include <string>
+#include <tuple>
 
 #include "common/BagListing.h"
+#include "common/StatusOf.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/AbsTime.h"
 #include "support/TextConversion.h"
@@ -16,7 +18,7 @@ namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {
 
 using kest::test::Listing;
-using kest::test::system::ThrownStatus;
+using kest::test::StatusOf;
 
 constexpr char kCatalogue[] =
     "1001000=b1;1002000=u0;1003000=u1092;1004000=sKorvane;1005000=u4d;1006000=sVQ KEST 9100;"
@@ -78,32 +80,25 @@ TEST_F(KestDeviceItemHandlerTest, FormatsDescriptionSerialNumberAndLocaleCodes) 
 // A failing library call (or an unknown current language) ends the catalogue after the rows
 // before it, with the call's status.
 TEST_F(KestDeviceItemHandlerTest, FailuresEndTheCatalogue) {
-    struct Case {
-        const char* language;
-        const char* failingCall;
-        HRESULT status;
-        uint32_t lastWritten;
-        uint32_t firstMissing;
+    // State lines, the status, the last row written and the first row missing.
+    const std::tuple<const char*, HRESULT, uint32_t, uint32_t> cases[] = {
+        {"[Faults]\nGetDeviceDescription = -375501", E_UNEXPECTED, 0x01002000, 0x01006000},
+        {"[Faults]\nGetTargetClass = -375501", E_UNEXPECTED, 0x01005000, 0x0103C000},
+        {"[Faults]\nGetHostName = -375501", E_UNEXPECTED, 0x01007000, 0x0103D000},
+        {"[Faults]\nGetTimeZone = -375501", E_UNEXPECTED, 0x0D12B000, 0x0D120000},
+        {"LanguageName = Klingon", E_FAIL, 0x0103D000, 0x0D11D000},
     };
-    const Case cases[] = {
-        {"German", "GetDeviceDescription", E_UNEXPECTED, 0x01002000, 0x01006000},
-        {"German", "GetTargetClass", E_UNEXPECTED, 0x01005000, 0x0103C000},
-        {"German", "GetHostName", E_UNEXPECTED, 0x01007000, 0x0103D000},
-        {"German", "GetTimeZone", E_UNEXPECTED, 0x0D12B000, 0x0D120000},
-        {"Klingon", "None", E_FAIL, 0x0103D000, 0x0D11D000},
-    };
-    for (const Case& c : cases) {
-        WriteState(kest::test::system::SystemState(std::string("LanguageName = ") + c.language +
-                                                   "\n[Faults]\n" + c.failingCall + " = -375501"));
-        EXPECT_EQ(c.status, ReadCatalogue()) << c.failingCall;
-        EXPECT_EQ(S_OK, bag_->HasTag(c.lastWritten)) << c.failingCall;
-        EXPECT_EQ(S_FALSE, bag_->HasTag(c.firstMissing)) << c.failingCall;
-        EXPECT_EQ(S_FALSE, bag_->HasTag(0x21004000)) << c.failingCall;
+    for (const auto& [state, status, lastWritten, firstMissing] : cases) {
+        WriteState(kest::test::system::SystemState(state));
+        EXPECT_EQ(status, ReadCatalogue()) << state;
+        EXPECT_EQ(S_OK, bag_->HasTag(lastWritten)) << state;
+        EXPECT_EQ(S_FALSE, bag_->HasTag(firstMissing)) << state;
+        EXPECT_EQ(S_FALSE, bag_->HasTag(tags::kWebServiceEnabled)) << state;
     }
     EXPECT_EQ(E_POINTER, handler_->GetItemProperties(nullptr));
 }
 
-TEST_F(KestDeviceItemHandlerTest, ReadsTheFirstLineOfTheVersionFileOnce) {
+TEST_F(KestDeviceItemHandlerTest, ReadsTheFirstLineOfTheVersionFileOnceAndNeedsIt) {
     const std::pair<std::string, std::string> cases[] = {
         {"22.5.0\nbuild 17\n", "102f000=s22.5.0;"},
         {"", "102f000=s;"},
@@ -117,13 +112,11 @@ TEST_F(KestDeviceItemHandlerTest, ReadsTheFirstLineOfTheVersionFileOnce) {
         ASSERT_EQ(S_OK, handler_->GetItemProperties(bag_.Get()));
         EXPECT_THAT(Listing(bag_.Get()), ::testing::HasSubstr(row));
     }
-}
-
-TEST_F(KestDeviceItemHandlerTest, ConstructionFailsWithoutAReadableVersionFile) {
+    // Without a readable version file there is no handler.
     std::remove(sysroot_.PathOf("/etc/korvane/version").c_str());
-    EXPECT_EQ(E_FAIL, ThrownStatus([] { MakeCounted<KestDeviceItemHandler>(); }));
+    EXPECT_EQ(E_FAIL, StatusOf([] { MakeCounted<KestDeviceItemHandler>(); }));
     sysroot_.MakeDirectory("/etc/korvane/version");
-    EXPECT_EQ(E_FAIL, ThrownStatus([] { MakeCounted<KestDeviceItemHandler>(); }));
+    EXPECT_EQ(E_FAIL, StatusOf([] { MakeCounted<KestDeviceItemHandler>(); }));
 }
 
 TEST_F(KestDeviceItemHandlerTest, RefreshWritesTheRequestedTimeAndDnsNameBeforeTheCatalogue) {

@@ -3,11 +3,10 @@
 #pragma once
 
 #include <cstdint>
-#include <regex>
-#include <sstream>
 #include <string>
 
 #include "common/ChassisTestTags.h"
+#include "common/StateText.h"
 #include "sim/SimFixture.h"
 #include "uxsys/StatusCodes.h"
 
@@ -27,13 +26,7 @@ inline std::string SystemState(const std::string& overrides = "") {
         "TargetID = 77\nSerialNumber = 6699\nUserComment = rack 4\nLanguageName = German\n"
         "SupportedLanguages = English,German,French\nTimeZone = America/Chicago\n"
         "TimezoneOffset = -360\nFullyQualifiedDNSName = kest-01.example.net\n";
-    std::istringstream lines(overrides);
-    for (std::string line; std::getline(lines, line);) {
-        const std::regex key("\n" + line.substr(0, line.find(' ')) + " = [^\n]*");
-        state = std::regex_search(state, key) ? std::regex_replace(state, key, "\n" + line)
-                                              : state + line + "\n";
-    }
-    return state;
+    return kest::test::WithOverrides(state, overrides);
 }
 
 // A small table: two legacy texts and three Olson names.
@@ -41,18 +34,6 @@ constexpr char kSmallTimeZoneTable[] =
     "[LegacyToOlson]\nCST6CDT = America/Chicago\nPST8PDT = America/Los_Angeles\n"
     "EST5EDT = America/New_York\n[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n"
     "America/Los_Angeles = PST8PDT\nAmerica/New_York = EST5EDT\n";
-
-// Runs `call`, expecting it to throw a status (a long); returns that status.
-template <class Call>
-HRESULT ThrownStatus(Call&& call) {
-    try {
-        call();
-    } catch (long status) {
-        return static_cast<HRESULT>(status);
-    }
-    ADD_FAILURE() << "no status thrown";
-    return S_OK;
-}
 
 class SystemItemSysroot : public kest::test::sim::SimSysroot {
   public:

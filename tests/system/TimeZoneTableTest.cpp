@@ -73,7 +73,7 @@ TEST_F(TimeZoneTableTest, EveryMappingKeepsTheOffset) {
     }
 }
 
-TEST_F(TimeZoneTableTest, KnownZonesHaveTheirLegacyTexts) {
+TEST_F(TimeZoneTableTest, KnownZonesHaveTheirLegacyTextsForTheAssistant) {
     // Olson names, each followed by its legacy text.
     const char* known[] = {"America/Chicago",  "CST6CDT",  "America/Los_Angeles", "PST8PDT",
                            "America/New_York", "EST5EDT",  "Europe/London",       "GMT0BST",
@@ -84,9 +84,8 @@ TEST_F(TimeZoneTableTest, KnownZonesHaveTheirLegacyTexts) {
         EXPECT_EQ(known[i + 1], olsonToLegacy_[known[i]]) << known[i];
     }
     EXPECT_EQ(0u, olsonToLegacy_.count("Pacific/Kiritimati")) << "14 hours east has no row";
-}
 
-TEST_F(TimeZoneTableTest, TheAssistantReadsTheShippedTable) {
+    // The assistant reads the shipped table.
     std::filesystem::copy_file(KEST_SHIPPED_TIMEZONE_TABLE,
                                sysroot_.sysroot_.PathOf(kest::test::system::kTimeZoneTablePath),
                                std::filesystem::copy_options::overwrite_existing);
