@@ -28,8 +28,7 @@ constexpr double kLogResolutionMs = 0.001;
 // A handler that records when and on which thread its deferred-persist hook runs.
 class RecordingHandler : public ItemHandler {
   public:
-    explicit RecordingHandler(HRESULT hookFailure)
-        : ItemHandler(L"eth0", L"", kNumericAttribute), hookFailure_(hookFailure) {}
+    RecordingHandler() : ItemHandler(L"eth0", L"", kNumericAttribute) {}
 
     HRESULT OnDeferredPersist(IuxSysPropertyBag* changes,
                               CountedPtr<vq::targetcfg::IDeviceHandler>& device) override {
@@ -38,8 +37,8 @@ class RecordingHandler : public ItemHandler {
         pthread_getname_np(pthread_self(), name, sizeof(name));
         threadName = name;
         sawChangesAndDevice = changes != nullptr && device;
-        if (hookFailure_ < 0) {
-            throw static_cast<long>(hookFailure_);
+        if (hookFailure < 0) {
+            throw static_cast<long>(hookFailure);
         }
         return S_OK;
     }
@@ -47,9 +46,7 @@ class RecordingHandler : public ItemHandler {
     double hookMs = 0;
     std::string threadName;
     bool sawChangesAndDevice = false;
-
-  private:
-    HRESULT hookFailure_;
+    HRESULT hookFailure = S_OK;  // thrown by the hook when negative
 };
 
 class DeferredTaskTest : public NetworkTest {
@@ -60,7 +57,8 @@ class DeferredTaskTest : public NetworkTest {
                                          const std::string& changes, HRESULT hookFailure = S_OK) {
         WriteState(AdapterState());
         CountedPtr<vq::targetcfg::IDeviceHandler> device = FirstDevice();
-        CountedPtr<RecordingHandler> handler = MakeCounted<RecordingHandler>(hookFailure);
+        CountedPtr<RecordingHandler> handler = MakeCounted<RecordingHandler>();
+        handler->hookFailure = hookFailure;
         ClearCallLog();
         startMs_ = MonotonicMs();
         MakeCounted<DeferredPersistTask>(withDevice ? device : nullptr, adapterDisabled,

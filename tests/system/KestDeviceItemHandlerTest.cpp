@@ -142,16 +142,15 @@ TEST_F(KestDeviceItemHandlerTest, RefreshWritesTheRequestedTimeAndDnsNameBeforeT
     EXPECT_EQ(S_OK, handler_->RefreshProperties(1, masked, bag_.Get()));
     EXPECT_EQ(S_OK, bag_->HasTag(0x0D11F000));
     EXPECT_EQ(S_FALSE, bag_->HasTag(0x0D114000));
-}
 
-TEST_F(KestDeviceItemHandlerTest, ARefreshWhoseDnsNameFailsWritesNoCatalogue) {
+    // A refresh whose DNS name fails writes no catalogue.
     WriteState(kest::test::system::SystemState("[Faults]\nGetFullyQualifiedDNSName = -375501"));
     ASSERT_EQ(S_OK, ReadCatalogue());
-    CountedPtr<IuxSysPropertyBag4> refreshed = CreatePropertyBag();
-    const uint32_t requested[] = {0x0D114000};
-    EXPECT_EQ(E_UNEXPECTED, handler_->RefreshProperties(1, requested, refreshed.Get()));
-    EXPECT_EQ("", Listing(refreshed.Get()));
-    EXPECT_EQ(E_POINTER, handler_->RefreshProperties(1, requested, nullptr));
+    const uint32_t dnsName[] = {0x0D114000};
+    bag_ = CreatePropertyBag();
+    EXPECT_EQ(E_UNEXPECTED, handler_->RefreshProperties(1, dnsName, bag_.Get()));
+    EXPECT_EQ("", Listing(bag_.Get()));
+    EXPECT_EQ(E_POINTER, handler_->RefreshProperties(1, dnsName, nullptr));
 }
 
 }  // namespace
