@@ -2,7 +2,6 @@
 
 #include <gmock/gmock.h>
 
-#include <map>
 #include <string>
 #include <tuple>
 
@@ -10,9 +9,7 @@
 #include "common/StatusOf.h"
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/AbsTime.h"
-#include "support/TextConversion.h"
 #include "system/SystemItemSysroot.h"
-#include "uxsys/HostString.h"
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
 namespace {

@@ -2,7 +2,6 @@
 // version file, the time-zone table, the web-service settings and a logging hardware-clock tool.
 #pragma once
 
-#include <cstdint>
 #include <string>
 
 #include "common/ChassisTestTags.h"
