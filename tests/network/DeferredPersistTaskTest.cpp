@@ -2,7 +2,8 @@
 // adapter, failures on its thread, and waiting for it when the last reference goes.
 #include <gmock/gmock.h>
 #include <pthread.h>
-#include <time.h>
+#include <chrono>
+#include <cstdlib>
 
 #include "NetworkTestSupport.h"
 #include "items/DeferredPersistTask.h"
@@ -14,10 +15,11 @@ namespace {
 
 using ::testing::ElementsAre;
 
+// Milliseconds on the clock the call log uses (CLOCK_MONOTONIC).
 double MonotonicMs() {
-    timespec now{};
-    clock_gettime(CLOCK_MONOTONIC, &now);
-    return static_cast<double>(now.tv_sec) * 1000.0 + static_cast<double>(now.tv_nsec) / 1e6;
+    return std::chrono::duration<double, std::milli>(
+               std::chrono::steady_clock::now().time_since_epoch())
+        .count();
 }
 
 // The log keeps three decimals, so a logged time may lie up to 1 µs before the call.
@@ -26,8 +28,7 @@ constexpr double kLogResolutionMs = 0.001;
 // A handler that records when and on which thread its deferred-persist hook runs.
 class RecordingHandler : public ItemHandler {
   public:
-    explicit RecordingHandler(HRESULT hookFailure)
-        : ItemHandler(L"eth0", L"", kNumericAttribute), hookFailure_(hookFailure) {}
+    RecordingHandler() : ItemHandler(L"eth0", L"", kNumericAttribute) {}
 
     HRESULT OnDeferredPersist(IuxSysPropertyBag* changes,
                               CountedPtr<vq::targetcfg::IDeviceHandler>& device) override {
@@ -36,8 +37,8 @@ class RecordingHandler : public ItemHandler {
         pthread_getname_np(pthread_self(), name, sizeof(name));
         threadName = name;
         sawChangesAndDevice = changes != nullptr && device;
-        if (hookFailure_ < 0) {
-            throw static_cast<long>(hookFailure_);
+        if (hookFailure < 0) {
+            throw static_cast<long>(hookFailure);
         }
         return S_OK;
     }
@@ -45,9 +46,7 @@ class RecordingHandler : public ItemHandler {
     double hookMs = 0;
     std::string threadName;
     bool sawChangesAndDevice = false;
-
-  private:
-    HRESULT hookFailure_;
+    HRESULT hookFailure = S_OK;  // thrown by the hook when negative
 };
 
 class DeferredTaskTest : public NetworkTest {
@@ -57,11 +56,9 @@ class DeferredTaskTest : public NetworkTest {
     CountedPtr<RecordingHandler> RunTask(bool withDevice, bool adapterDisabled,
                                          const std::string& changes, HRESULT hookFailure = S_OK) {
         WriteState(AdapterState());
-        vq::dsc::Vector<vq::targetcfg::IDeviceHandler*> devices;
-        vq::targetcfg::GetDeviceHandlers(devices);
-        EXPECT_EQ(1u, devices.size());
-        CountedPtr<vq::targetcfg::IDeviceHandler> device(devices[0], kAdoptReference);
-        CountedPtr<RecordingHandler> handler = MakeCounted<RecordingHandler>(hookFailure);
+        CountedPtr<vq::targetcfg::IDeviceHandler> device = FirstDevice();
+        CountedPtr<RecordingHandler> handler = MakeCounted<RecordingHandler>();
+        handler->hookFailure = hookFailure;
         ClearCallLog();
         startMs_ = MonotonicMs();
         MakeCounted<DeferredPersistTask>(withDevice ? device : nullptr, adapterDisabled,
@@ -71,31 +68,41 @@ class DeferredTaskTest : public NetworkTest {
         return handler;
     }
 
+    // The logged calls with their CLOCK_MONOTONIC times.
+    std::vector<std::pair<double, std::string>> TimedCallLog() const {
+        std::vector<std::pair<double, std::string>> calls;
+        std::istringstream log(sysroot_.ReadFile(kest::test::sim::kCallLogPath));
+        for (std::string line; std::getline(log, line);) {
+            calls.push_back({std::strtod(line.c_str(), nullptr), line.substr(line.find('\t') + 1)});
+        }
+        return calls;
+    }
+
     double startMs_ = 0;
     double endMs_ = 0;
 };
 
 TEST_F(DeferredTaskTest, TogglesTheInterfaceAfterItsDelaysAndReappliesTheLinkSpeed) {
     CountedPtr<RecordingHandler> handler = RunTask(true, false, "mode=2 media=8");
-    const std::vector<LoggedCall> calls = TimedCallLog();
+    const auto calls = TimedCallLog();
     ASSERT_EQ(3u, calls.size());
-    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].call);
-    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t1", calls[1].call);
-    EXPECT_EQ("SetDeviceSettings\t0\t0\t8\t0\t0", calls[2].call);
+    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].second);
+    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t1", calls[1].second);
+    EXPECT_EQ("SetDeviceSettings\t0\t0\t8\t0\t0", calls[2].second);
     EXPECT_GE(handler->hookMs, startMs_ + 100);
-    EXPECT_GE(calls[0].milliseconds + kLogResolutionMs, handler->hookMs);
-    EXPECT_GE(calls[1].milliseconds, calls[0].milliseconds + 900);
-    EXPECT_GE(endMs_, calls[2].milliseconds);
+    EXPECT_GE(calls[0].first + kLogResolutionMs, handler->hookMs);
+    EXPECT_GE(calls[1].first, calls[0].first + 900);
+    EXPECT_GE(endMs_, calls[2].first);
     EXPECT_EQ("ToggleNIC", handler->threadName);
     EXPECT_TRUE(handler->sawChangesAndDevice);
 }
 
 TEST_F(DeferredTaskTest, DisabledAdapterStaysDownAndNoAdapterMeansNoToggle) {
     RunTask(true, true, "mode=1 media=8");
-    const std::vector<LoggedCall> calls = TimedCallLog();
+    const auto calls = TimedCallLog();
     ASSERT_EQ(1u, calls.size());
-    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].call);
-    EXPECT_GE(calls[0].milliseconds + kLogResolutionMs, startMs_ + 100);
+    EXPECT_EQ("SetNetworkInterfaceState\t0\teth0\t0", calls[0].second);
+    EXPECT_GE(calls[0].first + kLogResolutionMs, startMs_ + 100);
 
     EXPECT_GE(RunTask(false, false, "mode=2 media=8")->hookMs, startMs_ + 100);
     EXPECT_TRUE(CallLog().empty());

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include "NetworkTestSupport.h"
+#include "common/BagListing.h"
 
 namespace kest::test::network {
 namespace {
@@ -10,112 +11,82 @@ namespace {
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::Not;
-namespace tag = NetworkTag;
-
-// Every row of `bag` in tag order as "tag=value;" (tags and numbers in hexadecimal).
-std::string Listing(IuxSysPropertyBag* bag) {
-    std::ostringstream rows;
-    CountedPtr<IuxSysEnumPropertyTag> tags;
-    bag->GetTagEnumerator(tags.Receive());
-    for (uint32_t next = 0; tags && tags->Next(1, &next, nullptr) == S_OK;) {
-        uint32_t type = 0;
-        int32_t value = 0;
-        bag->GetTagType(next, &type);
-        rows << std::hex << next << '=';
-        if (type == UX_PROPERTY_TYPE_STRING) {
-            const std::wstring text = TextOf(bag, next);
-            rows << std::string(text.begin(), text.end());
-        } else if (type == UX_PROPERTY_TYPE_ULONG) {
-            rows << ULongOf(bag, next);
-        } else if (bag->GetLong(next, &value) == S_OK || bag->GetBool(next, &value) == S_OK) {
-            rows << value;
-        }
-        rows << ';';
-    }
-    return rows.str();
-}
 
 // The rows every item has, then the network constants.
 constexpr char kIdentity[] =
-    "101c000=1;101d000=eth0;101f000=Ethernet Adapter eth0;102a000=3e8;1037000=150000;1038000=1;"
-    "1039000=1;103a000=5;";
+    "101c000=l1;101d000=seth0;101f000=sEthernet Adapter eth0;102a000=l1000;1037000=u150000;"
+    "1038000=b1;1039000=l1;103a000=u5;";
 
 class PropertiesTest : public NetworkTest {
   protected:
-    std::string Properties(const std::string& stateOverrides) {
-        WriteState(AdapterState(stateOverrides));
+    // The catalogue of the adapter in the state with `overrides`, or only the rows a refresh of
+    // `requested` writes.
+    std::string Properties(const std::string& overrides, std::vector<uint32_t> requested = {}) {
+        WriteState(AdapterState(overrides));
         CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-        EXPECT_EQ(S_OK, MakeHandler()->GetItemProperties(bag.Get()));
-        return Listing(bag.Get());
-    }
-
-    std::string Refreshed(std::vector<uint32_t> requested) {
-        WriteState(AdapterState());
-        CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-        EXPECT_EQ(S_OK, MakeHandler()->RefreshProperties(static_cast<uint32_t>(requested.size()),
-                                                         requested.data(), bag.Get()));
+        EXPECT_EQ(S_OK, requested.empty() ? MakeHandler()->GetItemProperties(bag.Get())
+                                          : MakeHandler()->RefreshProperties(
+                                                static_cast<uint32_t>(requested.size()),
+                                                requested.data(), bag.Get()));
         return Listing(bag.Get());
     }
 };
 
 TEST_F(PropertiesTest, CatalogueFollowsTheAdapterMode) {
-    EXPECT_EQ(kIdentity + std::string("d102000=2;d103000=b;d104000=00:80:2F:12:34:56;d105000=1;"
-                                      "d106000=3;d107000=192.168.1.10;d108000=1;"
-                                      "d109000=255.255.255.0;d10a000=192.168.1.1;"
-                                      "d10b000=192.168.1.2;d10f000=4;d110000=7f;d111000=4;"
-                                      "d119000=3;d11a000=1;d126000=1;d12c000=1;"),
+    EXPECT_EQ(kIdentity + std::string("d102000=u2;d103000=ub;d104000=s00:80:2F:12:34:56;d105000=u1;"
+                                      "d106000=u3;d107000=s192.168.1.10;d108000=u1;"
+                                      "d109000=s255.255.255.0;d10a000=s192.168.1.1;"
+                                      "d10b000=s192.168.1.2;d10f000=u4;d110000=u7f;d111000=u4;"
+                                      "d119000=u3;d11a000=u1;d126000=b1;d12c000=u1;"),
               Properties(""));
     // Only mode 2 has media rows and polling settings; mode 0x20 still has addresses.
-    EXPECT_EQ(kIdentity + std::string("d102000=20;d103000=b;d104000=00:80:2F:12:34:56;d105000=1;"
-                                      "d106000=3;d107000=192.168.1.10;d108000=1;"
-                                      "d109000=255.255.255.0;d10a000=192.168.1.1;"
-                                      "d10b000=192.168.1.2;d119000=1;d11a000=1;d126000=1;"
-                                      "d12c000=1;"),
-              Properties("Mode = 0x20\nPollingMode = 2"));
+    EXPECT_EQ(
+        kIdentity + std::string("d102000=u20;d103000=ub;d104000=s00:80:2F:12:34:56;d105000=u1;"
+                                "d106000=u3;d107000=s192.168.1.10;d108000=u1;"
+                                "d109000=s255.255.255.0;d10a000=s192.168.1.1;"
+                                "d10b000=s192.168.1.2;d119000=u1;d11a000=u1;d126000=b1;"
+                                "d12c000=u1;"),
+        Properties("Mode = 0x20\nPollingMode = 2"));
     EXPECT_THAT(Properties("PollingMode = 2\nPollingInterval = 250"),
-                HasSubstr("d11a000=2;d11b000=fa;"));
+                HasSubstr("d11a000=u2;d11b000=ufa;"));
     // EtherCAT without a master ID: empty addresses, request mode from the supported mask.
-    EXPECT_EQ(kIdentity + std::string("d102000=8;d103000=b;d104000=00:80:2F:12:34:56;d105000=2;"
-                                      "d106000=3;d107000=;d109000=;d10a000=;d10b000=;d119000=1;"
-                                      "d11a000=1;d126000=1;d12c000=1;"),
-              Properties("Mode = 8"));
+    EXPECT_EQ(
+        kIdentity + std::string("d102000=u8;d103000=ub;d104000=s00:80:2F:12:34:56;d105000=u2;"
+                                "d106000=u3;d107000=s;d109000=s;d10a000=s;d10b000=s;d119000=u1;"
+                                "d11a000=u1;d126000=b1;d12c000=u1;"),
+        Properties("Mode = 8"));
     EXPECT_THAT(Properties("Mode = 8\nEtherCATMasterID = 3\nEtherCATFlag = 1"),
-                HasSubstr("d118000=3;d119000=1;d11a000=1;d126000=1;d12c000=1;d155000=1;"));
+                HasSubstr("d118000=u3;d119000=u1;d11a000=u1;d126000=b1;d12c000=u1;d155000=b1;"));
 }
 
 TEST_F(PropertiesTest, DefaultsForRequestModesMissingAddressesAndFailedQueries) {
-    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 3"), HasSubstr("d105000=2;"));
-    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 1"), HasSubstr("d105000=1;"));
-    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 4"), HasSubstr("d105000=0;"));
-    EXPECT_THAT(Properties("IPAddress ="), HasSubstr("d107000=0.0.0.0;d108000=1;d109000=0.0.0.0;"));
+    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 3"), HasSubstr("d105000=u2;"));
+    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 1"), HasSubstr("d105000=u1;"));
+    EXPECT_THAT(Properties("Mode = 1\nSupportedRequestModes = 4"), HasSubstr("d105000=u0;"));
+    EXPECT_THAT(Properties("IPAddress ="),
+                HasSubstr("d107000=s0.0.0.0;d108000=u1;d109000=s0.0.0.0;"));
     const std::string rows = Properties(
         "PollingMode = 2\n[Faults]\nGetCurrentDeviceSettings = -375501\n"
         "GetSupportedDeviceSettings = -375501\nGetPreferredMediaMode = -1");
-    EXPECT_THAT(rows, HasSubstr("d10f000=1;d110000=1;d111000=1;d119000=1;d11a000=1;"));
+    EXPECT_THAT(rows, HasSubstr("d10f000=u1;d110000=u1;d111000=u1;d119000=u1;d11a000=u1;"));
     EXPECT_THAT(rows, Not(HasSubstr("d11b000")));
-}
-
-TEST_F(PropertiesTest, FailedTestedCallAbortsKeepingEarlierRows) {
+    // A failing call whose status is tested ends the catalogue after the rows before it.
     WriteState(AdapterState("[Faults]\nGetDeviceModeByIndex = -375563"));
     CountedPtr<IuxSysPropertyBag4> bag = CreatePropertyBag();
-    long status = 0;
-    try {
-        MakeHandler()->GetItemProperties(bag.Get());
-    } catch (long thrown) {
-        status = thrown;
-    }
-    EXPECT_EQ(E_INVALIDARG, status);
-    EXPECT_EQ(kIdentity + std::string("d104000=00:80:2F:12:34:56;d126000=1;"), Listing(bag.Get()));
+    EXPECT_EQ(E_INVALIDARG, StatusOf([&] { return MakeHandler()->GetItemProperties(bag.Get()); }));
+    EXPECT_EQ(kIdentity + std::string("d104000=s00:80:2F:12:34:56;d126000=b1;"),
+              Listing(bag.Get()));
 }
 
 TEST_F(PropertiesTest, RefreshRewritesOnlyForItsOwnTags) {
-    EXPECT_EQ("", Refreshed({tag::kMacAddress, tag::kSupportedAdapterModes}));
-    const std::string network = Refreshed({tag::kGateway | 0x123});
-    EXPECT_THAT(network, HasSubstr("1038000=1;1039000=1;103a000=5;d104000="));
+    EXPECT_EQ("", Properties("", {tags::kMacAddress, tags::kSupportedAdapterModes}));
+    const std::string network = Properties("", {tags::kGateway | 0x123});
+    EXPECT_THAT(network, HasSubstr("1038000=b1;1039000=l1;103a000=u5;d104000="));
     EXPECT_THAT(network, Not(HasSubstr("d102000")));
-    EXPECT_EQ("d102000=2;d103000=b;d119000=3;d11a000=1;d12c000=1;", Refreshed({tag::kPollingMode}));
-    EXPECT_THAT(Refreshed({tag::kPollingMode, tag::kPrimaryAdapter}),
-                HasSubstr("d102000=2;d103000=b;d104000="));
+    EXPECT_EQ("d102000=u2;d103000=ub;d119000=u3;d11a000=u1;d12c000=u1;",
+              Properties("", {tags::kPollingMode}));
+    EXPECT_THAT(Properties("", {tags::kPollingMode, tags::kPrimaryAdapter}),
+                HasSubstr("d102000=u2;d103000=ub;d104000="));
 }
 
 TEST_F(PropertiesTest, LibraryCallsAreTracedUnderTheirBit) {

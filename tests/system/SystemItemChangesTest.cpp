@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <string>
-#include <vector>
 
 #include "property/CuxDynamicPropertyBag.h"
 #include "support/AbsTime.h"
@@ -37,7 +36,6 @@ class SystemItemChangesTest : public ::testing::Test, public kest::test::system:
         return handler_->PersistPropertyChanges(changes_.Get(), persistFlag_, device,
                                                 adapterDisabled);
     }
-    std::wstring Message() const { return message_.Get() ? message_.Get() : L"(none)"; }
 
     CountedPtr<KestDeviceItemHandler> handler_ = MakeCounted<KestDeviceItemHandler>();
     CountedPtr<IuxSysPropertyBag4> changes_ = CreatePropertyBag();
@@ -46,83 +44,25 @@ class SystemItemChangesTest : public ::testing::Test, public kest::test::system:
     int32_t persistFlag_ = 0;
 };
 
-TEST_F(SystemItemChangesTest, AcceptsEverySettingOfTheItemAndIgnoresOthers) {
-    changes_->SetString(SystemTag::kHostName, L"kest-02");
-    changes_->SetString(SystemTag::kComment, L"spare");
-    changes_->SetString(SystemTag::kLocaleCode, L"fr");
-    changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
-    changes_->SetString(SystemTag::kLegacyTimeZone, L"PST8PDT");
-    changes_->SetString(SystemTag::kOlsonTimeZone, L"Europe/Berlin");
-    changes_->SetBool(SystemTag::kWebServiceEnabled, 1);
-    changes_->SetString(SystemTag::kDeviceDescription, L"not a setting");
+TEST_F(SystemItemChangesTest, AcceptsEverySettingOfTheItemAndIgnoresOthersAndUnmodified) {
+    changes_->SetString(tags::kHostName, L"kest-02");
+    changes_->SetString(tags::kComment, L"spare");
+    changes_->SetString(tags::kLocaleCode, L"fr");
+    changes_->SetTimestamp(tags::kCurrentTime, k2023);
+    changes_->SetString(tags::kLegacyTimeZone, L"PST8PDT");
+    changes_->SetString(tags::kOlsonTimeZone, L"Europe/Berlin");
+    changes_->SetBool(tags::kWebServiceEnabled, 1);
+    changes_->SetString(tags::kDeviceDescription, L"not a setting");
     EXPECT_EQ(S_OK, Validate());
-    EXPECT_EQ((PropertyTagSet{SystemTag::kHostName, SystemTag::kComment, SystemTag::kLocaleCode,
-                              SystemTag::kCurrentTime, SystemTag::kLegacyTimeZone,
-                              SystemTag::kOlsonTimeZone, SystemTag::kWebServiceEnabled}),
-              validated_);
+    EXPECT_EQ(
+        (PropertyTagSet{tags::kHostName, tags::kComment, tags::kLocaleCode, tags::kCurrentTime,
+                        tags::kLegacyTimeZone, tags::kOlsonTimeZone, tags::kWebServiceEnabled}),
+        validated_);
     EXPECT_EQ(nullptr, message_.Get());
-    EXPECT_TRUE(SetterCalls().empty()) << "validation changes nothing";
-}
+    EXPECT_EQ("", SetterCalls()) << "validation changes nothing";
 
-TEST_F(SystemItemChangesTest, StopsAtTheFirstRejectionWithItsStatusAndMessage) {
-    struct Case {
-        const char* name;
-        uint32_t tag;
-        const wchar_t* text;  // null: the value below is set instead
-        HRESULT status;
-        const wchar_t* message;
-    };
-    const Case cases[] = {
-        {"host name", SystemTag::kHostName, L"-bad", UX_E_HOSTNAME_INVALID,
-         L"The first and last characters of the hostname must be alphanumeric."},
-        {"comment", SystemTag::kComment,
-         L"0123456789012345678901234567890123456789012345678901234567890123X", UX_E_VALUE_INVALID,
-         L"Comment length cannot exceed 64 characters."},
-        {"locale fragment", SystemTag::kLocaleCode, L"n", UX_E_VALUE_INVALID,
-         L"Locale not supported."},
-        {"empty locale", SystemTag::kLocaleCode, L"", UX_E_VALUE_INVALID, L"Locale not supported."},
-        {"legacy zone", SystemTag::kLegacyTimeZone, L"XYZ1", UX_E_VALUE_INVALID,
-         L"Timezone not supported."},
-        {"Olson zone", SystemTag::kOlsonTimeZone, L"Mars/Olympus", UX_E_VALUE_INVALID, L"(none)"},
-        {"Olson zone leading out", SystemTag::kOlsonTimeZone, L"../x", UX_E_VALUE_INVALID,
-         L"Timezone not supported."},
-        {"Olson zone from the root", SystemTag::kOlsonTimeZone, L"/usr/share/x", UX_E_VALUE_INVALID,
-         L"Timezone not supported."},
-        {"Olson zone with a line break", SystemTag::kOlsonTimeZone, L"Europe/Berlin\n",
-         UX_E_VALUE_INVALID, L"Timezone not supported."},
-        {"legacy zone with a parent part", SystemTag::kLegacyTimeZone, L"PST8PDT/..",
-         UX_E_VALUE_INVALID, L"Timezone not supported."},
-        {"comment with a control character", SystemTag::kComment, L"rack\x1b[2J",
-         UX_E_VALUE_INVALID, L"Comment cannot contain control characters."},
-        {"time before 1970", SystemTag::kCurrentTime, nullptr, UX_E_VALUE_INVALID,
-         L"Timestamps older than 1970 are not supported."},
-        {"web switch of another type", SystemTag::kWebServiceEnabled, L"1",
-         UX_E_PROPERTY_TYPE_MISMATCH, L"(none)"},
-    };
-    // Names that lead out of the zone directory would find a zone file there.
-    sysroot_.WriteFile("/usr/share/x", "TZif");
-    for (const Case& c : cases) {
-        changes_ = CreatePropertyBag();
-        changes_->SetString(SystemTag::kHostName, L"kest-02");
-        if (c.text != nullptr) {
-            changes_->SetString(c.tag, c.text);
-        } else {
-            changes_->SetTimestamp(c.tag, {0, kEpoch - 1});
-        }
-        changes_->SetBool(0x7FFFF000, 1);
-        EXPECT_EQ(c.status, Validate()) << c.name;
-        EXPECT_EQ(c.message, Message()) << c.name;
-        const PropertyTagSet before =
-            c.tag == SystemTag::kHostName ? PropertyTagSet{} : PropertyTagSet{SystemTag::kHostName};
-        EXPECT_EQ(before, validated_) << c.name;
-        EXPECT_EQ(c.status, handler_->ValidatePropertyChanges(changes_.Get(), validated_, nullptr))
-            << c.name << " without message slot";
-    }
-}
-
-TEST_F(SystemItemChangesTest, NothingModifiedIsNothingToDo) {
+    // Nothing modified is nothing to do.
     sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
-    changes_->SetString(SystemTag::kHostName, L"kest-02");
     changes_->ClearAllModified();
     EXPECT_EQ(S_FALSE, Validate());
     EXPECT_EQ(S_FALSE, Persist());
@@ -131,120 +71,134 @@ TEST_F(SystemItemChangesTest, NothingModifiedIsNothingToDo) {
     EXPECT_TRUE(validated_.empty());
 }
 
+TEST_F(SystemItemChangesTest, StopsAtTheFirstRejectionWithItsStatusAndMessage) {
+    struct Case {
+        const char* name;
+        uint32_t tag;
+        const wchar_t* text;  // null: the value below is set instead
+        const wchar_t* message;
+        HRESULT status = UX_E_VALUE_INVALID;
+    };
+    const wchar_t* zone = L"Timezone not supported.";
+    const Case cases[] = {
+        {"legacy zone", tags::kLegacyTimeZone, L"XYZ1", zone},
+        {"Olson zone", tags::kOlsonTimeZone, L"Mars/Olympus", L"(none)"},
+        {"Olson zone leading out", tags::kOlsonTimeZone, L"../x", zone},
+        {"Olson zone from the root", tags::kOlsonTimeZone, L"/usr/share/x", zone},
+        {"Olson zone with a line break", tags::kOlsonTimeZone, L"Europe/Berlin\n", zone},
+        {"legacy zone with a parent part", tags::kLegacyTimeZone, L"PST8PDT/..", zone},
+        {"time before 1970", tags::kCurrentTime, nullptr,
+         L"Timestamps older than 1970 are not supported."},
+        {"web switch of another type", tags::kWebServiceEnabled, L"1", L"(none)",
+         UX_E_PROPERTY_TYPE_MISMATCH},
+    };
+    // Names that lead out of the zone directory would find a zone file there.
+    sysroot_.WriteFile("/usr/share/x", "TZif");
+    for (const Case& c : cases) {
+        changes_ = CreatePropertyBag();
+        changes_->SetString(tags::kHostName, L"kest-02");
+        if (c.text != nullptr) {
+            changes_->SetString(c.tag, c.text);
+        } else {
+            changes_->SetTimestamp(c.tag, {0, kEpoch - 1});
+        }
+        changes_->SetBool(0x7FFFF000, 1);
+        EXPECT_EQ(c.status, Validate()) << c.name;
+        EXPECT_EQ(c.message, std::wstring(message_.Get() ? message_.Get() : L"(none)")) << c.name;
+        EXPECT_EQ(PropertyTagSet{tags::kHostName}, validated_) << c.name;
+        EXPECT_EQ(c.status, handler_->ValidatePropertyChanges(changes_.Get(), validated_, nullptr))
+            << c.name << " without message slot";
+    }
+}
+
+// Every change also sets the clock to 2023, last; a new legacy zone corrects it by the difference
+// of the legacy offsets, and a failing change stops before it.
 TEST_F(SystemItemChangesTest, PersistsInTagOrderAndFlagsRestartingChanges) {
     struct Case {
         const char* name;
-        std::vector<std::pair<uint32_t, const wchar_t*>> texts;
-        std::vector<std::string> setters;
+        const char* state;  // overrides
+        uint32_t tag;
+        const wchar_t* text;
+        uint32_t secondTag;  // 0: none
+        const wchar_t* secondText;
+        const char* setters;
         int32_t persistFlag;
+        const char* clock;
         HRESULT result = S_OK;
-        const char* faults = "";
     };
+    const char* set = "1700000000 0\n";
+    const char* losAngeles = "SetTimeZone\t0\tAmerica/Los_Angeles\n";
+    const uint32_t legacy = tags::kLegacyTimeZone;
     const Case cases[] = {
-        {"host name and comment",
-         {{SystemTag::kComment, L"spare"}, {SystemTag::kHostName, L"kest-02"}},
-         {"SetHostName\t0\tkest-02", "SetUserComment\t0\tspare"},
-         1},
-        {"comment only", {{SystemTag::kComment, L"spare"}}, {"SetUserComment\t0\tspare"}, 0},
-        {"locale", {{SystemTag::kLocaleCode, L"fr"}}, {"SetLanguageName\t0\tfr"}, 1},
-        {"failing locale after host name",
-         {{SystemTag::kHostName, L"kest-02"}, {SystemTag::kLocaleCode, L"fr"}},
-         {"SetHostName\t0\tkest-02", "SetLanguageName\t-375523\tfr"},
-         1,
-         UX_E_VALUE_INVALID,
-         "[Faults]\nSetLanguageName = -375523\n"},
+        {"host name and comment", "", tags::kComment, L"spare", tags::kHostName, L"kest-02",
+         "SetHostName\t0\tkest-02\nSetUserComment\t0\tspare\n", 1, set},
+        {"comment only", "", tags::kComment, L"spare", 0, L"", "SetUserComment\t0\tspare\n", 0,
+         set},
+        {"locale", "", tags::kLocaleCode, L"fr", 0, L"", "SetLanguageName\t0\tfr\n", 1, set},
+        {"failing locale after host name", "[Faults]\nSetLanguageName = -375523", tags::kHostName,
+         L"kest-02", tags::kLocaleCode, L"fr",
+         "SetHostName\t0\tkest-02\nSetLanguageName\t-375523\tfr\n", 1, "", UX_E_VALUE_INVALID},
         // Persisting without validating first: a rejected value stops everything.
-        {"host name with a line break",
-         {{SystemTag::kHostName, L"kest\n02; reboot"}},
-         {},
-         0,
+        {"host name with a line break", "", tags::kHostName, L"kest\n02; reboot", 0, L"", "", 0, "",
          UX_E_HOSTNAME_INVALID},
-        {"Olson zone leading out",
-         {{SystemTag::kOlsonTimeZone, L"../x"}},
-         {},
-         0,
+        {"Olson zone leading out", "", tags::kOlsonTimeZone, L"../x", 0, L"", "", 0, "",
          UX_E_VALUE_INVALID},
-        {"comment with a control character after a good host name",
-         {{SystemTag::kHostName, L"kest-02"}, {SystemTag::kComment, L"rack\x7f"}},
-         {},
-         0,
-         UX_E_VALUE_INVALID},
-        {"unsupported locale", {{SystemTag::kLocaleCode, L"xx"}}, {}, 0, UX_E_VALUE_INVALID},
-        {"Olson zone",
-         {{SystemTag::kOlsonTimeZone, L"Europe/Berlin"}},
-         {"SetTimeZone\t0\tEurope/Berlin"},
-         0},
-        {"unchanged legacy zone", {{SystemTag::kLegacyTimeZone, L"CST6CDT"}}, {}, 0},
+        {"control character in a comment after a good host name", "", tags::kHostName, L"kest-02",
+         tags::kComment, L"rack\x7f", "", 0, "", UX_E_VALUE_INVALID},
+        {"unsupported locale", "", tags::kLocaleCode, L"xx", 0, L"", "", 0, "", UX_E_VALUE_INVALID},
+        {"Olson zone", "", tags::kOlsonTimeZone, L"Europe/Berlin", 0, L"",
+         "SetTimeZone\t0\tEurope/Berlin\n", 0, set},
+        {"unchanged legacy zone", "", legacy, L"CST6CDT", 0, L"", "", 0, "1700021600 0\n"},
+        {"Olson to legacy", "", legacy, L"PST8PDT", 0, L"", losAngeles, 0, "1700028800 0\n"},
+        {"legacy to legacy", "TimeZone = EST5EDT", legacy, L"PST8PDT", 0, L"", losAngeles, 0,
+         "1700010800 0\n"},
+        {"legacy eastwards", "TimeZone = PST8PDT", legacy, L"EST5EDT", 0, L"",
+         "SetTimeZone\t0\tAmerica/New_York\n", 0, "1699989200 0\n"},
+        // Spellings the time-zone table accepts get the same correction.
+        {"lower case", "", legacy, L"pst8pdt", 0, L"", losAngeles, 0, "1700028800 0\n"},
+        {"blanks", "", legacy, L" PST8PDT  ", 0, L"", losAngeles, 0, "1700028800 0\n"},
+        {"mixed", "TimeZone = EST5EDT", legacy, L"  Pst8Pdt ", 0, L"", losAngeles, 0,
+         "1700010800 0\n"},
+        {"unknown legacy zone", "", legacy, L"XYZ1", 0, L"", "", 0, "", UX_E_VALUE_INVALID},
     };
     sysroot_.WriteFile("/usr/share/x", "TZif");
     for (const Case& c : cases) {
-        WriteState(kest::test::system::SystemState({}, c.faults));
+        WriteState(kest::test::system::SystemState(c.state));
         sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
+        sysroot_.WriteFile(kest::test::system::kClockFile, "");
         changes_ = CreatePropertyBag();
-        for (const auto& [tag, text] : c.texts) {
-            changes_->SetString(tag, text);
+        changes_->SetTimestamp(tags::kCurrentTime, k2023);
+        changes_->SetString(c.tag, c.text);
+        if (c.secondTag != 0) {
+            changes_->SetString(c.secondTag, c.secondText);
         }
         persistFlag_ = 0;
         EXPECT_EQ(c.result, Persist()) << c.name;
         EXPECT_EQ(c.setters, SetterCalls()) << c.name;
         EXPECT_EQ(c.persistFlag, persistFlag_) << c.name;
+        EXPECT_EQ(c.clock, Clock()) << c.name;
     }
 }
 
-TEST_F(SystemItemChangesTest, RewritesTheWebServiceSwitchEvenWhenUnchanged) {
+// The switch is rewritten even when unchanged, and saved before the clock is set last.
+TEST_F(SystemItemChangesTest, SavesTheWebServiceSwitchThenSetsTheClock) {
     sysroot_.WriteFile(kest::test::system::kWebServicePath, "; old\n[WebService]\nEnable = 0\n");
     handler_ = MakeCounted<KestDeviceItemHandler>();
-    changes_->SetBool(SystemTag::kWebServiceEnabled, 0);
+    changes_->SetBool(tags::kWebServiceEnabled, 0);
     EXPECT_EQ(S_OK, Persist());
     EXPECT_EQ(1, persistFlag_);
     EXPECT_EQ("[WebService]\nEnable = 0\n\n",
               sysroot_.ReadFile(kest::test::system::kWebServicePath));
-}
 
-TEST_F(SystemItemChangesTest, SetsTheClockLastAfterTheWebServiceSwitch) {
-    changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
-    changes_->SetBool(SystemTag::kWebServiceEnabled, 1);
+    changes_->SetTimestamp(tags::kCurrentTime, k2023);
+    changes_->SetBool(tags::kWebServiceEnabled, 1);
+    persistFlag_ = 0;
     EXPECT_EQ(S_OK, Persist());
     EXPECT_EQ("1700000000 0\n", Clock()) << "no legacy zone change, no correction";
     EXPECT_EQ("[WebService]\nEnable = 1\n\n",
               sysroot_.ReadFile(kest::test::system::kHardwareClockLog))
         << "the switch was saved when the hardware clock was written";
     EXPECT_EQ(1, persistFlag_);
-}
-
-// The clock is corrected by the difference of the legacy offsets; a failing zone change stops
-// before the clock.
-TEST_F(SystemItemChangesTest, CorrectsTheClockByTheLegacyOffsetDifference) {
-    struct Case {
-        const char* currentZone;
-        const wchar_t* newLegacyText;
-        const char* clock;
-        std::vector<std::string> setters;
-        HRESULT result = S_OK;
-    };
-    const std::string losAngeles = "SetTimeZone\t0\tAmerica/Los_Angeles";
-    const Case cases[] = {
-        {"America/Chicago", L"PST8PDT", "1700028800 0\n", {losAngeles}},
-        {"EST5EDT", L"PST8PDT", "1700010800 0\n", {losAngeles}},
-        {"PST8PDT", L"EST5EDT", "1699989200 0\n", {"SetTimeZone\t0\tAmerica/New_York"}},
-        // Spellings the time-zone table accepts get the same correction.
-        {"America/Chicago", L"pst8pdt", "1700028800 0\n", {losAngeles}},
-        {"America/Chicago", L" PST8PDT  ", "1700028800 0\n", {losAngeles}},
-        {"EST5EDT", L"  Pst8Pdt ", "1700010800 0\n", {losAngeles}},
-        {"America/Chicago", L"XYZ1", "", {}, UX_E_VALUE_INVALID},
-    };
-    for (const Case& c : cases) {
-        WriteState(kest::test::system::SystemState({{"TimeZone", c.currentZone}}));
-        sysroot_.WriteFile(kest::test::sim::kCallLogPath, "");
-        sysroot_.WriteFile(kest::test::system::kClockFile, "");
-        changes_ = CreatePropertyBag();
-        changes_->SetTimestamp(SystemTag::kCurrentTime, k2023);
-        changes_->SetString(SystemTag::kLegacyTimeZone, c.newLegacyText);
-        EXPECT_EQ(c.result, Persist()) << c.currentZone;
-        EXPECT_EQ(c.clock, Clock()) << c.currentZone;
-        EXPECT_EQ(c.setters, SetterCalls()) << c.currentZone;
-        EXPECT_EQ(0, persistFlag_);
-    }
 }
 
 }  // namespace

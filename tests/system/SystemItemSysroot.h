@@ -2,13 +2,10 @@
 // version file, the time-zone table, the web-service settings and a logging hardware-clock tool.
 #pragma once
 
-#include <cstdint>
-#include <fstream>
-#include <map>
-#include <sstream>
 #include <string>
-#include <vector>
 
+#include "common/ChassisTestTags.h"
+#include "common/StateText.h"
 #include "sim/SimFixture.h"
 #include "uxsys/StatusCodes.h"
 
@@ -20,55 +17,22 @@ constexpr char kHardwareClockLog[] = "/hwclock.log";
 constexpr char kClockFile[] = "/run/kest/system-clock";
 
 // The [System] section of a controller with a description, identity, languages and an Olson time
-// zone; `overrides` replace or add keys, `extra` follows the section (for example a [Faults]
-// section).
-inline std::string SystemState(const std::map<std::string, std::string>& overrides = {},
-                               const std::string& extra = "") {
-    std::map<std::string, std::string> keys = {
-        {"DeviceDescription", "KEST 9100"},
-        {"TargetClass", "KEST"},
-        {"HostName", "kest-01"},
-        {"TargetID", "77"},
-        {"SerialNumber", "6699"},
-        {"UserComment", "rack 4"},
-        {"LanguageName", "German"},
-        {"SupportedLanguages", "English,German,French"},
-        {"TimeZone", "America/Chicago"},
-        {"TimezoneOffset", "-360"},
-        {"FullyQualifiedDNSName", "kest-01.example.net"},
-    };
-    for (const auto& [key, value] : overrides) {
-        keys[key] = value;
-    }
-    std::string state = "[System]\n";
-    for (const auto& [key, value] : keys) {
-        state += key + " = " + value + "\n";
-    }
-    return state + extra;
+// zone; each "Key = value" line of `overrides` replaces the line of that key or, for a new key,
+// is added (a "[Faults]" section, too).
+inline std::string SystemState(const std::string& overrides = "") {
+    std::string state =
+        "[System]\nDeviceDescription = KEST 9100\nTargetClass = KEST\nHostName = kest-01\n"
+        "TargetID = 77\nSerialNumber = 6699\nUserComment = rack 4\nLanguageName = German\n"
+        "SupportedLanguages = English,German,French\nTimeZone = America/Chicago\n"
+        "TimezoneOffset = -360\nFullyQualifiedDNSName = kest-01.example.net\n";
+    return kest::test::WithOverrides(state, overrides);
 }
 
 // A small table: two legacy texts and three Olson names.
 constexpr char kSmallTimeZoneTable[] =
-    "[LegacyToOlson]\n"
-    "CST6CDT = America/Chicago\n"
-    "PST8PDT = America/Los_Angeles\n"
-    "EST5EDT = America/New_York\n"
-    "[OlsonToLegacy]\n"
-    "America/Chicago = CST6CDT\n"
-    "America/Los_Angeles = PST8PDT\n"
-    "America/New_York = EST5EDT\n";
-
-// Runs `call`, expecting it to throw a status (a long); returns that status.
-template <class Call>
-HRESULT ThrownStatus(Call&& call) {
-    try {
-        call();
-    } catch (long status) {
-        return static_cast<HRESULT>(status);
-    }
-    ADD_FAILURE() << "no status thrown";
-    return S_OK;
-}
+    "[LegacyToOlson]\nCST6CDT = America/Chicago\nPST8PDT = America/Los_Angeles\n"
+    "EST5EDT = America/New_York\n[OlsonToLegacy]\nAmerica/Chicago = CST6CDT\n"
+    "America/Los_Angeles = PST8PDT\nAmerica/New_York = EST5EDT\n";
 
 class SystemItemSysroot : public kest::test::sim::SimSysroot {
   public:
@@ -81,24 +45,14 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
                              "echo \"$@\" >> '" + sysroot_.PathOf(kHardwareClockLog) + "'\n");
     }
 
-    // The shipped table from the source tree, installed in place of the small one.
-    void InstallShippedTimeZoneTable() const {
-        std::ifstream shipped(KEST_SHIPPED_TIMEZONE_TABLE, std::ios::binary);
-        std::ostringstream content;
-        content << shipped.rdbuf();
-        sysroot_.WriteFile(kTimeZoneTablePath, content.str());
-    }
-
     // What the system clock was last set to ("seconds microseconds\n"; empty: never).
     std::string Clock() const { return sysroot_.ReadFile(kClockFile); }
 
-    // The logged calls whose name starts with "Set" (name, status and arguments).
-    std::vector<std::string> SetterCalls() const {
-        std::vector<std::string> setters;
+    // The logged calls whose name starts with "Set" (name, status and arguments), one a line.
+    std::string SetterCalls() const {
+        std::string setters;
         for (const std::string& line : CallLog()) {
-            if (line.compare(0, 3, "Set") == 0) {
-                setters.push_back(line);
-            }
+            setters += line.compare(0, 3, "Set") == 0 ? line + "\n" : "";
         }
         return setters;
     }
@@ -107,16 +61,5 @@ class SystemItemSysroot : public kest::test::sim::SimSysroot {
 }  // namespace kest::test::system
 
 namespace nVQKESTSYSAPICHASSISEXPERT100 {
-
-// The system item's setting tags, written out here as an independent check of the plug-in's.
-namespace SystemTag {
-constexpr uint32_t kDeviceDescription = 0x01006000;
-constexpr uint32_t kHostName = 0x0101F000;
-constexpr uint32_t kComment = 0x0103D000;
-constexpr uint32_t kLocaleCode = 0x0D11D000;
-constexpr uint32_t kCurrentTime = 0x0D11F000;
-constexpr uint32_t kLegacyTimeZone = 0x0D120000;
-constexpr uint32_t kOlsonTimeZone = 0x0D14E000;
-constexpr uint32_t kWebServiceEnabled = 0x21004000;
-}  // namespace SystemTag
+namespace tags = kest::test::tags;
 }  // namespace nVQKESTSYSAPICHASSISEXPERT100
