@@ -30,6 +30,8 @@ TEST_F(ItemManagerBaseTest, InstanceIsSharedAndForgottenWithItsLastReference) {
     EXPECT_EQ(manager, second);
     EXPECT_EQ(manager, ItemManagerBase::GetInstance<TestManager>(false));
     EXPECT_EQ(constructed, TestManager::constructedManagers);
+    EXPECT_EQ(3u, second->AddRef()) << "AddRef and Release return the new count";
+    EXPECT_EQ(2u, second->Release());
 
     manager.Reset();
     EXPECT_TRUE(ItemManagerBase::GetInstance<TestManager>(false));
