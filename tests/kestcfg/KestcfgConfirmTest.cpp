@@ -1,6 +1,5 @@
-// Changes that undo themselves unless confirmed, on a demo controller: confirm, expiry, the
-// watcher outliving the kestcfg that started it, one pending change at a time, and a rollback
-// that fails.
+// Changes that undo themselves unless confirmed: confirm, expiry, the watcher (a second kestcfg)
+// outliving the kestcfg that started it, one pending change at a time, and a failing rollback.
 #include <dirent.h>
 #include <fcntl.h>
 #include <gtest/gtest.h>
@@ -13,7 +12,6 @@
 #include <string>
 #include <vector>
 
-#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kest::test::cfg {
@@ -24,8 +22,15 @@ constexpr char kPending[] = "/run/kest/pending-rollback.json";
 constexpr char kLastRollback[] = "/run/kest/last-rollback.json";
 constexpr char kInterfaceUp[] = "SetNetworkInterfaceState\t0\teth0\t1";
 
-class KestcfgConfirmTest : public kest::test::cfg::DemoControllerTest {
+class KestcfgConfirmTest : public DemoControllerTest {
   protected:
+    void SetUp() override {
+        DemoControllerTest::SetUp();
+        if (!KestcfgStartsItself()) {
+            GTEST_SKIP() << "an emulated kestcfg cannot start the watcher";
+        }
+    }
+
     // The process ids of watchers of this controller.
     std::vector<pid_t> Watchers() const {
         std::vector<pid_t> pids;
@@ -33,9 +38,7 @@ class KestcfgConfirmTest : public kest::test::cfg::DemoControllerTest {
         while (dirent* entry = proc != nullptr ? readdir(proc) : nullptr) {
             const pid_t pid = atoi(entry->d_name);
             std::string line =
-                pid > 0
-                    ? kest::test::cfg::ReadWhole("/proc/" + std::string(entry->d_name) + "/cmdline")
-                    : "";
+                pid > 0 ? ReadWhole("/proc/" + std::to_string(pid) + "/cmdline") : "";
             std::replace(line.begin(), line.end(), '\0', ' ');
             if (line.find(sysroot_.Root() + " rollback --watch") != std::string::npos) {
                 pids.push_back(pid);
@@ -47,15 +50,11 @@ class KestcfgConfirmTest : public kest::test::cfg::DemoControllerTest {
         return pids;
     }
 
-    std::string Calls() const { return sysroot_.ReadFile(kCallLog); }
     std::string PendingJson() const { return FlattenJson(RunKestcfg({"pending", "--json"}).out); }
     bool RolledBack() const { return sysroot_.Exists(kLastRollback) && !sysroot_.Exists(kPending); }
 };
 
 TEST_F(KestcfgConfirmTest, ConfirmedInTimeTheChangeStaysAndOnlyOneChangeIsPending) {
-    if (!kest::test::cfg::KestcfgStartsItself()) {
-        GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
-    }
     const RunResult set =
         RunKestcfg({"set", "eth0", "ip-address=192.168.10.41", "--confirm-within", "60"});
     ASSERT_EQ(0, set.exitCode) << set.err;
@@ -100,9 +99,6 @@ class KestcfgExpiryTest : public KestcfgConfirmTest,
                           public testing::WithParamInterface<ExpiryCase> {};
 
 TEST_P(KestcfgExpiryTest, UnconfirmedTheSavedSettingsReturnOnce) {
-    if (!kest::test::cfg::KestcfgStartsItself()) {
-        GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
-    }
     sysroot_.WriteFile("/settings.json",
                        R"({"items": {"VQ KEST Chassis": {"host-name": "kest-b"}}})");
     std::vector<std::string> arguments = GetParam().arguments;
@@ -137,11 +133,8 @@ class KestcfgWatcherSurvivesTest : public KestcfgConfirmTest,
 
 // The signal goes to the starting kestcfg's process group, as a dropped session or a kill does.
 TEST_P(KestcfgWatcherSurvivesTest, TheStarterEndingByASignal) {
-    if (!kest::test::cfg::KestcfgStartsItself()) {
-        GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
-    }
-    RunningProgram starter =
-        StartKestcfg({"set", "eth0", "ip-address=192.168.10.44", "--confirm-within", "2"}, true);
+    RunningProgram starter = StartProgram(
+        Kestcfg({"set", "eth0", "ip-address=192.168.10.44", "--confirm-within", "2"}), true);
     ASSERT_TRUE(PollUntil([&] { return !Watchers().empty(); }));
     kill(GetParam() == SIGKILL ? starter.pid : -starter.pid, GetParam());
     FinishProgram(starter);
@@ -157,9 +150,6 @@ INSTANTIATE_TEST_SUITE_P(Signals, KestcfgWatcherSurvivesTest, testing::Values(SI
 
 // The failing rollback is run at once, so that the fault cannot race the deadline.
 TEST_F(KestcfgConfirmTest, ARollbackThatFailsIsRecordedWithItsReasonAndNotRetried) {
-    if (!kest::test::cfg::KestcfgStartsItself()) {
-        GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
-    }
     ASSERT_EQ(
         0,
         RunKestcfg({"set", "eth0", "ip-address=192.168.10.45", "--confirm-within", "60"}).exitCode);
@@ -180,9 +170,6 @@ TEST_F(KestcfgConfirmTest, ARollbackThatFailsIsRecordedWithItsReasonAndNotRetrie
 
 // A remote shell waits until every holder of the command's output has closed it.
 TEST_F(KestcfgConfirmTest, ACallerReadingThroughAPipeIsNotKeptWaiting) {
-    if (!kest::test::cfg::KestcfgStartsItself()) {
-        GTEST_SKIP() << "the watcher is a second kestcfg, which an emulated kestcfg cannot start";
-    }
     int pipeEnds[2];
     ASSERT_EQ(0, pipe(pipeEnds));
     const pid_t child = fork();

@@ -1,4 +1,4 @@
-// kestcfg sim init: the demo controller's files, and its firmware-tool stand-in.
+// kestcfg sim init: the demo controller's files, and a user without root using their own.
 #include <grp.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -8,7 +8,6 @@
 
 #include <gtest/gtest.h>
 
-#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kest::test::cfg {
@@ -116,20 +115,6 @@ TEST(KestcfgSimTest, AUserWithoutRootMakesAndUsesADemoControllerOfTheirOwn) {
     EXPECT_NE(std::string::npos,
               ReadWhole(root + "/var/lib/vqtargetcfg/state.ini").find("UserComment=mine\n"));
     EXPECT_NE(std::string::npos, ReadWhole(root + "/var/log/fwupdate.log").find(" 3\n"));
-}
-
-class KestcfgSimToolTest : public DemoControllerTest {};
-
-TEST_F(KestcfgSimToolTest, FirmwareToolStandInLogsItsArgumentsAndEndsAtTheLastStage) {
-    // The plug-in starts the tool with an empty environment.
-    char* const emptyEnvironment[] = {nullptr};
-    const RunResult tool =
-        RunProgram(sysroot_.PathOf("/usr/local/korvane/bin/fwupdate"),
-                   {"/var/volatile/tmp/kestsysxp.fwupdate.cfg", "3"}, emptyEnvironment);
-    EXPECT_EQ(0, tool.exitCode) << tool.err;
-    EXPECT_EQ("/var/volatile/tmp/kestsysxp.fwupdate.cfg 3\n",
-              sysroot_.ReadFile("/var/log/fwupdate.log"));
-    EXPECT_EQ("5\n", sysroot_.ReadFile("/var/run/firmware_update/status"));
 }
 
 }  // namespace
