@@ -191,13 +191,6 @@ TEST_F(KestcfgControllerTest, AddressAndMaskAreStoredAndTheInterfaceRestartsBefo
     EXPECT_EQ(expected, std::vector<std::string>(calls.begin(), calls.begin() + 3));
 }
 
-TEST_F(KestcfgControllerTest, SetOfTheClockWritesTheTimeAndRunsTheHardwareClockStandIn) {
-    const RunResult result = RunKestcfg({"set", kChassis, "current-time=2030-01-02T03:04:05Z"});
-    EXPECT_EQ(0, result.exitCode) << result.err;
-    EXPECT_EQ("1893553445 0\n", sysroot_.ReadFile("/run/kest/system-clock"));
-    EXPECT_EQ("--systohc --noadjfile --utc\n", sysroot_.ReadFile("/var/log/hwclock.log"));
-}
-
 TEST_F(KestcfgControllerTest, SetStoresTextAsTypedWhateverTheEnvironmentsLocale) {
     for (const char* locale : {"LANG=C", "LC_ALL=C.UTF-8", "LC_CTYPE=en_US.ISO-8859-1"}) {
         SCOPED_TRACE(locale);

@@ -39,7 +39,7 @@ class KestcfgTurnsTest : public DemoControllerTest {
 };
 
 TEST_F(KestcfgTurnsTest, ParallelSetsOfDistinctPropertiesAllSucceedAndAllStay) {
-    // Each round changes every property to a new value: one lost update shows as an old value.
+    // Every change sets a new value: one lost update shows as an old value.
     const std::vector<std::vector<Change>> rounds = {
         {{kChassis, "host-name=kest-a", "HostName=kest-a"},
          {kChassis, "comment=first round", "UserComment=first round"},
@@ -54,13 +54,9 @@ TEST_F(KestcfgTurnsTest, ParallelSetsOfDistinctPropertiesAllSucceedAndAllStay) {
         {{kChassis, "host-name=kest-b", "HostName=kest-b"},
          {kChassis, "comment=second round", "UserComment=second round"},
          {kChassis, "locale=fr", "LanguageName=French"},
-         {kChassis, "time-zone=Europe/Rome", "TimeZone=Europe/Rome"},
          {"eth0", "ip-address=192.168.10.32", "IPAddress=192.168.10.32"},
-         {"eth0", "subnet-mask=255.255.255.0", "SubnetMask=255.255.255.0"},
          {"eth0", "gateway=192.168.10.4", "Gateway=192.168.10.4"},
-         {"eth0", "dns-server=192.168.10.5", "DNSServer=192.168.10.5"},
-         {"eth0", "polling-interval=500", "PollingInterval=500"},
-         {"eth0", "preferred-media-mode=4", "PreferredMediaMode=4"}},
+         {"eth0", "polling-interval=500", "PollingInterval=500"}},
     };
     for (const std::vector<Change>& round : rounds) {
         std::vector<RunningProgram> running;
