@@ -241,10 +241,6 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
          1,
          "kestcfg: eth0 rejected the change with UX_E_VALUE_INVALID (0x8004037F): Polling "
          "interval must be between 1 and 10000 ms."},
-        {{"set", kChassis, "host-name=-bad"},
-         1,
-         "kestcfg: VQ KEST Chassis rejected the change with UX_E_HOSTNAME_INVALID (0x8004037A): "
-         "The first and last characters of the hostname must be alphanumeric."},
         // Judged with the current address and mask.
         {{"set", "eth0", "gateway=10.0.0.1"},
          1,
@@ -269,29 +265,18 @@ TEST_F(KestcfgControllerTest, RejectedValuesShowThePluginsMessageAndStatusAndCha
         FlattenJson(json.out));
 }
 
-// The properties a document lists under items/N/properties, one per line "N NAME"; NAME is a
-// member name (get) or a "name" (describe).
-std::string PropertyNames(const std::string& flat) {
-    std::string names;
-    static const std::regex kGet("items/([0-9])/properties/([a-z0-9-]+)/tag=");
-    static const std::regex kDescribe("items/([0-9])/properties/[0-9]+/name=\"([a-z0-9-]+)\"");
-    for (const std::regex* pattern : {&kGet, &kDescribe}) {
-        for (auto it = std::sregex_iterator(flat.begin(), flat.end(), *pattern);
-             it != std::sregex_iterator(); ++it) {
-            names += (*it)[1].str() + " " + (*it)[2].str() + "\n";
-        }
-    }
-    return names;
-}
-
 TEST_F(KestcfgControllerTest, DescribeCoversEveryPropertyThatGetShows) {
     const RunResult described = RunKestcfg({"--json", "describe"});
     ASSERT_EQ(0, described.exitCode) << described.err;
     const std::string description = FlattenJson(described.out);
-    std::istringstream shown(PropertyNames(FlattenJson(RunKestcfg({"--json", "get"}).out)));
+    const std::string shown = FlattenJson(RunKestcfg({"--json", "get"}).out);
+    const std::regex property("items/([0-9])/properties/([a-z0-9-]+)/tag=");
     size_t count = 0;
-    for (std::string line; std::getline(shown, line); ++count) {
-        EXPECT_NE(std::string::npos, PropertyNames(description).find(line + "\n")) << line;
+    for (auto it = std::sregex_iterator(shown.begin(), shown.end(), property);
+         it != std::sregex_iterator(); ++it, ++count) {
+        const std::string name = "items/" + (*it)[1].str() + "/properties/[0-9]+/name=\"";
+        EXPECT_TRUE(std::regex_search(description, std::regex(name + (*it)[2].str() + "\"")))
+            << (*it)[0];
     }
     EXPECT_GT(count, 50u);
     for (const char* fact :
