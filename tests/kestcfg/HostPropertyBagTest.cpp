@@ -73,6 +73,12 @@ TEST(HostPropertyBagTest, CloneCopiesValuesWithoutModifiedMarks) {
     EXPECT_EQ(S_OK, copy2->GetTimestamp(0x0D11F000, &time));
     EXPECT_EQ(1u, time.fraction);
     EXPECT_EQ(2, time.seconds);
+    // No time has no fields.
+    ASSERT_EQ(S_OK, bag->SetTimestamp(0x0D11F000, {0, 0}));
+    int32_t fields[6] = {};
+    EXPECT_EQ(S_OK, bag->GetTimestampFields(0x0D11F000, fields));
+    EXPECT_EQ((std::vector<int32_t>{-1, -1, -1, -1, -1, -1}),
+              std::vector<int32_t>(fields, fields + 6));
 }
 
 TEST(HostPropertyBagTest, EnumeratorsFollowTheEnumeratorContract) {

@@ -5,14 +5,13 @@
 #include <string>
 #include <vector>
 
-#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kest::test::cfg {
 
 namespace {
 
-class KestcfgApplyTest : public kest::test::cfg::DemoControllerTest {
+class KestcfgApplyTest : public DemoControllerTest {
   protected:
     // Runs kestcfg on the second controller.
     RunResult OnSecond(std::vector<std::string> arguments) {
@@ -22,19 +21,10 @@ class KestcfgApplyTest : public kest::test::cfg::DemoControllerTest {
 
     void SetUp() override {
         DemoControllerTest::SetUp();
-        ASSERT_EQ(0, RunKestcfg({"sim", "init", second_.Root()}).exitCode);
+        kest::hostkit::CreateDemoController(second_.Root(),
+                                            KESTCFG_SOURCE_DATA_DIR "/timezone.ini");
         // The second sysroot took over KEST_SYSROOT; the tests use the first one by default.
         setenv("KEST_SYSROOT", sysroot_.Root().c_str(), 1);
-    }
-
-    // Counts the controller library's setter calls in the call log.
-    static size_t Setters(const std::string& log) {
-        size_t count = 0;
-        for (size_t at = log.find("\tSet"); at != std::string::npos;
-             at = log.find("\tSet", at + 1)) {
-            ++count;
-        }
-        return count;
     }
 
     kest::test::TempSysroot second_;
@@ -63,13 +53,14 @@ TEST_F(KestcfgApplyTest, AnExportAppliedToASecondControllerReproducesItsSettings
     EXPECT_EQ(0, applied.exitCode) << applied.err;
     EXPECT_NE(std::string::npos, applied.out.find("VQ KEST Chassis: host-name set to line-7\n"));
     EXPECT_EQ(std::string::npos, applied.out.find("locale")) << "only what differs";
+    EXPECT_EQ(std::string::npos, applied.out.find(" -> ")) << "differences only with --diff";
     EXPECT_EQ(exported.out, OnSecond({"export"}).out);
 
-    const size_t settersBefore = Setters(second_.ReadFile(kCallLog));
+    const size_t settersBefore = CountOf(second_.ReadFile(kCallLog), "\tSet");
     const RunResult again = OnSecond({"--json", "apply", file});
     EXPECT_EQ(0, again.exitCode) << again.err;
     EXPECT_EQ("check=false\n", FlattenJson(again.out)) << "no differences, nothing applied";
-    EXPECT_EQ(settersBefore, Setters(second_.ReadFile(kCallLog)));
+    EXPECT_EQ(settersBefore, CountOf(second_.ReadFile(kCallLog), "\tSet"));
 }
 
 TEST_F(KestcfgApplyTest, OneRejectedValueInATwoItemFilePersistsNothing) {
@@ -77,7 +68,7 @@ TEST_F(KestcfgApplyTest, OneRejectedValueInATwoItemFilePersistsNothing) {
                        R"({"items": {"chassis": {"comment": "new"},
                                      "eth0": {"polling-mode": "polling", "polling-interval": 0}}})");
     const std::string before = State();
-    const size_t settersBefore = Setters(sysroot_.ReadFile(kCallLog));
+    const size_t settersBefore = CountOf(Calls(), "\tSet");
     const RunResult result = RunKestcfg({"apply", sysroot_.PathOf("/bad.json")});
     EXPECT_EQ(1, result.exitCode);
     EXPECT_NE(std::string::npos,
@@ -86,7 +77,7 @@ TEST_F(KestcfgApplyTest, OneRejectedValueInATwoItemFilePersistsNothing) {
                               "polling-interval); nothing was persisted"))
         << result.err;
     EXPECT_EQ(before, State());
-    EXPECT_EQ(settersBefore, Setters(sysroot_.ReadFile(kCallLog)));
+    EXPECT_EQ(settersBefore, CountOf(Calls(), "\tSet"));
     const std::string flat =
         FlattenJson(RunKestcfg({"apply", "--json", sysroot_.PathOf("/bad.json")}).out);
     EXPECT_NE(std::string::npos,

@@ -8,7 +8,6 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "kestcfg/DemoControllerTest.h"
 #include "kestcfg/KestcfgRunner.h"
 
 namespace kest::test::cfg {
@@ -25,17 +24,10 @@ class KestcfgFirmwareTest : public DemoControllerTest {
         sysroot_.WriteFile("/images/firmware.bin", kImage);
     }
 
-    RunResult Install(const std::vector<std::string>& options, const std::string& item) {
-        std::vector<std::string> arguments = {"--sysroot", sysroot_.Root()};
-        arguments.insert(arguments.end(), options.begin(), options.end());
-        arguments.insert(arguments.end(),
-                         {"firmware", item, sysroot_.PathOf("/images/firmware.bin")});
-        return RunKestcfg(arguments);
-    }
-
-    // The arguments of kestcfg firmware for eth0 and the image file `image`.
-    std::vector<std::string> FirmwareArguments(const std::string& image) const {
-        return {"--sysroot", sysroot_.Root(), "firmware", "eth0", sysroot_.PathOf(image)};
+    // kestcfg firmware for `item` and the image `image` of the sysroot.
+    std::vector<std::string> Firmware(const std::string& item = "eth0",
+                                      const std::string& image = "/images/firmware.bin") const {
+        return Kestcfg({"firmware", item, sysroot_.PathOf(image)});
     }
 
     // A stand-in tool that records the staging file's checksum when it starts and again when
@@ -43,8 +35,7 @@ class KestcfgFirmwareTest : public DemoControllerTest {
     // that a failing test cannot hang.
     void InstallWaitingTool() const {
         sysroot_.MakeDirectory("/tool");
-        sysroot_.WriteScript(kToolPath, "root='" + sysroot_.Root() +
-                                            "'\n"
+        sysroot_.WriteScript(kToolPath, "root='" + sysroot_.Root() + "'\n" +
                                             "cksum < \"$1\" > \"$root/tool/sum.start\"\n"
                                             ": > \"$root/tool/started\"\n"
                                             "n=0\n"
@@ -58,21 +49,10 @@ class KestcfgFirmwareTest : public DemoControllerTest {
 
     bool ToolHas(const char* mark) const { return sysroot_.Exists(std::string("/tool/") + mark); }
     void ReleaseTool() const { sysroot_.WriteFile("/tool/release", ""); }
-
-    // Whether some process holds the controller's firmware update lock.
-    bool UpdateLockHeld() const {
-        const int file = open(sysroot_.PathOf("/var/run/firmware_update/update.lock").c_str(),
-                              O_RDONLY | O_CLOEXEC);
-        const bool held = file >= 0 && flock(file, LOCK_SH | LOCK_NB) != 0;
-        if (file >= 0) {
-            close(file);
-        }
-        return held;
-    }
 };
 
 TEST_F(KestcfgFirmwareTest, InstallsTheImageWithTheDemoToolAndShowsProgress) {
-    const RunResult result = Install({}, "eth0");
+    const RunResult result = RunProgram(Firmware());
     ASSERT_EQ(0, result.exitCode) << result.err;
     EXPECT_EQ(0u, result.out.find("firmware update {")) << result.out;
     EXPECT_NE(std::string::npos, result.out.find("} of eth0: installed\n")) << result.out;
@@ -86,8 +66,9 @@ TEST_F(KestcfgFirmwareTest, InstallsTheImageWithTheDemoToolAndShowsProgress) {
 }
 
 TEST_F(KestcfgFirmwareTest, ReportsAFailingToolAsJsonAndExitsWithFailure) {
-    sysroot_.WriteScript("/usr/local/korvane/bin/fwupdate", "exit 1\n");
-    const RunResult result = Install({"--json"}, "VQ KEST Chassis");
+    sysroot_.WriteScript(kToolPath, "exit 1\n");
+    const RunResult result = RunKestcfg(
+        {"--json", "firmware", "VQ KEST Chassis", sysroot_.PathOf("/images/firmware.bin")});
     EXPECT_EQ(3, result.exitCode);
     const std::string flat = FlattenJson(result.out);
     EXPECT_NE(std::string::npos, flat.find("item=\"VQ KEST Chassis\"\n")) << flat;
@@ -96,7 +77,7 @@ TEST_F(KestcfgFirmwareTest, ReportsAFailingToolAsJsonAndExitsWithFailure) {
 }
 
 TEST_F(KestcfgFirmwareTest, UnusableImagesAreRefusedWithTheirPathBeforeAnythingStarts) {
-    RunResult result = Install({}, "eth9");
+    RunResult result = RunProgram(Firmware("eth9"));
     EXPECT_EQ(3, result.exitCode);
     EXPECT_NE(std::string::npos, result.err.find("there is no item eth9")) << result.err;
     sysroot_.WriteFile("/images/empty.bin", "");
@@ -110,7 +91,7 @@ TEST_F(KestcfgFirmwareTest, UnusableImagesAreRefusedWithTheirPathBeforeAnythingS
     };
     for (const auto& [image, problem] : images) {
         SCOPED_TRACE(image);
-        result = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware", "eth0", image, "--json"});
+        result = RunKestcfg({"firmware", "eth0", image, "--json"});
         EXPECT_EQ(2, result.exitCode);
         EXPECT_NE(std::string::npos, result.err.find(image + problem)) << result.err;
         EXPECT_NE(std::string::npos, FlattenJson(result.out).find("error/exitStatus=2\n"));
@@ -119,7 +100,7 @@ TEST_F(KestcfgFirmwareTest, UnusableImagesAreRefusedWithTheirPathBeforeAnythingS
 }
 
 TEST_F(KestcfgFirmwareTest, FirmwareStatusShowsTheLockHolderAndTheStage) {
-    const RunResult idle = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"});
+    const RunResult idle = RunKestcfg({"firmware-status"});
     EXPECT_EQ(0, idle.exitCode) << idle.err;
     EXPECT_EQ("No firmware update is running.\nStatus file: none\n", idle.out);
 
@@ -129,7 +110,7 @@ TEST_F(KestcfgFirmwareTest, FirmwareStatusShowsTheLockHolderAndTheStage) {
     const int lock =
         open(sysroot_.PathOf("/var/run/firmware_update/update.lock").c_str(), O_RDONLY);
     ASSERT_EQ(0, flock(lock, LOCK_EX | LOCK_NB));
-    const RunResult running = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"});
+    const RunResult running = RunKestcfg({"firmware-status"});
     EXPECT_EQ(
         "A firmware update is running (started by process 4242).\n"
         "Status file: 3, stage 3 of 5\n",
@@ -140,41 +121,27 @@ TEST_F(KestcfgFirmwareTest, FirmwareStatusShowsTheLockHolderAndTheStage) {
     EXPECT_EQ(0u, RunKestcfg({"firmware-status"}).out.find("No firmware update is running."));
 }
 
-}  // namespace
-
-namespace {
-
-TEST_F(KestcfgFirmwareTest, ASecondUpdateIsRefusedAsBusyWhileTheFirstToolReadsItsImage) {
+// The orphaned tool of a killed kestcfg keeps other updates out until it ends.
+TEST_F(KestcfgFirmwareTest, OneUpdateAtATimeAlsoAfterItsKestcfgIsKilled) {
     InstallWaitingTool();
     sysroot_.WriteFile("/images/second.bin", "another image\n");
-    RunningProgram first = StartKestcfg(FirmwareArguments("/images/firmware.bin"));
+    RunningProgram first = StartProgram(Firmware(), true);
     ASSERT_TRUE(PollUntil([&] { return ToolHas("started"); }));
-    const RunResult second = RunKestcfg(FirmwareArguments("/images/second.bin"));
+    const RunResult second = RunProgram(Firmware("eth0", "/images/second.bin"));
     EXPECT_EQ(4, second.exitCode) << second.err;
     EXPECT_NE(std::string::npos, second.err.find("another firmware update")) << second.err;
+    ASSERT_EQ(0, kill(first.pid, SIGKILL));
+    FinishProgram(first);
+    EXPECT_EQ(4, RunProgram(Firmware("eth0", "/images/second.bin")).exitCode);
+    EXPECT_EQ(0u, RunKestcfg({"firmware-status"}).out.find("A firmware update is running"));
     ReleaseTool();
-    const RunResult result = FinishProgram(first);
-    EXPECT_EQ(0, result.exitCode) << result.err;
+    ASSERT_TRUE(PollUntil([&] {
+        return ToolHas("finished") &&
+               RunKestcfg({"firmware-status"}).out.rfind("No firmware update is running.", 0) == 0;
+    }));
     EXPECT_EQ(sysroot_.ReadFile("/tool/sum.start"), sysroot_.ReadFile("/tool/sum.end"));
     EXPECT_EQ(kImage, sysroot_.ReadFile("/var/volatile/tmp/kestsysxp.fwupdate.cfg"));
-}
-
-TEST_F(KestcfgFirmwareTest, AfterKestcfgIsKilledTheOrphanedToolKeepsOtherUpdatesOut) {
-    InstallWaitingTool();
-    RunningProgram killed = StartKestcfg(FirmwareArguments("/images/firmware.bin"), true);
-    ASSERT_TRUE(PollUntil([&] { return ToolHas("started"); }));
-    ASSERT_EQ(0, kill(killed.pid, SIGKILL));
-    FinishProgram(killed);
-    const RunResult refused = RunKestcfg(FirmwareArguments("/images/firmware.bin"));
-    EXPECT_EQ(4, refused.exitCode) << refused.err;
-    const RunResult followed = RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"});
-    EXPECT_EQ(0u, followed.out.find("A firmware update is running")) << followed.out;
-    ReleaseTool();
-    ASSERT_TRUE(PollUntil([&] { return ToolHas("finished") && !UpdateLockHeld(); }));
-    EXPECT_EQ(0u, RunKestcfg({"--sysroot", sysroot_.Root(), "firmware-status"})
-                      .out.find("No firmware update is running."));
-    const RunResult accepted = RunKestcfg(FirmwareArguments("/images/firmware.bin"));
-    EXPECT_EQ(0, accepted.exitCode) << accepted.err;
+    EXPECT_EQ(0, RunProgram(Firmware()).exitCode);
 }
 
 class KestcfgFirmwareInterruptTest : public KestcfgFirmwareTest,
@@ -184,13 +151,11 @@ class KestcfgFirmwareInterruptTest : public KestcfgFirmwareTest,
 // answered, the next signal ends kestcfg, and the tool finishes in its own session.
 TEST_P(KestcfgFirmwareInterruptTest, TheToolFinishesItsStages) {
     InstallWaitingTool();
-    RunningProgram running = StartKestcfg(FirmwareArguments("/images/firmware.bin"), true);
+    RunningProgram running = StartProgram(Firmware(), true);
     ASSERT_TRUE(PollUntil([&] { return ToolHas("started"); }));
     ASSERT_EQ(0, kill(-running.pid, SIGINT));
-    ASSERT_TRUE(PollUntil([&] {
-        return kest::test::cfg::ErrorOutputSoFar(running).find("cannot be cancelled") !=
-               std::string::npos;
-    }));
+    ASSERT_TRUE(PollUntil(
+        [&] { return running.ErrorSoFar().find("cannot be cancelled") != std::string::npos; }));
     ASSERT_EQ(0, kill(-running.pid, GetParam()));
     const RunResult result = FinishProgram(running);
     EXPECT_EQ(128 + GetParam(), result.exitCode) << result.err;

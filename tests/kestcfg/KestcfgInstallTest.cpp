@@ -14,12 +14,12 @@ namespace {
 TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorKeptApart) {
     kest::test::TempSysroot prefix;
     for (const char* component : {"", "simulator"}) {
-        std::vector<std::string> arguments = {"--install", KEST_BINARY_DIR, "--prefix",
-                                              prefix.Root()};
+        std::vector<std::string> arguments = {CMAKE_COMMAND_PATH, "--install", KEST_BINARY_DIR,
+                                              "--prefix", prefix.Root()};
         if (*component != '\0') {
             arguments.insert(arguments.end(), {"--component", component});
         }
-        const RunResult installed = RunProgram(CMAKE_COMMAND_PATH, arguments);
+        const RunResult installed = RunProgram(arguments);
         ASSERT_EQ(0, installed.exitCode) << installed.err;
     }
     const std::string plugin = "/" KEST_PLUGIN_INSTALL_DIR "/libvqkestSysApiChassisExpert.so";
@@ -34,15 +34,14 @@ TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorK
     EXPECT_FALSE(prefix.Exists("/lib/libvqtargetcfg.so.1"));
     EXPECT_EQ(std::string::npos, ReadWhole(prefix.PathOf(plugin)).find(KEST_BINARY_DIR "/sim"))
         << "the installed plug-in keeps no search path to the simulator";
-    if (std::vector<std::string>{KEST_TEST_EMULATOR}.empty()) {
+    if (KestcfgStartsItself()) {
         EXPECT_NE(std::string::npos,
                   ReadWhole(prefix.PathOf("/share/man/man1/kestcfg.1")).find(".SH DESCRIPTION"));
     }
 
     // The completion offers commands, property names and named values.
     const RunResult completed = RunProgram(
-        "/bin/bash",
-        {"-c",
+        {"/bin/bash", "-c",
          "source \"$0\"; complete() { COMP_WORDS=(\"$@\"); COMP_CWORD=$(($# - 1)); _kestcfg; "
          "echo \"${COMPREPLY[*]}\"; }; complete kestcfg fi; complete kestcfg set eth0 poll; "
          "complete kestcfg set eth0 adapter-mode=t",
@@ -53,14 +52,14 @@ TEST(KestcfgInstallTest, TheInstalledToolWorksOnADemoControllerWithTheSimulatorK
 
     const std::string kestcfg = prefix.PathOf("/bin/kestcfg");
     const std::string controller = prefix.Root() + "/controller";
-    ASSERT_EQ(0, RunKestcfg({"sim", "init", controller}, environ, kestcfg).exitCode);
-    const RunResult set = RunKestcfg(
-        {"--sysroot", controller, "set", "chassis", "comment=installed"}, environ, kestcfg);
+    ASSERT_EQ(0, RunProgram(Kestcfg({"sim", "init", controller}, kestcfg)).exitCode);
+    const RunResult set = RunProgram(
+        Kestcfg({"--sysroot", controller, "set", "chassis", "comment=installed"}, kestcfg));
     EXPECT_EQ(0, set.exitCode) << set.err;
     EXPECT_NE(
         std::string::npos,
         ReadWhole(controller + "/var/lib/vqtargetcfg/state.ini").find("UserComment=installed"));
-    const RunResult version = RunKestcfg({"--simulator", "--version"}, environ, kestcfg);
+    const RunResult version = RunProgram(Kestcfg({"--simulator", "--version"}, kestcfg));
     EXPECT_EQ(
         "kestcfg 22.5\nplug-in 22.5 (" + prefix.Root() + "/bin/../" + plugin.substr(1) + ")\n",
         version.out)

@@ -68,6 +68,7 @@ INSTANTIATE_TEST_SUITE_P(
                   "1969-12-31T23:59:59.250Z"},
         ParseCase{"2023-02-29T00:00:00Z", UX_PROPERTY_TYPE_TIMESTAMP, std::nullopt},
         ParseCase{"2024-01-01T00:00:00", UX_PROPERTY_TYPE_TIMESTAMP, std::nullopt},
+        ParseCase{"2024-01-01T12::00Z", UX_PROPERTY_TYPE_TIMESTAMP, std::nullopt},
         ParseCase{"2024-01-01T00:00:00.Z", UX_PROPERTY_TYPE_TIMESTAMP, std::nullopt}));
 
 TEST(TimestampTextTest, CountsFrom1904AndShowsNoTimeAndRoundedMilliseconds) {
