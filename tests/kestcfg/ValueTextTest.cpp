@@ -127,6 +127,28 @@ TEST(HostTextTest, PrintableTextEscapesControlCharactersOnly) {
     }
 }
 
+TEST(HostTextTest, Utf8AndWideTextConvertExactlyAndMalformedUtf8IsRefused) {
+    const std::pair<std::string, std::wstring> same[] = {
+        {"a\x7f", L"a\x7f"},
+        {"\xc2\x80\xdf\xbf", L"\x80\x7ff"},
+        {"\xe0\xa0\x80\xe2\x82\xac\xed\x9f\xbf\xee\x80\x80", L"\x800\x20ac\xd7ff\xe000"},
+        {"\xf0\x90\x80\x80\xf0\x9f\x98\x80\xf4\x8f\xbf\xbf", L"\x10000\x1f600\x10ffff"},
+    };
+    for (const auto& [utf8, wide] : same) {
+        EXPECT_EQ(utf8, Utf8FromWide(wide.data(), wide.size()));
+        EXPECT_EQ(wide, WideFromUtf8(utf8)) << PrintableText(utf8);
+    }
+    const char* const refused[] = {
+        "\xc0\xaf",     "\xc1\xbf",     "\xe0\x9f\xbf",         "\xf0\x8f\xbf\xbf",
+        "\xed\xa0\x80", "\xed\xbf\xbf", "\xf4\x90\x80\x80",     "\xe2\x82",
+        "\xe2\x28\xac", "\x80",         "\xf8\x88\x80\x80\x80",
+    };
+    for (const char* utf8 : refused) {
+        EXPECT_EQ(std::nullopt, WideFromUtf8(utf8)) << PrintableText(utf8);
+    }
+    EXPECT_EQ(std::nullopt, WideFromUtf8(std::string("a\0b", 3)));
+}
+
 TEST(PropertyCatalogueTest, NamesAndNumbersBothFindTags) {
     EXPECT_EQ(0x0101F000u, TagFromWord("host-name"));
     EXPECT_EQ(0x0D107000u, TagFromWord("IP-Address"));
