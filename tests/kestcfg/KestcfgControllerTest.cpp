@@ -279,11 +279,12 @@ TEST_F(KestcfgControllerTest, DescribeCoversEveryPropertyThatGetShows) {
             << (*it)[0];
     }
     EXPECT_GT(count, 50u);
+    const char* const hostName =
+        "items/0/properties/3/name=\"host-name\"\nitems/0/properties/3/tag=\"0x0101F000\"\n"
+        "items/0/properties/3/type=\"text\"\nitems/0/properties/3/changeable=true\n"
+        "items/0/properties/3/restartRequired=true\n";
     for (const char* fact :
-         {"items/0/properties/3/name=\"host-name\"\nitems/0/properties/3/tag=\"0x0101F000\"\n"
-          "items/0/properties/3/type=\"text\"\nitems/0/properties/3/changeable=true\n"
-          "items/0/properties/3/restartRequired=true\n",
-          "/name=\"current-time\"\n", "/values/0=\"one of en,de,fr,zh,kr,ja\"",
+         {hostName, "/name=\"current-time\"\n", "/values/0=\"one of en,de,fr,zh,kr,ja\"",
           "/values/0=\"0x01 disabled\"\n", "/values/2=\"0x08 ethercat\"\n"}) {
         EXPECT_NE(std::string::npos, description.find(fact)) << fact << description;
     }
