@@ -17,7 +17,8 @@
 
 namespace {
 
-__extension__ typedef __int128 Wide;
+// Magnitudes stop at 2^40, so 64 bits hold every intermediate value on every target.
+using Wide = int64_t;
 
 int DigitOf(unsigned char c) {
     return std::isdigit(c) ? c - '0' : std::isalpha(c) ? std::tolower(c) - 'a' + 10 : 99;
