@@ -141,6 +141,9 @@ TEST(IniReadTest, CommentsAreKeptAndWrittenOnlyWhenAskedFor) {
     ASSERT_EQ(IniText_DeleteKey(kept.get(), "s", "k"), kIniFound);
     EXPECT_EQ(SavedText(dir, kept.get(), kIniWriteComments),
               "; head\n[s]\n\n; about k\n[ ]\nbad line\n; tail\n");
+    // A CR LF or LF CR pair ends one line; two CRs end two.
+    IniTextPtr crlf = LoadFromBytes(dir, "; a\r\n[s]\n\r\r\rk=1\r\n", kIniReadKeepComments);
+    EXPECT_EQ(SavedText(dir, crlf.get(), kIniWriteComments), "; a\n[s]\n\n\nk=1\n");
 }
 
 }  // namespace
