@@ -14,6 +14,7 @@
 #include <gmock/gmock.h>
 
 #include "IniTestSupport.h"
+#include "common/ChildProcess.h"
 #include "config/IniWriter.h"
 
 namespace kest::test::config {
@@ -155,8 +156,7 @@ TEST(IniWriteTest, SafeReplacementUsesTheTemporaryNameAndKeepsModeAndOwner) {
 
 // Saves a document too large for a child's file-size limit; returns the child's save result.
 int SaveUnderFileSizeLimit(const std::string& path, uint32_t flags) {
-    pid_t child = fork();
-    if (child == 0) {
+    const int status = kest::test::WaitForChild(kest::test::StartChild([&] {
         signal(SIGXFSZ, SIG_IGN);
         rlimit limit{4096, 4096};
         setrlimit(RLIMIT_FSIZE, &limit);
@@ -164,10 +164,8 @@ int SaveUnderFileSizeLimit(const std::string& path, uint32_t flags) {
         IniText_SetRaw(ini.get(), "s", "k", std::string(100000, 'x').c_str(), 0);
         IniText_SetWriteOptions(ini.get(), kIniNoMaxLineLength, 0, flags);
         _exit(-IniText_Save(ini.get(), path.c_str()));
-    }
-    int status = 0;
-    waitpid(child, &status, 0);
-    return WIFEXITED(status) ? -WEXITSTATUS(status) : 1;
+    }));
+    return status != -1 && WIFEXITED(status) ? -WEXITSTATUS(status) : 1;
 }
 
 TEST(IniWriteTest, FailedWriteNeverTruncatesTheTarget) {

@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "ExpertHost.h"
+#include "common/ChildProcess.h"
 
 namespace kest::test::e2e {
 namespace {
@@ -34,17 +35,14 @@ class ExpertInitializeTest : public ExpertHostTest {
     // the error bit), Uninitialize. The child's exit code: 0 when every status was the expected
     // one; -1 when it did not exit.
     int SessionWithFailedLookup() {
-        const pid_t child = fork();
-        if (child == 0) {
+        const int status = kest::test::WaitForChild(kest::test::StartChild([this] {
             IuxSysPropertyBag* bag = nullptr;
             _exit(expert->Initialize() != S_OK                                        ? 1
                   : expert->GetPropertiesOfItem(L"eth7", &bag) != UX_E_ITEM_NOT_FOUND ? 2
                   : expert->Uninitialize() != S_OK                                    ? 3
                                                                                       : 0);
-        }
-        int status = 0;
-        const bool exited = child > 0 && waitpid(child, &status, 0) == child && WIFEXITED(status);
-        return exited ? WEXITSTATUS(status) : -1;
+        }));
+        return status != -1 && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
     }
 
     // The names of the trace logs in the log directory `systemPath`.

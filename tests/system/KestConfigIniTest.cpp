@@ -10,6 +10,7 @@
 #include <cstdio>
 #include <string>
 
+#include "common/ChildProcess.h"
 #include "common/StatusOf.h"
 #include "common/TempSysroot.h"
 #include "support/ExclusiveFileLock.h"
@@ -98,18 +99,14 @@ TEST(KestConfigIniTest, AFailedSaveKeepsTheFileAndForgetsTheChange) {
     kest::test::TempSysroot sysroot;
     sysroot.WriteFile(kWebServicePath, kEnabledFile);
     // No file may grow in the child, so the temporary cannot be written.
-    const pid_t child = fork();
-    if (child == 0) {
+    kest::test::RunInChild([] {
         signal(SIGXFSZ, SIG_IGN);
         rlimit limit{0, 0};
         setrlimit(RLIMIT_FSIZE, &limit);
         KestConfigIni settings;
-        const bool refused = StatusOf([&] { settings.SetWebServiceEnabled(false); }) == E_FAIL;
-        _exit(refused && settings.IsWebServiceEnabled() ? 0 : 1);
-    }
-    int status = 0;
-    ASSERT_EQ(child, waitpid(child, &status, 0));
-    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
+        EXPECT_EQ(E_FAIL, StatusOf([&] { settings.SetWebServiceEnabled(false); }));
+        EXPECT_TRUE(settings.IsWebServiceEnabled());
+    });
     EXPECT_EQ(kEnabledFile, sysroot.ReadFile(kWebServicePath));
     // A first save that fails (the settings directory is a regular file) leaves it disabled.
     kest::test::TempSysroot blocked;
